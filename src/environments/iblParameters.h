@@ -1,0 +1,39 @@
+/// The grading parameters that both environments begin with.
+#pragma once
+
+#include "environments/iblGrading.h"
+
+namespace zsi {
+
+#define IBL_GRADING(P, U, A)                                                                     \
+    P(Vec3f, IBLLuminanceFactors, (0.2125f, 0.7154f, 0.0721f),                                   \
+      "weights that turn RGB into a luminance")                                                  \
+    U(Mat3f, globalIBLMatrix, "rotation of the ray direction before a cube lookup")              \
+    P(Vec2f, diffuseIBLContrast, (0.5f, 1.0f), "diffuse: contrast pivot, contrast amount")       \
+    P(int, diffuseIBLGainMode, (0), "diffuse: 0 none, 1 per channel, 2 gain times luminance")    \
+    P(Vec3f, diffuseIBLGain, (1.0f, 1.0f, 1.0f), "diffuse: gain colour")                         \
+    P(float, diffuseIBLSaturation, (1.0f), "diffuse: saturation, 1 unchanged, 0 grey")           \
+    P(Vec2f, reflectIBLContrast, (0.5f, 1.0f), "reflection: contrast pivot, contrast amount")    \
+    P(int, reflectIBLGainMode, (0), "reflection: 0 none, 1 per channel, 2 gain times luminance") \
+    P(Vec3f, reflectIBLGain, (1.0f, 1.0f, 1.0f), "reflection: gain colour")                      \
+    P(float, reflectIBLSaturation, (1.0f), "reflection: saturation, 1 unchanged, 0 grey")
+
+/// What diffuse rays see of a cube.
+inline Vec4f diffuseIbl(auto const& s, TextureSamplerCube const& cube, Vec3f direction)
+{
+    return lookupIbl(
+        cube, s.globalIBLMatrix, direction,
+        {s.diffuseIBLContrast, s.diffuseIBLGainMode, s.diffuseIBLGain, s.diffuseIBLSaturation},
+        s.IBLLuminanceFactors);
+}
+
+/// What reflection rays see of a cube.
+inline Vec4f reflectIbl(auto const& s, TextureSamplerCube const& cube, Vec3f direction)
+{
+    return lookupIbl(
+        cube, s.globalIBLMatrix, direction,
+        {s.reflectIBLContrast, s.reflectIBLGainMode, s.reflectIBLGain, s.reflectIBLSaturation},
+        s.IBLLuminanceFactors);
+}
+
+} // namespace zsi

@@ -1,0 +1,21 @@
+/// The catalogue: every class of the library, once. Exports and tests derive from this list.
+#pragma once
+
+#include "environments/corvid_Env_Default.h"
+#include "lights/voPointLight.h"
+#include "lights/voSpotLight.h"
+#include "materials/utility/corvid_Mtl_AmbientOnly.h"
+#include "materials/utility/corvid_Mtl_NormalsOnly.h"
+#include "materials/utility/corvid_Mtl_ShadowPlane.h"
+#include "materials/utility/corvid_Mtl_Solid.h"
+#include "materials/utility/corvid_Mtl_Unlit.h"
+
+#define ZSI_CATALOGUE(X)      \
+    X(voPointLight)           \
+    X(voSpotLight)            \
+    X(corvid_Env_Default)     \
+    X(corvid_Mtl_Solid)       \
+    X(corvid_Mtl_Unlit)       \
+    X(corvid_Mtl_NormalsOnly) \
+    X(corvid_Mtl_ShadowPlane) \
+    X(corvid_Mtl_AmbientOnly)

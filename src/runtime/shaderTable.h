@@ -1,0 +1,103 @@
+/// How a shader states its parameters once: `SHADER(Class, mask, ROWS)`.
+///
+/// ROWS is a macro `ROWS(P, U, A)` that lists, in registration order,
+///   P(type, name, (default), "meaning")   a parameter
+///   U(type, name, "meaning")              a parameter that has no default: the host writes it;
+///                                         zeroed, so that nothing ever reads undefined memory
+///   A(type, name)                         a vertex attribute
+/// Shared blocks are such macros too; a class puts them where its order wants them. From the rows
+/// derive the fields (flat members, same order), registration, copy, the attribute offsets, and an
+/// `attribute_<name>(state)` reader for each attribute.
+#pragma once
+
+#include <cstddef>
+#include <cstring>
+#include <type_traits>
+#include <zsi/zsi.h>
+
+namespace zsi {
+
+/// Tells the host's manager about each row; one overload per parameter and attribute type.
+struct Registrar {
+    IShaderManager* manager;
+    IShaderBase* shader;
+
+    void field(char const* name, bool& f) { manager->registerBool(shader, name, &f); }
+    void field(char const* name, int& f) { manager->registerInt(shader, name, &f); }
+    void field(char const* name, float& f) { manager->registerFloat(shader, name, &f); }
+    void field(char const* name, Vec2f& f) { manager->registerVec2f(shader, name, &f); }
+    void field(char const* name, Vec3f& f) { manager->registerVec3f(shader, name, &f); }
+    void field(char const* name, Vec4f& f) { manager->registerVec4f(shader, name, &f); }
+    void field(char const* name, Mat3f& f) { manager->registerMat3f(shader, name, &f); }
+    void field(char const* name, Mat4f& f) { manager->registerMat4f(shader, name, &f); }
+    void field(char const* name, TextureSampler1D& f)
+    {
+        manager->registerTexture1D(shader, name, &f);
+    }
+    void field(char const* name, TextureSampler2D& f)
+    {
+        manager->registerTexture2D(shader, name, &f);
+    }
+    void field(char const* name, TextureSamplerCube& f)
+    {
+        manager->registerTextureCube(shader, name, &f);
+    }
+
+    void parameter(char const* name, auto& f, char const* /*meaning*/, bool /*hasDefault*/)
+    {
+        field(name, f);
+    }
+    template <class T>
+    void attribute(char const* name, std::size_t offset)
+    {
+        constexpr int kind = std::is_same_v<T, Vec2f> ? kAttributeVec2f
+            : std::is_same_v<T, Vec3f>                ? kAttributeVec3f
+                                                      : kAttributeVec4f;
+        static_assert(kind != kAttributeVec4f || std::is_same_v<T, Vec4f>);
+        manager->registerAttribute(shader, kind, name, static_cast<long>(offset));
+    }
+};
+
+/// The attribute at `offset` of the record's attribute block.
+template <class T>
+inline T readAttribute(ShadeState const& state, std::size_t offset)
+{
+    T value;
+    std::memcpy(&value, state.attributes + offset, sizeof value);
+    return value;
+}
+
+} // namespace zsi
+
+#define ZSI_ROW_NONE(...)
+#define ZSI_ROW_FIELD(T, name, init, meaning) T name = T init;
+#define ZSI_ROW_UNSET(T, name, meaning) T name{};
+#define ZSI_ROW_ATTRIBUTE(T, name) T name;
+#define ZSI_ROW_READER(T, name)                                     \
+    static T attribute_##name(ShadeState const& state)              \
+    {                                                               \
+        return readAttribute<T>(state, offsetof(Attributes, name)); \
+    }
+#define ZSI_VISIT_FIELD(T, name, init, meaning) visitor.parameter(#name, self.name, meaning, true);
+#define ZSI_VISIT_UNSET(T, name, meaning) visitor.parameter(#name, self.name, meaning, false);
+#define ZSI_VISIT_ATTRIBUTE(T, name) \
+    visitor.template attribute<T>(#name, offsetof(Attributes, name));
+
+/// Fields, attribute readers, `registerShader` and `copy` of a class from its rows.
+#define SHADER(Class, MASK, ROWS)                                        \
+    ROWS(ZSI_ROW_FIELD, ZSI_ROW_UNSET, ZSI_ROW_NONE)                     \
+    struct Attributes {                                                  \
+        ROWS(ZSI_ROW_NONE, ZSI_ROW_NONE, ZSI_ROW_ATTRIBUTE)              \
+    };                                                                   \
+    static_assert(sizeof(Attributes) <= sizeof(ShadeState::attributes)); \
+    ROWS(ZSI_ROW_NONE, ZSI_ROW_NONE, ZSI_ROW_READER)                     \
+    static void visit([[maybe_unused]] auto& self, auto&& visitor)       \
+    {                                                                    \
+        ROWS(ZSI_VISIT_FIELD, ZSI_VISIT_UNSET, ZSI_VISIT_ATTRIBUTE)      \
+    }                                                                    \
+    void registerShader(IShaderManager* manager) override                \
+    {                                                                    \
+        manager->declareEntryPoints(this, MASK);                         \
+        visit(*this, Registrar{manager, this});                          \
+    }                                                                    \
+    void copy(IShaderBase const* other) override { *this = *static_cast<Class const*>(other); }
