@@ -1,0 +1,1 @@
+#include "film/imageFile.h"

@@ -1,0 +1,15 @@
+/// Pictures to files.
+#pragma once
+
+#include "integrate/render.h"
+
+#include <filesystem>
+
+namespace zsi::host {
+
+/// Writes by extension: .exr and .hdr linear float, .png and .jpg 8-bit sRGB after `exposure`
+/// stops (PNG keeps alpha, not premultiplied away: colour is written as it is over black).
+/// Written beside and renamed, so that nothing half-written is left. Throws InputError.
+void writePicture(std::filesystem::path const& file, Picture const& picture, float exposure);
+
+} // namespace zsi::host

@@ -1,0 +1,87 @@
+/// A scene as the renderer takes it: plain data, loaded and checked. World is right-handed,
+/// z up; lengths are in scene units; colours linear RGB.
+#pragma once
+
+#include "plugin/shaderLibrary.h"
+
+#include <array>
+#include <memory>
+#include <optional>
+#include <string>
+#include <vector>
+#include <zsi/vecmath.h>
+
+namespace zsi::host {
+
+class TextureStore;
+
+/// Triangles with per-vertex data. Every array but `triangles` is either empty or as long as
+/// `positions`; the loader fills normals, uv, tangents and bitangents that a file lacks.
+struct Mesh {
+    std::string name;
+    std::vector<Vec3f> positions;
+    std::vector<Vec3f> normals; ///< unit
+    std::vector<Vec2f> uv;
+    std::vector<Vec2f> uv1; ///< empty: uv stands in
+    std::vector<Vec3f> tangents; ///< unit, along increasing u
+    std::vector<Vec3f> bitangents;
+    std::vector<Vec4f> colors; ///< empty: (1, 1, 1, 1)
+    std::vector<std::array<std::uint32_t, 3>> triangles;
+};
+
+struct Instance {
+    int mesh; ///< index into Scene::meshes
+    int material; ///< index into Scene::materials
+    Mat4f objectToWorld; ///< points are row vectors: translation in m[12..14]
+};
+
+struct Light {
+    Shader shader;
+    Vec3f position;
+    Vec3f axis{0, 0, -1}; ///< unit direction it points to
+    float radius = 0.0f; ///< > 0: a ball that shadows sample, for soft edges
+};
+
+struct Camera {
+    Vec3f position{0, -5, 1};
+    Vec3f target{0, 0, 0};
+    Vec3f up{0, 0, 1};
+    float verticalFov = 40.0f; ///< degrees
+    float lensRadius = 0.0f; ///< thin lens; 0 is a pinhole
+    float focusDistance = 0.0f; ///< 0: the distance to the target
+};
+
+struct Film {
+    int width = 640;
+    int height = 360;
+    std::optional<std::array<int, 4>> crop; ///< x0, y0, x1, y1 in pixels, end exclusive
+    float exposure = 0.0f; ///< stops, applied to 8-bit output only
+};
+
+struct Settings {
+    int samples = 64; ///< per pixel
+    int maxDepth = 6; ///< of specular chains
+    int occlusionSamples = 4; ///< rays of one occlusion query
+    int indirectSamples = 1; ///< rays of one indirect-diffuse query at the first hit
+    float occlusionDistance = 0.0f; ///< 0: unlimited
+    Vec3f ambient{0, 0, 0}; ///< what `ambientLight` gives
+    std::uint32_t seed = 1;
+    std::string integrator = "shade"; ///< "shade": the materials' shade; "path": sample/transfer
+};
+
+struct Scene {
+    std::string file; ///< for messages
+    Camera camera;
+    Film film;
+    Settings settings;
+    std::vector<Mesh> meshes;
+    std::vector<Shader> materials;
+    std::vector<std::string> materialNames;
+    std::vector<Instance> instances;
+    std::vector<Light> lights;
+    std::optional<Shader> environment; ///< none: black
+    std::shared_ptr<TextureStore> textures; ///< owns what the shaders' handles point to
+    std::vector<std::string> warnings; ///< such as a matrix that a shader will read left unwritten
+};
+
+} // namespace zsi::host
