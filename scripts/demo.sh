@@ -1,0 +1,12 @@
+#!/usr/bin/env bash
+# Installs what is missing, builds, renders the demo scene, says where the picture is.
+set -euo pipefail
+cd "$(dirname "$0")/.."
+. scripts/lib/packages.sh
+install_missing "${packages_build[@]}"
+
+cmake --preset release -DZSI_BUILD_TESTS=OFF -DZSI_BUILD_BENCH=OFF >/dev/null
+cmake --build --preset release
+mkdir -p out
+./build/zsi render scenes/demo.json -o out/demo.png "$@"
+echo "The picture: $PWD/out/demo.png"

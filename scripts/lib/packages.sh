@@ -1,0 +1,21 @@
+# Debian packages of the project, and how the scripts get what is missing. Sourced, not run.
+
+packages_build=(g++ cmake ninja-build libembree-dev libopenimageio-dev libtbb-dev libassimp-dev
+    nlohmann-json3-dev libcli11-dev libfmt-dev)
+packages_test=(libgtest-dev libbenchmark-dev binutils clang-14)
+
+# install_missing PACKAGE...: installs those that are not there; sudo only if not root.
+install_missing() {
+    local missing=() package
+    for package in "$@"; do
+        dpkg-query -W -f='${Status}' "$package" 2>/dev/null | grep -q '^install ok installed$' ||
+            missing+=("$package")
+    done
+    [ ${#missing[@]} -gt 0 ] || return 0
+    echo "Installing: ${missing[*]}"
+    local sudo=()
+    [ "$(id -u)" -eq 0 ] || sudo=(sudo)
+    "${sudo[@]}" apt-get update -qq
+    "${sudo[@]}" env DEBIAN_FRONTEND=noninteractive \
+        apt-get install -y -qq --no-install-recommends "${missing[@]}" >/dev/null
+}
