@@ -33,12 +33,11 @@ inline Vec3f gradeIbl(Vec3f c, IblGrade const& grade, Vec3f const& luminanceFact
 /// The axis swap (x, z, -y) that turns the scene's up axis into the cube map's.
 constexpr Vec3f cubeCoordinate(Vec3f v) { return {v.x, v.z, -v.y}; }
 
-/// Graded colour of the cube along `direction`; the alpha of the cube is replaced by 1.
-inline Vec4f lookupIbl(TextureSamplerCube const& cube, Mat3f const& rotation, Vec3f direction,
-                       IblGrade const& grade, Vec3f const& luminanceFactors)
+/// Texel of the cube along a world direction.
+inline Vec4f lookupIbl(TextureSamplerCube const& cube, Mat3f const& rotation,
+                       Vec3f const& direction)
 {
-    Vec4f const texel = cube.lookup(cubeCoordinate(rotate(rotation, direction)));
-    return withAlpha(gradeIbl(rgb(texel), grade, luminanceFactors), 1.0f);
+    return cube.lookup(cubeCoordinate(rotate(rotation, direction)));
 }
 
 } // namespace zsi

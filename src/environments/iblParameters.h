@@ -18,22 +18,23 @@ namespace zsi {
     P(Vec3f, reflectIBLGain, (1.0f, 1.0f, 1.0f), "reflection: gain colour")                      \
     P(float, reflectIBLSaturation, (1.0f), "reflection: saturation, 1 unchanged, 0 grey")
 
-/// What diffuse rays see of a cube.
-inline Vec4f diffuseIbl(auto const& s, TextureSamplerCube const& cube, Vec3f direction)
+/// What diffuse rays see of a cube; the alpha of the texel is replaced by 1. The grade is read
+/// after the lookup, so that nothing of it is saved across the call.
+inline Vec4f diffuseIbl(auto const& s, TextureSamplerCube const& cube, Vec3f const& direction)
 {
-    return lookupIbl(
-        cube, s.globalIBLMatrix, direction,
-        {s.diffuseIBLContrast, s.diffuseIBLGainMode, s.diffuseIBLGain, s.diffuseIBLSaturation},
-        s.IBLLuminanceFactors);
+    Vec4f const texel = lookupIbl(cube, s.globalIBLMatrix, direction);
+    IblGrade const grade{s.diffuseIBLContrast, s.diffuseIBLGainMode, s.diffuseIBLGain,
+                         s.diffuseIBLSaturation};
+    return withAlpha(gradeIbl(rgb(texel), grade, s.IBLLuminanceFactors), 1.0f);
 }
 
-/// What reflection rays see of a cube.
-inline Vec4f reflectIbl(auto const& s, TextureSamplerCube const& cube, Vec3f direction)
+/// What reflection rays see of a cube, likewise.
+inline Vec4f reflectIbl(auto const& s, TextureSamplerCube const& cube, Vec3f const& direction)
 {
-    return lookupIbl(
-        cube, s.globalIBLMatrix, direction,
-        {s.reflectIBLContrast, s.reflectIBLGainMode, s.reflectIBLGain, s.reflectIBLSaturation},
-        s.IBLLuminanceFactors);
+    Vec4f const texel = lookupIbl(cube, s.globalIBLMatrix, direction);
+    IblGrade const grade{s.reflectIBLContrast, s.reflectIBLGainMode, s.reflectIBLGain,
+                         s.reflectIBLSaturation};
+    return withAlpha(gradeIbl(rgb(texel), grade, s.IBLLuminanceFactors), 1.0f);
 }
 
 } // namespace zsi
