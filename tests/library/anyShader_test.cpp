@@ -1,0 +1,184 @@
+// What holds for every entry point of every class, whatever it shades.
+#include "support/steadyHost.h"
+
+#include <cstddef>
+#include <gtest/gtest.h>
+#include <thread>
+
+namespace zsi {
+namespace {
+
+test::Library const& library() { return test::Library::instance(); }
+
+struct Span {
+    int entryPoint; ///< bit
+    std::size_t begin, end;
+};
+/// The bytes that each entry point may write.
+constexpr Span kResults[] = {
+    {1, 336, 352}, {1, 476, 477},  {2, 352, 364},  {4, 376, 392},
+    {8, 364, 400}, {32, 452, 476}, {64, 336, 352},
+};
+/// The index that a dielectric `sample` hands to the continuation ray.
+constexpr Span kBeyondIor{8, 116, 120};
+
+/// Bytes that the host fills for itself or reads afterwards: no result may depend on them.
+constexpr Span kNotInputs[] = {
+    {0, 84, 96},   {0, 104, 108}, {0, 120, 184}, {0, 248, 320},
+    {0, 332, 364}, {0, 376, 400}, {0, 406, 412}, {0, 452, 480},
+};
+
+using Bytes = std::array<unsigned char, sizeof(ShadeState)>;
+Bytes bytes(ShadeState const& s)
+{
+    Bytes b;
+    std::memcpy(b.data(), &s, sizeof s);
+    return b;
+}
+
+/// One shader with filled parameters, and its entry points one after the other.
+struct Subject {
+    std::string name;
+    std::unique_ptr<IShaderBase> shader;
+    int mask;
+    std::size_t attributeEnd = 480;
+
+    Subject(std::string const& className, unsigned seed, bool hostile)
+        : name(className)
+        , shader(library().create(className))
+    {
+        test::RecordingManager const registered(*shader);
+        mask = registered.masks.at(0);
+        test::Supply supply(seed, hostile);
+        test::fillParameters(registered, supply, hostile);
+        for (test::Registered const& row : registered.rows)
+            if (row.type == "attribute")
+                attributeEnd = 480 + static_cast<std::size_t>(row.offset)
+                    + (row.kind == 1       ? 8u
+                           : row.kind == 2 ? 12u
+                                           : 16u);
+    }
+
+    ShadeState run(test::EntryPointCall const& e, ShadeState state, unsigned seed,
+                   bool hostile) const
+    {
+        test::SteadyHost host(seed, hostile);
+        e.call(*shader, &host, state);
+        return state;
+    }
+
+    bool mayWrite(int bit, std::size_t byte) const
+    {
+        if (!(mask & bit))
+            return false;
+        for (Span const& s : kResults)
+            if (s.entryPoint == bit && byte >= s.begin && byte < s.end)
+                return true;
+        return name == "corvid_Mtl_Dielectric" && bit == kBeyondIor.entryPoint
+            && byte >= kBeyondIor.begin && byte < kBeyondIor.end;
+    }
+
+    /// Empty, or what was written that must not be.
+    std::string strayWrite(int bit, ShadeState const& before, ShadeState const& after) const
+    {
+        Bytes const a = bytes(before), b = bytes(after);
+        auto const differs = [&](std::size_t begin, std::size_t end) {
+            return std::memcmp(&a[begin], &b[begin], end - begin) != 0;
+        };
+        for (std::size_t i = 0; i < a.size(); ++i)
+            if (a[i] != b[i] && !mayWrite(bit, i))
+                return "byte " + std::to_string(i) + " was written";
+        if (bit == 1 && after.discardHit != before.discardHit
+            && (after.discardHit != 1 || differs(336, 352)))
+            return "a discarded hit has a colour, or discardHit is not 1";
+        if (bit == 8 && after.sampleType == 0 && (differs(0, 396) || differs(400, 544)))
+            return "a declined sample has results";
+        return {};
+    }
+};
+
+template <class Check>
+void forEveryEntryPoint(unsigned rounds, bool hostile, Check const& check)
+{
+    for (std::string const& name : library().classes)
+        for (unsigned round = 0; round < rounds; ++round) {
+            Subject const subject(name, round, hostile);
+            test::Supply supply(round + 1000, hostile);
+            for (test::EntryPointCall const& e : test::kEntryPoints) {
+                if (e.kind != subject.shader->getType())
+                    continue;
+                SCOPED_TRACE(name + " " + e.name + " round " + std::to_string(round));
+                check(subject, e, supply, round);
+                if (testing::Test::HasFatalFailure())
+                    return;
+            }
+        }
+}
+
+TEST(AnyShader, WritesItsOwnResultsOnly)
+{
+    forEveryEntryPoint(40, false, [](Subject const& s, auto const& e, auto& supply, unsigned seed) {
+        for (int i = 0; i < 10; ++i) {
+            ShadeState const before = test::fillRecord(supply);
+            ASSERT_EQ(s.strayWrite(e.bit, before, s.run(e, before, seed, false)), "");
+        }
+    });
+}
+
+TEST(AnyShader, StandsHostileInput)
+{
+    forEveryEntryPoint(60, true, [](Subject const& s, auto const& e, auto& supply, unsigned seed) {
+        for (int i = 0; i < 10; ++i) {
+            ShadeState const before = test::fillRecord(supply);
+            ASSERT_EQ(s.strayWrite(e.bit, before, s.run(e, before, seed, true)), "");
+        }
+    });
+}
+
+TEST(AnyShader, ResultsDependOnTheInputsOfTheRecordOnly)
+{
+    forEveryEntryPoint(20, false, [](Subject const& s, auto const& e, auto& supply, unsigned seed) {
+        ShadeState const one = test::fillRecord(supply);
+        ShadeState two = one;
+        auto* const raw = reinterpret_cast<unsigned char*>(&two);
+        auto const scramble = [&](std::size_t begin, std::size_t end) {
+            for (std::size_t i = begin; i < end; ++i)
+                raw[i] = static_cast<unsigned char>(raw[i] + 1 + supply.bits() % 255);
+        };
+        for (Span const& span : kNotInputs)
+            scramble(span.begin, span.end);
+        scramble(s.attributeEnd, sizeof two);
+        Bytes const a = bytes(s.run(e, one, seed, false)), b = bytes(s.run(e, two, seed, false));
+        Bytes const a0 = bytes(one), b0 = bytes(two);
+        for (std::size_t i = 0; i < a.size(); ++i)
+            ASSERT_TRUE(a[i] == b[i] || (a[i] == a0[i] && b[i] == b0[i])) << "byte " << i;
+    });
+}
+
+TEST(AnyShader, ThreadsThatShareAnObjectGetTheSameBits)
+{
+    constexpr std::size_t kRequests = 32, kThreads = 4;
+    forEveryEntryPoint(2, false, [](Subject const& s, auto const& e, auto& supply, unsigned seed) {
+        std::vector<ShadeState> requests, want;
+        for (std::size_t i = 0; i < kRequests; ++i) {
+            requests.push_back(test::fillRecord(supply));
+            want.push_back(s.run(e, requests[i], seed, false));
+        }
+        std::array<std::size_t, kThreads> different{};
+        std::vector<std::thread> threads;
+        for (std::size_t t = 0; t < kThreads; ++t)
+            threads.emplace_back([&, t] {
+                for (std::size_t k = 0; k < kRequests; ++k) {
+                    std::size_t const i = (k * (2 * t + 1)) % kRequests;
+                    different[t] += bytes(s.run(e, requests[i], seed, false)) != bytes(want[i]);
+                }
+            });
+        for (std::thread& t : threads)
+            t.join();
+        for (std::size_t const d : different)
+            ASSERT_EQ(d, 0u);
+    });
+}
+
+} // namespace
+} // namespace zsi

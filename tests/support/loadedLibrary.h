@@ -1,0 +1,203 @@
+/// The shared object as a host sees it: its dynamic symbols, and shaders made through them.
+#pragma once
+
+#include <cstdint>
+#include <dlfcn.h>
+#include <elf.h>
+#include <fstream>
+#include <iterator>
+#include <memory>
+#include <set>
+#include <stdexcept>
+#include <string>
+#include <vector>
+#include <zsi/zsi.h>
+
+namespace zsi::test {
+
+/// What the dynamic section of an ELF file says.
+struct ElfFile {
+    std::set<std::string> defined; ///< dynamic symbols that the file offers
+    std::set<std::string> needed; ///< libraries that it asks for
+    std::size_t initialisers = 0; ///< entries of .init_array
+
+    explicit ElfFile(std::string const& path)
+    {
+        std::ifstream in(path, std::ios::binary);
+        std::vector<char> const file{std::istreambuf_iterator<char>(in), {}};
+        if (file.size() < sizeof(Elf64_Ehdr))
+            throw std::runtime_error("no ELF file: " + path);
+        auto const* header = reinterpret_cast<Elf64_Ehdr const*>(file.data());
+        auto const* sections = reinterpret_cast<Elf64_Shdr const*>(file.data() + header->e_shoff);
+        for (int i = 0; i < header->e_shnum; ++i) {
+            Elf64_Shdr const& s = sections[i];
+            char const* data = file.data() + s.sh_offset;
+            char const* names = file.data() + sections[s.sh_link].sh_offset;
+            if (s.sh_type == SHT_INIT_ARRAY)
+                initialisers = s.sh_size / sizeof(void*);
+            for (auto const* symbol = reinterpret_cast<Elf64_Sym const*>(data);
+                 s.sh_type == SHT_DYNSYM
+                 && reinterpret_cast<char const*>(symbol) < data + s.sh_size;
+                 ++symbol)
+                if (symbol->st_shndx != SHN_UNDEF)
+                    defined.insert(names + symbol->st_name);
+            for (auto const* entry = reinterpret_cast<Elf64_Dyn const*>(data);
+                 s.sh_type == SHT_DYNAMIC
+                 && reinterpret_cast<char const*>(entry) < data + s.sh_size;
+                 ++entry)
+                if (entry->d_tag == DT_NEEDED)
+                    needed.insert(names + entry->d_un.d_val);
+        }
+    }
+};
+
+/// The loaded library; stays loaded for the life of the process.
+class Library {
+public:
+    static Library const& instance()
+    {
+        static Library const library;
+        return library;
+    }
+
+    std::set<std::string> classes; ///< names before `_create`
+
+    std::unique_ptr<IShaderBase> create(std::string const& name) const
+    {
+        return std::unique_ptr<IShaderBase>(function<CreateShaderFunction>(name + "_create")());
+    }
+    int apiVersion(std::string const& name) const
+    {
+        return function<GetApiVersionFunction>(name + "_getAPIVersion")();
+    }
+    template <class F>
+    F function(std::string const& name) const
+    {
+        void* const f = dlsym(handle_, name.c_str());
+        if (!f)
+            throw std::runtime_error("the library has no " + name);
+        return reinterpret_cast<F>(f);
+    }
+
+private:
+    void* handle_ = dlopen(ZSI_SHADER_LIBRARY, RTLD_NOW | RTLD_LOCAL);
+
+    Library()
+    {
+        if (!handle_)
+            throw std::runtime_error(dlerror());
+        std::string const suffix = "_create";
+        for (std::string const& symbol : ElfFile(ZSI_SHADER_LIBRARY).defined)
+            if (symbol.ends_with(suffix))
+                classes.insert(symbol.substr(0, symbol.size() - suffix.size()));
+    }
+};
+
+/// One call of `registerShader`, in order.
+struct Registered {
+    std::string type; ///< of a parameter, or "attribute"
+    std::string name;
+    unsigned char* field; ///< null for an attribute
+    std::size_t size;
+    std::size_t alignment;
+    int kind;
+    long offset;
+};
+
+/// A manager that writes down what a shader registers.
+class RecordingManager final : public IShaderManager {
+public:
+    std::vector<int> masks;
+    std::vector<Registered> rows;
+    bool maskFirst = false; ///< `declareEntryPoints` came before every other call
+    bool sameShader = true; ///< every call named the same shader
+
+    explicit RecordingManager(IShaderBase& shader)
+        : shader_(&shader)
+    {
+        shader.registerShader(this);
+    }
+
+    void declareEntryPoints(IShaderBase* s, int mask) override
+    {
+        sameShader = sameShader && s == shader_;
+        maskFirst = masks.empty() && rows.empty();
+        masks.push_back(mask);
+    }
+    void registerBool(IShaderBase* s, char const* n, bool* f) override { add(s, "bool", n, f); }
+    void registerInt(IShaderBase* s, char const* n, int* f) override { add(s, "int", n, f); }
+    void registerFloat(IShaderBase* s, char const* n, float* f) override { add(s, "float", n, f); }
+    void registerVec2f(IShaderBase* s, char const* n, Vec2f* f) override { add(s, "Vec2f", n, f); }
+    void registerVec3f(IShaderBase* s, char const* n, Vec3f* f) override { add(s, "Vec3f", n, f); }
+    void registerVec4f(IShaderBase* s, char const* n, Vec4f* f) override { add(s, "Vec4f", n, f); }
+    void registerMat3f(IShaderBase* s, char const* n, Mat3f* f) override { add(s, "Mat3f", n, f); }
+    void registerMat4f(IShaderBase* s, char const* n, Mat4f* f) override { add(s, "Mat4f", n, f); }
+    void registerTexture1D(IShaderBase* s, char const* n, TextureSampler1D* f) override
+    {
+        add(s, "Texture1D", n, f);
+    }
+    void registerTexture2D(IShaderBase* s, char const* n, TextureSampler2D* f) override
+    {
+        add(s, "Texture2D", n, f);
+    }
+    void registerTextureCube(IShaderBase* s, char const* n, TextureSamplerCube* f) override
+    {
+        add(s, "TextureCube", n, f);
+    }
+    void registerAttribute(IShaderBase* s, int kind, char const* name, long offset) override
+    {
+        sameShader = sameShader && s == shader_;
+        rows.push_back({"attribute", name, nullptr, 0, 0, kind, offset});
+    }
+
+private:
+    IShaderBase* shader_;
+
+    template <class T>
+    void add(IShaderBase* s, char const* type, char const* name, T* field)
+    {
+        sameShader = sameShader && s == shader_;
+        rows.push_back(
+            {type, name, reinterpret_cast<unsigned char*>(field), sizeof(T), alignof(T), 0, 0});
+    }
+};
+
+/// An entry point: its bit in the mask, the kind of class that has it, and how to call it.
+struct EntryPointCall {
+    char const* name;
+    int bit; ///< 16 would be `specularity`, which no class declares
+    int kind;
+    void (*call)(IShaderBase const&, IShaderAPI*, ShadeState&);
+};
+inline constexpr EntryPointCall kEntryPoints[] = {
+    {"shade", 1, 0,
+     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
+         static_cast<MaterialShader const&>(s).shade(api, r);
+     }},
+    {"transmission", 2, 0,
+     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
+         static_cast<MaterialShader const&>(s).transmission(api, r);
+     }},
+    {"transfer", 4, 0,
+     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
+         static_cast<MaterialShader const&>(s).transfer(api, r);
+     }},
+    {"sample", 8, 0,
+     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
+         static_cast<MaterialShader const&>(s).sample(api, r);
+     }},
+    {"specularity", 16, 0,
+     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
+         static_cast<MaterialShader const&>(s).specularity(api, r);
+     }},
+    {"illumination", 32, 1,
+     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
+         static_cast<LightShader const&>(s).illumination(api, r);
+     }},
+    {"environment shade", 64, 2,
+     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
+         static_cast<EnvironmentShader const&>(s).shade(api, r);
+     }},
+};
+
+} // namespace zsi::test
