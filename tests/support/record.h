@@ -51,6 +51,12 @@ std::string strayWrite(ShadeState const& before, ShadeState const& after,
     return {};
 }
 
+/// For oracles: the products and the sum in double.
+inline double dotOf(Vec3f a, Vec3f b)
+{
+    return double(a.x) * double(b.x) + double(a.y) * double(b.y) + double(a.z) * double(b.z);
+}
+
 /// Random inputs with a fixed seed.
 struct Random {
     std::mt19937 engine{20240517u};
