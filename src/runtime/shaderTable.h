@@ -22,23 +22,23 @@ struct Registrar {
     IShaderManager* manager;
     IShaderBase* shader;
 
-    void field(char const* name, bool& f) { manager->registerBool(shader, name, &f); }
-    void field(char const* name, int& f) { manager->registerInt(shader, name, &f); }
-    void field(char const* name, float& f) { manager->registerFloat(shader, name, &f); }
-    void field(char const* name, Vec2f& f) { manager->registerVec2f(shader, name, &f); }
-    void field(char const* name, Vec3f& f) { manager->registerVec3f(shader, name, &f); }
-    void field(char const* name, Vec4f& f) { manager->registerVec4f(shader, name, &f); }
-    void field(char const* name, Mat3f& f) { manager->registerMat3f(shader, name, &f); }
-    void field(char const* name, Mat4f& f) { manager->registerMat4f(shader, name, &f); }
-    void field(char const* name, TextureSampler1D& f)
+    void field(char const* name, bool& f) const { manager->registerBool(shader, name, &f); }
+    void field(char const* name, int& f) const { manager->registerInt(shader, name, &f); }
+    void field(char const* name, float& f) const { manager->registerFloat(shader, name, &f); }
+    void field(char const* name, Vec2f& f) const { manager->registerVec2f(shader, name, &f); }
+    void field(char const* name, Vec3f& f) const { manager->registerVec3f(shader, name, &f); }
+    void field(char const* name, Vec4f& f) const { manager->registerVec4f(shader, name, &f); }
+    void field(char const* name, Mat3f& f) const { manager->registerMat3f(shader, name, &f); }
+    void field(char const* name, Mat4f& f) const { manager->registerMat4f(shader, name, &f); }
+    void field(char const* name, TextureSampler1D& f) const
     {
         manager->registerTexture1D(shader, name, &f);
     }
-    void field(char const* name, TextureSampler2D& f)
+    void field(char const* name, TextureSampler2D& f) const
     {
         manager->registerTexture2D(shader, name, &f);
     }
-    void field(char const* name, TextureSamplerCube& f)
+    void field(char const* name, TextureSamplerCube& f) const
     {
         manager->registerTextureCube(shader, name, &f);
     }
