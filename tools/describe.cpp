@@ -37,7 +37,7 @@ inline std::string text(float const* v, int n)
 }
 inline std::string text(Vec2f const& v) { return text(&v.x, 2); }
 inline std::string text(Vec3f const& v) { return text(&v.x, 3); }
-inline std::string text(Vec4f const& v) { return text(&v.x, 4); }
+[[maybe_unused]] inline std::string text(Vec4f const& v) { return text(&v.x, 4); }
 inline std::string text(Mat3f const& v) { return text(v.m, 9); }
 inline std::string text(Mat4f const& v) { return text(v.m, 16); }
 template <class Coordinate>
@@ -54,7 +54,10 @@ constexpr char const* typeName(Vec3f const*) { return "Vec3f"; }
 constexpr char const* typeName(Vec4f const*) { return "Vec4f"; }
 constexpr char const* typeName(Mat3f const*) { return "Mat3f"; }
 constexpr char const* typeName(Mat4f const*) { return "Mat4f"; }
-constexpr char const* typeName(TextureSampler1D const*) { return "TextureSampler1D"; }
+[[maybe_unused]] constexpr char const* typeName(TextureSampler1D const*)
+{
+    return "TextureSampler1D";
+}
 constexpr char const* typeName(TextureSampler2D const*) { return "TextureSampler2D"; }
 constexpr char const* typeName(TextureSamplerCube const*) { return "TextureSamplerCube"; }
 
