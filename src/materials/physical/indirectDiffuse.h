@@ -1,0 +1,28 @@
+/// Indirect light on a diffuse layer.
+#pragma once
+
+#include <zsi/vecmath.h>
+#include <zsi/zsi.h>
+
+namespace zsi {
+
+/// Member for the classes that gather indirect light.
+struct IndirectDiffuseFunctions {
+    /// weight: the diffuse colour. weight x (ambient + indirect) x occlusion; the services are
+    /// asked only as far as the result can still differ from black.
+    Vec3f f_rtIndirectDiffuse(IShaderAPI* api, ShadeState const&, Vec3f weight, Vec3f P,
+                              Vec3f N) const
+    {
+        Vec3f const kBlack(0.0f, 0.0f, 0.0f);
+        if (weight == kBlack)
+            return weight;
+        Vec3f const arriving =
+            api->ambientLight(&P, &N) + api->indirectDiffuse(&P, &N, maxComponent(weight));
+        if (arriving == kBlack)
+            return arriving;
+        Vec3f const lit = weight * arriving;
+        return lit * api->occlusion(&P, &N, maxComponent(lit));
+    }
+};
+
+} // namespace zsi

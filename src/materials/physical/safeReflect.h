@@ -1,0 +1,55 @@
+/// Mirror directions that stay above the geometric surface.
+#pragma once
+
+#include <cmath>
+#include <zsi/vecmath.h>
+#include <zsi/zsi.h>
+
+namespace zsi {
+
+/// Least height of a reflected direction above the geometric surface, as a cosine.
+inline constexpr float kReflectMargin = 0.05f;
+
+/// `R` unless it dips below the margin; then the unit vector in the plane of I and N whose height
+/// is the margin, or N where there is none. I: towards the surface; Ng, N: on the viewer's side;
+/// R: the mirror direction of I about N.
+inline Vec3f keepAboveSurface(Vec3f const& R, Vec3f const& I, Vec3f const& Ng, Vec3f const& N)
+{
+    if (dot(R, Ng) >= kReflectMargin)
+        return R;
+    // R' = alpha I + beta N with |R'| = 1 and R'.Ng = margin: a quadratic in beta.
+    float const g = dot(I, Ng), s = dot(Ng, N), d = dot(I, N);
+    float const A = s * s + g * g - 2.0f * (d * g) * s;
+    float const B = (d * g - s) * 2.0f * kReflectMargin;
+    float const C = 0.0025f - g * g;
+    float beta;
+    if (A != 0.0f) {
+        float const discriminant = B * B - 4.0f * A * C;
+        if (discriminant < 0.0f)
+            return N;
+        float const root = std::sqrt(discriminant);
+        beta = maxOf((-root - B) / (2.0f * A), (root - B) / (2.0f * A));
+    } else {
+        if (B == 0.0f)
+            return N;
+        beta = -C / B;
+    }
+    float const alpha = (kReflectMargin - beta * s) / g;
+    return normalize(alpha * I + beta * N);
+}
+
+/// I mirrored about N, kept above the surface.
+inline Vec3f f_safe_reflect(IShaderAPI*, ShadeState const&, Vec3f I, Vec3f Ng, Vec3f N)
+{
+    return keepAboveSurface(I - 2.0f * dot(N, I) * N, I, Ng, N);
+}
+
+/// The same as a member; derive from this where the shading language had one.
+struct SafeReflectFunctions {
+    Vec3f f_safe_reflect(IShaderAPI* api, ShadeState const& state, Vec3f I, Vec3f Ng, Vec3f N) const
+    {
+        return zsi::f_safe_reflect(api, state, I, Ng, N);
+    }
+};
+
+} // namespace zsi
