@@ -20,6 +20,7 @@ struct ElfFile {
     std::set<std::string> defined; ///< dynamic symbols that the file offers
     std::set<std::string> needed; ///< libraries that it asks for
     std::size_t initialisers = 0; ///< entries of .init_array
+    std::size_t variables = 0; ///< bytes of .data and .bss
 
     explicit ElfFile(std::string const& path)
     {
@@ -33,6 +34,10 @@ struct ElfFile {
             Elf64_Shdr const& s = sections[i];
             char const* data = file.data() + s.sh_offset;
             char const* names = file.data() + sections[s.sh_link].sh_offset;
+            std::string const section =
+                file.data() + sections[header->e_shstrndx].sh_offset + s.sh_name;
+            if (section == ".data" || section == ".bss")
+                variables += s.sh_size;
             if (s.sh_type == SHT_INIT_ARRAY)
                 initialisers = s.sh_size / sizeof(void*);
             for (auto const* symbol = reinterpret_cast<Elf64_Sym const*>(data);
