@@ -183,7 +183,7 @@ inline ShadeState fillRecord(Supply& supply)
         std::memcpy(s.attributes + at, &v, sizeof v);
     }
     constexpr std::array<std::uint32_t, 5> kRays{1, 2, 4, 16, 32};
-    s.rayType = kRays[supply.bits() % kRays.size()];
+    s.rayType = supply.chance(8) ? supply.bits() : kRays[supply.bits() % kRays.size()];
     s.rayDepth = supply.bits() % 4;
     s.maxRayDepth = 2;
     for (int i = 0; i < 3; ++i) {
