@@ -1,0 +1,84 @@
+/// Procedural height patterns of the Ward family, built on the host's noise.
+#pragma once
+
+#include <zsi/vecmath.h>
+#include <zsi/zsi.h>
+
+namespace zsi {
+
+/// Values of `u_procedureMapEnable`.
+enum WardPattern : int {
+    kPatternNone = 0,
+    kPatternNoise = 1, ///< the noise that the dielectric bumps with
+    kPatternBrush = 2,
+    kPatternSmoke = 3,
+    kPatternCells = 4,
+};
+
+/// Pattern members of a Ward class. Each takes a point in pattern space and gives a height in
+/// 0..1, to be differentiated into a bump.
+template <class Shader>
+struct WardNoiseFunctions {
+    /// Brushed metal: streaks, made of noise that is stretched per axis; two octaves, the second
+    /// of half the width and strength.
+    float f_rtBrushNoise(IShaderAPI* api, ShadeState const&, Vec3f p, Vec3f frequency) const
+    {
+        Vec3f const q = p * frequency;
+        Vec4f const coarse = withAlpha(q, 0.0f);
+        Vec4f const fine = withAlpha(q * 2.0f, 0.5f);
+        return (2.0f * api->noise3D(&coarse) + api->noise3D(&fine)) / 3.0f;
+    }
+
+    /// Smoke: turbulence, a sum of absolute signed noise (Perlin 1985, "An Image Synthesizer"),
+    /// as a density of 0..1. `u_smokeMap`, where there is one, shapes it into a height.
+    float f_rtSmokeNoise(IShaderAPI* api, ShadeState const&, Vec3f p, Vec3f frequency) const
+    {
+        constexpr int kOctaves = 4;
+        Vec3f q = p * frequency;
+        float density = 0.0f;
+        float amplitude = 1.0f;
+        for (int i = 0; i < kOctaves; ++i) {
+            density += amplitude * std::fabs(api->noise3DPoint(&q));
+            q = q * 2.0f;
+            amplitude *= 0.5f;
+        }
+        density = clamp01(density);
+        auto const& ramp = static_cast<Shader const&>(*this).u_smokeMap;
+        return ramp.texture ? ramp.lookup(density).x : density;
+    }
+
+    /// Cells: distance to the nearest of one feature point per unit cube (Worley 1996, "A Cellular
+    /// Texture Basis Function", F1), clamped to 1. jitter: how far the points stray from the
+    /// middle of their cube, 0 a lattice .. 1 the whole cube.
+    float f_rtCellular(IShaderAPI* api, ShadeState const&, Vec3f p, Vec3f jitter) const
+    {
+        Vec3f const base(std::floor(p.x), std::floor(p.y), std::floor(p.z));
+        float nearest2 = 1.0f;
+        for (int i = 0; i < 27; ++i) {
+            Vec3f const cell = base
+                + Vec3f(static_cast<float>(i % 3 - 1), static_cast<float>(i / 3 % 3 - 1),
+                        static_cast<float>(i / 9 - 1));
+            Vec3f const middle = cell + grey(0.5f); // the middle, so that rounding finds its cube
+            Vec3f const d = middle + jitter * (api->cellNoise3D(&middle) - grey(0.5f)) - p;
+            nearest2 = minOf(nearest2, dot(d, d));
+        }
+        return std::sqrt(nearest2);
+    }
+
+    /// Height of pattern `kind` at `p`; 0 for kinds that are no height pattern.
+    float patternHeight(IShaderAPI* api, ShadeState const& state, int kind, Vec3f p) const
+    {
+        switch (kind) {
+        case kPatternBrush:
+            return f_rtBrushNoise(api, state, p, {0.5f, 40.0f, 40.0f});
+        case kPatternSmoke:
+            return f_rtSmokeNoise(api, state, p, {1.0f, 1.0f, 1.0f});
+        case kPatternCells:
+            return f_rtCellular(api, state, p, {0.9f, 0.9f, 0.9f});
+        default:
+            return 0.0f;
+        }
+    }
+};
+
+} // namespace zsi
