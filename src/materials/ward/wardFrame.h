@@ -26,24 +26,15 @@ struct WardFrameFunctions {
     /// Tangent, bitangent and normal at `P`, bent by the pattern or the first bump map, then by
     /// the second, then turned about the normal. toWorld takes the "tangent" attribute to world
     /// space. A pattern leaves the normal's length as it comes out.
-    void f_computeShadingFrame(IShaderAPI* api, ShadeState const& state, Vec3f P, Vec3f N,
-                               Mat3f const& toWorld, SLArray<Vec3f>& frame) const
+    [[gnu::always_inline]] void f_computeShadingFrame(IShaderAPI* api, ShadeState const& state,
+                                                      Vec3f P, Vec3f N, Mat3f const& toWorld,
+                                                      SLArray<Vec3f>& frame) const
     {
         auto const& s = self();
         frame = computeBaseFrame(Shader::attribute_tangent(state), N, toWorld);
-        if (s.u_normal0MapEnable) [[unlikely]] {
-            Vec2f const uv = Shader::attribute_uv(state);
-            float const amount = s.u_normal0Amount
-                * Shader::scalar(state, s.u_normal0AmountMapEnable, s.u_normal0AmountMap,
-                                 s.u_normal0AmountTransform, 1.0f, 1.0f);
-            bend(frame, s.normal0Heights(api, state, frame, uv, state.Pref), amount);
-        } else if (s.u_procedureMapEnable != kPatternNone) [[unlikely]] {
-            perturbByPattern(api, state, P, toWorld, frame);
-        }
-        if (s.u_normal1MapEnable) [[unlikely]]
-            bend(frame,
-                 bumpHeights(s.u_normal1Map, s.u_normal1Transform, Shader::attribute_uv(state)),
-                 s.u_normal1Amount);
+        if (s.u_normal0MapEnable || s.u_procedureMapEnable != kProcedureNone
+            || s.u_normal1MapEnable) [[unlikely]]
+            bendFrame(api, state, P, toWorld, frame);
         s.f_anisoRotateFrame(api, state, frame, 0.0f);
     }
 
@@ -62,6 +53,8 @@ struct WardFrameFunctions {
     {
         constexpr float kMaxAngle = 1.553343f; // 89 degrees
         constexpr float kSmallTilt = 0.08f; // below: sin(a)/sin(b) loses digits
+        if (bumped == plain)
+            return normalize(bumped);
         Vec3f const v = normalize(viewer);
         Vec3f const n = normalize(plain);
         Vec3f const m = normalize(bumped);
@@ -84,11 +77,27 @@ struct WardFrameFunctions {
 private:
     Shader const& self() const { return static_cast<Shader const&>(*this); }
 
+    [[gnu::noinline]] void bendFrame(IShaderAPI* api, ShadeState const& state, Vec3f P,
+                                     Mat3f const& toWorld, SLArray<Vec3f>& frame) const
+    {
+        auto const& s = self();
+        Vec2f const uv = Shader::attribute_uv(state);
+        if (s.u_normal0MapEnable) {
+            float const amount = s.u_normal0Amount
+                * Shader::scalar(state, s.u_normal0AmountMapEnable, s.u_normal0AmountMap,
+                                 s.u_normal0AmountTransform, 1.0f, 1.0f);
+            bend(frame, s.normal0Heights(api, state, frame, uv, state.Pref), amount);
+        } else if (s.u_procedureMapEnable != kProcedureNone) {
+            perturbByPattern(api, state, P, toWorld, frame);
+        }
+        if (s.u_normal1MapEnable)
+            bend(frame, bumpHeights(s.u_normal1Map, s.u_normal1Transform, uv), s.u_normal1Amount);
+    }
+
     static void bend(SLArray<Vec3f>& frame, SLArray<float> const& heights, float amount)
     {
-        perturbByHeights(frame, heights, amount);
-        frame[2] = normalize(frame[2]);
-        reorthogonalize(frame);
+        bendByHeights(frame, heights, amount);
+        normalizeAndReorthogonalize(frame);
     }
 
     /// Adds the pattern's offset, in frame coordinates, to the normal; its length is left as it
@@ -99,27 +108,26 @@ private:
         auto const& s = self();
         int const kind = s.u_procedureMapEnable;
         auto const pattern = [&](Vec3f at) {
-            return f_elm_rtpb_XYZGenerator(api, state, 1, at, toWorld, Vec4f(0, 0, 0, 0),
-                                           s.u_procedureMapTiling, Vec3f(-0.6f, -0.6f, 0.5f), 0, 0);
+            return f_elm_rtpb_XYZGenerator(api, state, kPatternObject, at, toWorld,
+                                           Vec4f(0.0f, 0.0f, 0.0f, 0.0f), s.u_procedureMapTiling,
+                                           Vec3f(-0.6f, -0.6f, 0.5f), 0.0f, 0.0f);
         };
         Vec3f const p = pattern(P);
-        Vec3f d(0.0f, 0.0f, 0.0f);
-        if (kind == kPatternNoise) {
-            d = f_noiseEvalNormalPerturb(api, state, p, 2.6f, 2.0f, frame);
+        Vec3f offset(0.0f, 0.0f, 0.0f);
+        if (kind == kProcedureNoise) {
+            offset = rippleOffset(api, state, p, frame);
         } else {
             // Slopes in pattern units, so that the tiling changes the size and not the depth.
             constexpr float kStep = 0.01f;
+            float const here = s.patternHeight(api, state, kind, p);
             auto const slope = [&](Vec3f along) {
                 Vec3f const q = p + normalize(pattern(P + along) - p) * kStep;
-                return (s.patternHeight(api, state, kind, p) - s.patternHeight(api, state, kind, q))
-                    / kStep;
+                return (here - s.patternHeight(api, state, kind, q)) / kStep;
             };
-            d.x = slope(frame[0]);
-            d.y = slope(frame[1]);
+            offset.x = slope(frame[0]);
+            offset.y = slope(frame[1]);
         }
-        d *= s.u_procedureMapAmount;
-        frame[2] = frame[2] + frame[0] * d.x + frame[1] * d.y + frame[2] * d.z;
-        reorthogonalize(frame);
+        bendByOffset(frame, offset * s.u_procedureMapAmount);
     }
 };
 

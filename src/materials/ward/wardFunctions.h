@@ -20,8 +20,8 @@ namespace zsi {
 template <class Shader>
 struct WardFunctions : AmbientOcclusionFunctions<Shader>,
                        MaskingFunctions<Shader>,
-                       SafeReflectFunctions<Shader>,
-                       IndirectDiffuseFunctions<Shader>,
+                       SafeReflectFunctions,
+                       IndirectDiffuseFunctions,
                        AnisoRotationFunctions<Shader>,
                        WardLobeFunctions<Shader>,
                        WardNoiseFunctions<Shader>,

@@ -71,10 +71,9 @@ struct WardLobeFunctions {
     {
         auto const& s = self();
         ax = s.u_roughValue;
-        if (s.u_roughMapEnable) [[unlikely]] {
-            float const t = texel(state, s.u_roughMap, s.u_roughTransform).x;
-            ax = roughnessOfGlossiness(1.0f - clamp01(t * s.u_roughAmount));
-        }
+        if (s.u_roughMapEnable) [[unlikely]]
+            ax = roughnessOfGlossiness(
+                1.0f - clamp01(mapped(state, s.u_roughMap, s.u_roughTransform, s.u_roughAmount)));
         ay = ax
             * scalar(state, s.u_anisotropyMapEnable, s.u_anisotropyMap, s.u_anisotropyTransform,
                      s.u_anisotropyAmount, s.u_anisotropyValue);
@@ -83,34 +82,21 @@ struct WardLobeFunctions {
     /// Colours of the lobes: diffuse and specular reflectance, straight transmittance, and the
     /// filter that translucent light takes on. cosTheta: of the incident direction.
     /// The far side reflects nothing but what shadow rays ask for by `withFresnel`.
-    void f_computeWardLobeColors(IShaderAPI* api, ShadeState const& state, bool frontSide,
-                                 bool withFresnel, float cosTheta, Vec3f& diffuse, Vec3f& specular,
-                                 Vec3f& transmit, Vec3f& filter, Vec3f position) const
+    /// Inlined into each caller, so that the colours stay in registers; maps are called.
+    [[gnu::always_inline]] void f_computeWardLobeColors(IShaderAPI* api, ShadeState const& state,
+                                                        bool frontSide, bool withFresnel,
+                                                        float cosTheta, Vec3f& diffuse,
+                                                        Vec3f& specular, Vec3f& transmit,
+                                                        Vec3f& filter, Vec3f position) const
     {
         auto const& s = self();
-        specular = s.u_specularColor;
-        if (s.u_specularMapEnable) [[unlikely]]
-            specular = clamp01(rgb(texel(state, s.u_specularMap, s.u_specularTransform))
-                               * s.u_specularAmount);
-        diffuse = s.u_diffuseColor;
-        if (s.u_diffuseMapEnable) [[unlikely]] {
-            Vec4f const c = s.diffuseMap(api, state, Shader::attribute_uv(state), position);
-            diffuse = s.u_imageFadeEnable == 1 ? mix(diffuse, rgb(c), c.w * s.u_imageFade) : rgb(c);
-        }
-        if (s.u_imageFadeEnable > 1) [[unlikely]]
-            diffuse = s.f_rtMix2Color(api, state, diffuse, fadeColor(state), s.u_imageFade);
-
         float F = 0.0f;
-        if (frontSide || withFresnel) {
-            float const r0 =
-                scalar(state, s.u_brdf00ReflectMapEnable, s.u_brdf00ReflectMap,
-                       s.u_brdf00ReflectTransform, s.u_brdf00ReflectAmount, s.u_brdf00Reflectivity);
-            float const r90 =
-                scalar(state, s.u_brdf90ReflectMapEnable, s.u_brdf90ReflectMap,
-                       s.u_brdf90ReflectTransform, s.u_brdf90ReflectAmount, s.u_brdf90Reflectivity);
-            float const curve = std::pow(1.0f - clamp01(cosTheta), s.u_brdfCurvePower);
-            F = clamp01(r0 + curve * (r90 - r0)) * s.u_reflectivity;
-        }
+        if (frontSide || withFresnel)
+            F = reflectivity(state, cosTheta);
+        diffuse = s.u_diffuseColor;
+        specular = s.u_specularColor;
+        if (s.u_specularMapEnable || s.u_diffuseMapEnable || s.u_imageFadeEnable > 1) [[unlikely]]
+            mapColors(api, state, position, diffuse, specular);
         if (s.u_isMetal) {
             float const Y = dot(Vec3f(0.212671f, 0.71516f, 0.072169f), specular);
             specular *= diffuse;
@@ -120,12 +106,76 @@ struct WardLobeFunctions {
         diffuse *= 1.0f - F;
         transmit = {0.0f, 0.0f, 0.0f};
         filter = {1.0f, 1.0f, 1.0f};
-        if (!s.u_transparency) {
-            if (!frontSide)
-                diffuse = {0.0f, 0.0f, 0.0f};
-            return;
-        }
+        if (s.u_transparency)
+            layTransparency(state, frontSide, F, diffuse, transmit, filter);
+        else if (!frontSide)
+            diffuse = {0.0f, 0.0f, 0.0f};
+    }
 
+    Vec3f f_rtMix2Color(IShaderAPI*, ShadeState const&, Vec3f a, Vec3f b, float t) const
+    {
+        return mix2Color(a, b, t);
+    }
+
+    /// A map at the uv attribute taken through its transform.
+    static Vec4f texel(ShadeState const& state, TextureSampler2D const& map, Mat3f const& transform)
+    {
+        return map.lookup(transformUv(transform, Shader::attribute_uv(state)));
+    }
+    /// A scalar map times its amount.
+    [[gnu::noinline]] static float mapped(ShadeState const& state, TextureSampler2D const& map,
+                                          Mat3f const& transform, float amount)
+    {
+        return texel(state, map, transform).x * amount;
+    }
+    /// A scalar channel.
+    static float scalar(ShadeState const& state, bool enable, TextureSampler2D const& map,
+                        Mat3f const& transform, float amount, float plain)
+    {
+        if (enable) [[unlikely]]
+            return mapped(state, map, transform, amount);
+        return plain;
+    }
+
+private:
+    Shader const& self() const { return static_cast<Shader const&>(*this); }
+
+    /// Part of the light that the specular layer reflects, from head-on to grazing along a power
+    /// curve.
+    float reflectivity(ShadeState const& state, float cosTheta) const
+    {
+        auto const& s = self();
+        float const r0 =
+            scalar(state, s.u_brdf00ReflectMapEnable, s.u_brdf00ReflectMap,
+                   s.u_brdf00ReflectTransform, s.u_brdf00ReflectAmount, s.u_brdf00Reflectivity);
+        float const r90 =
+            scalar(state, s.u_brdf90ReflectMapEnable, s.u_brdf90ReflectMap,
+                   s.u_brdf90ReflectTransform, s.u_brdf90ReflectAmount, s.u_brdf90Reflectivity);
+        float const curve = std::pow(1.0f - clamp01(cosTheta), s.u_brdfCurvePower);
+        return clamp01(r0 + curve * (r90 - r0)) * s.u_reflectivity;
+    }
+
+    /// The colours where maps or the image fade give them.
+    [[gnu::noinline]] void mapColors(IShaderAPI* api, ShadeState const& state, Vec3f position,
+                                     Vec3f& diffuse, Vec3f& specular) const
+    {
+        auto const& s = self();
+        if (s.u_specularMapEnable)
+            specular = clamp01(rgb(texel(state, s.u_specularMap, s.u_specularTransform))
+                               * s.u_specularAmount);
+        if (s.u_diffuseMapEnable) {
+            Vec4f const c = s.diffuseMap(api, state, Shader::attribute_uv(state), position);
+            diffuse = s.u_imageFadeEnable == 1 ? mix(diffuse, rgb(c), c.w * s.u_imageFade) : rgb(c);
+        }
+        if (s.u_imageFadeEnable > 1)
+            diffuse = s.f_rtMix2Color(api, state, diffuse, fadeColor(state), s.u_imageFade);
+    }
+
+    /// Takes light from the diffuse layer for transmission, straight and diffused.
+    [[gnu::noinline]] void layTransparency(ShadeState const& state, bool frontSide, float F,
+                                           Vec3f& diffuse, Vec3f& transmit, Vec3f& filter) const
+    {
+        auto const& s = self();
         float tr = s.u_transparencyValue;
         if (s.u_transparencyMapEnable) {
             float const t = texel(state, s.u_transparencyMap, s.u_transparencyTransform).x;
@@ -144,28 +194,6 @@ struct WardLobeFunctions {
         diffuse *= tl * tr;
         transmit = filter * ((1.0f - F) * (1.0f - tl) * tr);
     }
-
-    Vec3f f_rtMix2Color(IShaderAPI*, ShadeState const&, Vec3f a, Vec3f b, float t) const
-    {
-        return mix2Color(a, b, t);
-    }
-
-    /// A map at the uv attribute taken through its transform.
-    static Vec4f texel(ShadeState const& state, TextureSampler2D const& map, Mat3f const& transform)
-    {
-        return map.lookup(transformUv(transform, Shader::attribute_uv(state)));
-    }
-    /// A scalar channel.
-    static float scalar(ShadeState const& state, bool enable, TextureSampler2D const& map,
-                        Mat3f const& transform, float amount, float plain)
-    {
-        if (enable) [[unlikely]]
-            return texel(state, map, transform).x * amount;
-        return plain;
-    }
-
-private:
-    Shader const& self() const { return static_cast<Shader const&>(*this); }
 
     Vec3f fadeColor(ShadeState const& state) const
     {

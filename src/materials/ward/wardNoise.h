@@ -7,12 +7,12 @@
 namespace zsi {
 
 /// Values of `u_procedureMapEnable`.
-enum WardPattern : int {
-    kPatternNone = 0,
-    kPatternNoise = 1, ///< the noise that the dielectric bumps with
-    kPatternBrush = 2,
-    kPatternSmoke = 3,
-    kPatternCells = 4,
+enum ProcedureMap : int {
+    kProcedureNone = 0,
+    kProcedureNoise = 1, ///< ripple, the same as the dielectric's
+    kProcedureBrush = 2,
+    kProcedureSmoke = 3,
+    kProcedureCells = 4,
 };
 
 /// Pattern members of a Ward class. Each takes a point in pattern space and gives a height in
@@ -69,11 +69,11 @@ struct WardNoiseFunctions {
     float patternHeight(IShaderAPI* api, ShadeState const& state, int kind, Vec3f p) const
     {
         switch (kind) {
-        case kPatternBrush:
+        case kProcedureBrush:
             return f_rtBrushNoise(api, state, p, {0.5f, 40.0f, 40.0f});
-        case kPatternSmoke:
+        case kProcedureSmoke:
             return f_rtSmokeNoise(api, state, p, {1.0f, 1.0f, 1.0f});
-        case kPatternCells:
+        case kProcedureCells:
             return f_rtCellular(api, state, p, {0.9f, 0.9f, 0.9f});
         default:
             return 0.0f;

@@ -39,15 +39,16 @@ struct WardScatteringFunctions {
             state.outBrdf = {0.0f, 0.0f, 0.0f};
             return;
         }
-        Lobes const lobes = frontLobes(api, state, at.v);
         float const cosine = cosineOf(state, at.Nf, l.z);
         if (cosine <= 0.0f) {
             state.sampleCosine = 0.0f;
             state.outBrdf = {0.0f, 0.0f, 0.0f};
             return;
         }
+        float const glossy = roughness(api, state).value(at.v, l);
+        Lobes const lobes = frontLobes(api, state, at.v.z);
         state.sampleCosine = cosine;
-        state.outBrdf = lobes.diffuse * kWardInvPi + lobes.specular * lobes.glossy.value(at.v, l);
+        state.outBrdf = lobes.diffuse * kWardInvPi + lobes.specular * glossy;
     }
 
     /// A direction from the mixture of both lobes, or from the glossy lobe alone where the host
@@ -59,11 +60,12 @@ struct WardScatteringFunctions {
             state.sampleType = kSampleNone;
             return;
         }
-        Lobes const lobes = frontLobes(api, state, at.v);
+        WardLobe const glossy = roughness(api, state);
+        Lobes const lobes = frontLobes(api, state, at.v.z);
         Vec3f const diffuse = lobes.diffuse * kWardInvPi;
 
         if (!state.allowReflection[0] && !state.allowReflection[1]) {
-            WardGlossySample const g = sampleWardLobe(lobes.glossy, at.v, api->random2D());
+            WardGlossySample const g = sampleWardLobe(glossy, at.v, api->random2D());
             if (!(g.direction.z >= 0.0f)) {
                 state.sampleType = kSampleNone;
                 return;
@@ -82,9 +84,9 @@ struct WardScatteringFunctions {
                                                              : 0.5f;
         WardGlossySample g;
         if (api->random() <= pd) {
-            g = evaluateWardLobe(lobes.glossy, at.v, sampleCosineHemisphere(api->random2D()));
+            g = evaluateWardLobe(glossy, at.v, sampleCosineHemisphere(api->random2D()));
         } else {
-            g = sampleWardLobe(lobes.glossy, at.v, api->random2D());
+            g = sampleWardLobe(glossy, at.v, api->random2D());
             if (!(g.direction.z >= 0.0f)) {
                 state.sampleType = kSampleNone;
                 return;
@@ -110,7 +112,6 @@ private:
     };
     struct Lobes {
         Vec3f diffuse, specular;
-        WardLobe glossy;
     };
 
     Shader const& self() const { return static_cast<Shader const&>(*this); }
@@ -124,14 +125,18 @@ private:
         at.v = toLocal(at.frame, state.I);
         return at;
     }
-    Lobes frontLobes(IShaderAPI* api, ShadeState const& state, Vec3f v) const
+    WardLobe roughness(IShaderAPI* api, ShadeState const& state) const
     {
-        auto const& s = self();
+        WardLobe lobe;
+        self().f_computeWardRoughness(api, state, lobe.ax, lobe.ay);
+        return lobe;
+    }
+    Lobes frontLobes(IShaderAPI* api, ShadeState const& state, float vz) const
+    {
         Lobes lobes;
-        s.f_computeWardRoughness(api, state, lobes.glossy.ax, lobes.glossy.ay);
         Vec3f transmit, filter;
-        s.f_computeWardLobeColors(api, state, true, false, -v.z, lobes.diffuse, lobes.specular,
-                                  transmit, filter, state.Pref);
+        self().f_computeWardLobeColors(api, state, true, false, -vz, lobes.diffuse, lobes.specular,
+                                       transmit, filter, state.Pref);
         return lobes;
     }
     float cosineOf(ShadeState const& state, Vec3f Nf, float localZ) const
