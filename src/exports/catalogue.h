@@ -10,6 +10,7 @@
 #include "materials/utility/corvid_Mtl_ShadowPlane.h"
 #include "materials/utility/corvid_Mtl_Solid.h"
 #include "materials/utility/corvid_Mtl_Unlit.h"
+#include "materials/ward/corvid_Mtl_Ward.h"
 
 #define ZSI_CATALOGUE(X)      \
     X(voPointLight)           \
@@ -20,4 +21,5 @@
     X(corvid_Mtl_Unlit)       \
     X(corvid_Mtl_NormalsOnly) \
     X(corvid_Mtl_ShadowPlane) \
-    X(corvid_Mtl_AmbientOnly)
+    X(corvid_Mtl_AmbientOnly) \
+    X(corvid_Mtl_Ward)

@@ -56,7 +56,7 @@ struct WardScatteringFunctions {
     void sampleWard(IShaderAPI* api, ShadeState& state) const
     {
         Surface const at = surface(api, state);
-        if (at.v.z >= 0.0f) {
+        if (!(at.v.z < 0.0f)) {
             state.sampleType = kSampleNone;
             return;
         }
