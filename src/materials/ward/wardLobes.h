@@ -46,8 +46,8 @@ struct WardLobeFunctions {
     Vec4f diffuseMap(IShaderAPI*, ShadeState const&, Vec2f uv, Vec3f /*position*/) const
     {
         auto const& s = self();
-        Vec4f const texel = s.u_diffuseMap.lookup(transformUv(s.u_diffuseTransform, uv));
-        return withAlpha(rgb(texel) * s.u_diffuseAmount, texel.w);
+        Vec4f const map = s.u_diffuseMap.lookup(transformUv(s.u_diffuseTransform, uv));
+        return withAlpha(rgb(map) * s.u_diffuseAmount, map.w);
     }
 
     /// Cut-out map, 0 hole .. 1 surface, without the amount.

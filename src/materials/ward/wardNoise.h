@@ -55,9 +55,9 @@ struct WardNoiseFunctions {
         Vec3f const base(std::floor(p.x), std::floor(p.y), std::floor(p.z));
         float nearest2 = 1.0f;
         for (int i = 0; i < 27; ++i) {
-            Vec3f const cell = base
-                + Vec3f(static_cast<float>(i % 3 - 1), static_cast<float>(i / 3 % 3 - 1),
-                        static_cast<float>(i / 9 - 1));
+            int const x = i % 3 - 1, y = i / 3 % 3 - 1, z = i / 9 - 1;
+            Vec3f const cell =
+                base + Vec3f(static_cast<float>(x), static_cast<float>(y), static_cast<float>(z));
             Vec3f const middle = cell + grey(0.5f); // the middle, so that rounding finds its cube
             Vec3f const d = middle + jitter * (api->cellNoise3D(&middle) - grey(0.5f)) - p;
             nearest2 = minOf(nearest2, dot(d, d));
