@@ -11,15 +11,33 @@
 #include "materials/utility/corvid_Mtl_Solid.h"
 #include "materials/utility/corvid_Mtl_Unlit.h"
 #include "materials/ward/corvid_Mtl_Ward.h"
+#include "materials/ward/corvid_Mtl_Ward_120b7820.h"
+#include "materials/ward/corvid_Mtl_Ward_33632204.h"
+#include "materials/ward/corvid_Mtl_Ward_5592d496.h"
+#include "materials/ward/corvid_Mtl_Ward_5ba0bfff.h"
+#include "materials/ward/corvid_Mtl_Ward_82261344.h"
+#include "materials/ward/corvid_Mtl_Ward_aa598cb4.h"
+#include "materials/ward/corvid_Mtl_Ward_b9aac246.h"
+#include "materials/ward/corvid_Mtl_Ward_ccb3a2e6.h"
+#include "materials/ward/corvid_Mtl_Ward_f05db29e.h"
 
-#define ZSI_CATALOGUE(X)      \
-    X(voPointLight)           \
-    X(voSpotLight)            \
-    X(corvid_Env_Default)     \
-    X(corvid_Env_Backplate)   \
-    X(corvid_Mtl_Solid)       \
-    X(corvid_Mtl_Unlit)       \
-    X(corvid_Mtl_NormalsOnly) \
-    X(corvid_Mtl_ShadowPlane) \
-    X(corvid_Mtl_AmbientOnly) \
-    X(corvid_Mtl_Ward)
+#define ZSI_CATALOGUE(X)        \
+    X(voPointLight)             \
+    X(voSpotLight)              \
+    X(corvid_Env_Default)       \
+    X(corvid_Env_Backplate)     \
+    X(corvid_Mtl_Solid)         \
+    X(corvid_Mtl_Unlit)         \
+    X(corvid_Mtl_NormalsOnly)   \
+    X(corvid_Mtl_ShadowPlane)   \
+    X(corvid_Mtl_AmbientOnly)   \
+    X(corvid_Mtl_Ward)          \
+    X(corvid_Mtl_Ward_120b7820) \
+    X(corvid_Mtl_Ward_33632204) \
+    X(corvid_Mtl_Ward_5592d496) \
+    X(corvid_Mtl_Ward_5ba0bfff) \
+    X(corvid_Mtl_Ward_82261344) \
+    X(corvid_Mtl_Ward_aa598cb4) \
+    X(corvid_Mtl_Ward_b9aac246) \
+    X(corvid_Mtl_Ward_ccb3a2e6) \
+    X(corvid_Mtl_Ward_f05db29e)
