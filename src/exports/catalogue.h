@@ -5,7 +5,10 @@
 #include "environments/corvid_Env_Default.h"
 #include "lights/voPointLight.h"
 #include "lights/voSpotLight.h"
+#include "materials/physical/corvid_Mtl_Dielectric.h"
+#include "materials/physical/corvid_Mtl_Glazing.h"
 #include "materials/utility/corvid_Mtl_AmbientOnly.h"
+#include "materials/utility/corvid_Mtl_Mirror.h"
 #include "materials/utility/corvid_Mtl_NormalsOnly.h"
 #include "materials/utility/corvid_Mtl_ShadowPlane.h"
 #include "materials/utility/corvid_Mtl_Solid.h"
@@ -40,4 +43,7 @@
     X(corvid_Mtl_Ward_aa598cb4) \
     X(corvid_Mtl_Ward_b9aac246) \
     X(corvid_Mtl_Ward_ccb3a2e6) \
-    X(corvid_Mtl_Ward_f05db29e)
+    X(corvid_Mtl_Ward_f05db29e) \
+    X(corvid_Mtl_Mirror)        \
+    X(corvid_Mtl_Dielectric)    \
+    X(corvid_Mtl_Glazing)

@@ -64,12 +64,27 @@ inline Vec3f f_noiseEvalNormalPerturb(IShaderAPI* api, ShadeState const&, Vec3f 
     return {du, dv, 0.0f};
 }
 
-/// The two finishes that the library gives: fixed frequencies and weights.
+/// The library's finish: fixed frequencies and weights. frame: T and B in the pattern's axes.
 inline Vec3f rippleOffset(IShaderAPI* api, ShadeState const& state, Vec3f patternPosition,
                           SLArray<Vec3f> const& frame)
 {
     return f_noiseEvalNormalPerturb(api, state, patternPosition, 2.6f, 2.0f, 1.0f, 0.5f, frame[0],
                                     frame[1], frame[2]);
+}
+
+/// Cast-glass ripple at P: the finish in the object's axes, tiled. Slopes are taken along the
+/// surface in pattern units, so a turned object keeps its ripple and tiling changes its size only.
+inline Vec3f castRippleOffset(IShaderAPI* api, ShadeState const& state, Vec3f P,
+                              Mat3f const& toWorld, Vec3f tiling, SLArray<Vec3f> const& frame)
+{
+    auto const pattern = [&](Vec3f at, Vec3f offset) {
+        return f_elm_rtpb_XYZGenerator(api, state, kPatternObject, at, toWorld,
+                                       Vec4f(0.0f, 0.0f, 0.0f, 0.0f), tiling, offset, 0.0f, 0.0f);
+    };
+    Vec3f constexpr kNone(0.0f, 0.0f, 0.0f);
+    SLArray<Vec3f> const inPattern{
+        {normalize(pattern(frame[0], kNone)), normalize(pattern(frame[1], kNone)), frame[2]}};
+    return rippleOffset(api, state, pattern(P, Vec3f(-0.6f, -0.6f, 0.5f)), inPattern);
 }
 
 /// Adds an offset in frame coordinates to the normal, which is not normalised, and turns tangent

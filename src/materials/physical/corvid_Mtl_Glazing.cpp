@@ -1,0 +1,129 @@
+#include "materials/physical/corvid_Mtl_Glazing.h"
+
+#include "materials/physical/ggx.h"
+#include "materials/physical/lightFade.h"
+#include "materials/physical/safeReflect.h"
+#include "materials/physical/shadingFrame.h"
+#include "runtime/builtins.h"
+
+namespace zsi {
+namespace {
+
+constexpr Vec3f kBlack(0.0f, 0.0f, 0.0f);
+
+} // namespace
+
+Vec3f corvid_Mtl_Glazing::transmissionTint(ShadeState const& state) const
+{
+    if (!u_transmittanceMapEnable)
+        return u_refractColor;
+    Vec2f const uv = transformUv(u_transmittanceTransform, attribute_uv(state));
+    Vec3f const c = rgb(u_transmittanceMap.lookup(uv)) * u_transmittanceAmount;
+    float const root = 1.0f / u_level;
+    return {std::pow(c.x, root), std::pow(c.y, root), std::pow(c.z, root)};
+}
+
+void corvid_Mtl_Glazing::f_calculateColors(IShaderAPI* api, ShadeState const& state,
+                                           PhysicalColors& out) const
+{
+    bool const behind = dot(state.I, state.Ng) > 0.0f;
+    Vec3f const N = behind ? -state.N : state.N;
+    SLArray<Vec3f> const frame =
+        computeBaseFrame(attribute_tangent(state), N, Mat3f(state.objectToWorld));
+    Vec3f const v = toLocal(frame, -state.I);
+    float const R = reflectance();
+    Ggx const facets{u_rough};
+
+    for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
+         light = light->next) {
+        float const fade = lightFade(dot(light->L, state.Ng));
+        if (fade == 0.0f)
+            continue;
+        Vec3f const l = toLocal(frame, light->L);
+        float const specular = facets.reflection(v, l, reflectionHalf(v, l));
+        if (specular > 0.0f)
+            out.lit += light->color * light->shadow * (specular * R * light->weight * fade);
+    }
+
+    out.reflectionWeight = u_reflectColor * R;
+    if (!(out.reflectionWeight == kBlack)) {
+        Vec3f const direction =
+            f_safe_reflect(api, state, state.I, behind ? -state.Ng : state.Ng, N);
+        out.reflection =
+            api->traceReflection(&state.P, &direction, maxComponent(out.reflectionWeight))
+            * out.reflectionWeight;
+    }
+
+    out.transmissionWeight = transmissionTint(state) * (1.0f - R);
+    if (!(out.transmissionWeight == kBlack))
+        out.refraction =
+            rgb(api->traceThrough(&state.P, &state.I, maxComponent(out.transmissionWeight)))
+            * out.transmissionWeight;
+}
+
+void corvid_Mtl_Glazing::shade(IShaderAPI* api, ShadeState& state) const
+{
+    shadePhysical(api, state);
+}
+
+void corvid_Mtl_Glazing::transmission(IShaderAPI*, ShadeState& state) const
+{
+    state.transmissionColor = u_refractColor * (1.0f - reflectance());
+}
+
+void corvid_Mtl_Glazing::transfer(IShaderAPI*, ShadeState& state) const
+{
+    Vec3f const N = -state.N * facingSign(state.I, state.Ng);
+    SLArray<Vec3f> const frame =
+        computeBaseFrame(attribute_tangent(state), N, Mat3f(state.objectToWorld));
+    Vec3f const v = toLocal(frame, -state.I);
+    Vec3f const l = toLocal(frame, state.sampleDirection);
+    Vec3f const mirrored(l.x, l.y, -l.z);
+    // Through the pane with index 1 on both sides the Jacobian is that of the mirrored reflection.
+    Ggx const facets{u_rough};
+    float const R = reflectance();
+    state.sampleCosine = std::fabs(l.z);
+    state.outBrdf =
+        grey(R * facets.reflection(v, l, reflectionHalf(v, l))
+             + (1.0f - R) * facets.reflection(v, mirrored, reflectionHalf(v, mirrored)));
+}
+
+void corvid_Mtl_Glazing::sample(IShaderAPI* api, ShadeState& state) const
+{
+    bool const mayReflect = anySwitch(state.allowReflection);
+    bool const mayTransmit = anySwitch(state.allowTransmission);
+    if (!mayReflect && !mayTransmit) {
+        state.sampleType = kSampleNone;
+        return;
+    }
+    Vec3f const Nf = -state.N * facingSign(state.I, state.Ng);
+    float const R = reflectance();
+    float factor = 1.0f;
+    bool transmits = false;
+    if (!mayReflect) {
+        transmits = true;
+        factor = 1.0f - R;
+    } else if (mayTransmit) {
+        transmits = api->random() > R;
+    } else {
+        factor = R;
+    }
+
+    float const c = dot(Nf, state.I); // below 0 for a ray that meets the faced side
+    state.sampleInvPdf = 1.0f;
+    if (transmits) {
+        factor /= c; // keeps the sign, as the cosine below: their product is what counts
+        state.sampleCosine = c;
+        state.sampleDirection = state.I;
+        state.outBrdf = u_refractColor * factor;
+        state.sampleType = kSampleSmooth;
+    } else {
+        factor /= -c;
+        state.sampleCosine = -c;
+        state.sampleDirection = state.I + Nf * (2.0f * -c);
+        state.outBrdf = u_reflectColor * factor;
+        state.sampleType = kSampleStraight;
+    }
+}
+
+} // namespace zsi

@@ -1,0 +1,79 @@
+/// Facets of a rough interface and what they reflect and transmit.
+///
+/// Directions are unit, local (z along the normal) and point away from the surface: v to the
+/// viewer, l to where light comes from or goes. Trowbridge-Reitz (GGX) facets with uncorrelated
+/// masking: Walter et al. 2007, "Microfacet Models for Refraction through Rough Surfaces".
+#pragma once
+
+#include <cmath>
+#include <zsi/vecmath.h>
+
+namespace zsi {
+
+/// Normal of the facet that mirrors l into v; any length.
+constexpr Vec3f reflectionHalf(Vec3f v, Vec3f l) { return v + l; }
+
+/// Normal of the facet that refracts between v, in a medium of index nv, and l, in a medium of
+/// index nl (eq. 16); any length. It points into the medium of the lower index, so it has the
+/// upper side of the frame only where nl is above nv.
+constexpr Vec3f refractionHalf(Vec3f v, float nv, Vec3f l, float nl) { return -(nl * l + nv * v); }
+
+/// A lobe of isotropic facets. alpha2: squared width, 0 or more.
+///
+/// The paper's tan^2 are expanded by cos^2 here, and factors that stand above and below the line
+/// are left out: one division each, and nothing blows up at grazing angles.
+struct Ggx {
+    float alpha2;
+
+    /// cos + sqrt(cos^2 + alpha^2 sin^2), so that G1 is 2 cos over it (eq. 34).
+    float shadowing(float c) const
+    {
+        float const c2 = c * c;
+        return std::fabs(c) + std::sqrt(c2 + alpha2 * (1.0f - c2));
+    }
+
+    /// Whether facets of normal h show themselves to w: else G1 is 0.
+    static constexpr bool shown(Vec3f w, Vec3f h) { return dot(w, h) * w.z > 0.0f; }
+
+    /// G1(v) G1(l) D(h) / (4 |cos v| |cos l|) (eq. 20), 1/sr. h: of any length; facets that face
+    /// away give 0.
+    float reflection(Vec3f v, Vec3f l, Vec3f h) const
+    {
+        return visible(v, l, h) ? scaled(v, l, h, dot(h, h) * dot(h, h)) : 0.0f;
+    }
+
+    /// The transmitted counterpart (eq. 21): G1(v) G1(l) D(h) |v.h| |l.h| nl^2
+    /// / (|cos v| |cos l| (nv v.h + nl l.h)^2), 1/sr, for h as `refractionHalf` gives it, for which
+    /// the bracket is -h.h.
+    float transmission(Vec3f v, Vec3f l, Vec3f h, float nl) const
+    {
+        return visible(v, l, h) ? scaled(v, l, h, 4.0f * nl * nl * std::fabs(dot(v, h) * dot(l, h)))
+                                : 0.0f;
+    }
+
+    /// tan^2 of the angle of a facet normal, distributed as D(h) cos h (eq. 35). xi: in [0, 1).
+    float sampleTan2(float xi) const { return alpha2 * xi / (1.0f - xi); }
+
+    /// v.h G1(v) G1(l) / (cos v cos h) (eq. 41): what a path through a sampled facet keeps, not
+    /// clamped. h: unit, v.h not negative.
+    float sampleWeight(Vec3f v, Vec3f l, Vec3f h) const
+    {
+        if (!shown(v, h) || !shown(l, h))
+            return 0.0f;
+        return 4.0f * dot(v, h) * std::fabs(l.z) / (shadowing(v.z) * shadowing(l.z) * h.z);
+    }
+
+private:
+    static constexpr bool visible(Vec3f v, Vec3f l, Vec3f h)
+    {
+        return h.z > 0.0f && shown(v, h) && shown(l, h);
+    }
+    float scaled(Vec3f v, Vec3f l, Vec3f h, float numerator) const
+    {
+        constexpr float kPi = 3.141593f;
+        float const q = h.x * h.x + h.y * h.y + alpha2 * (h.z * h.z); // (D's root) x h.h
+        return alpha2 * numerator / (kPi * q * q * (shadowing(v.z) * shadowing(l.z)));
+    }
+};
+
+} // namespace zsi

@@ -1,0 +1,50 @@
+#include "materials/utility/corvid_Mtl_Mirror.h"
+
+#include "materials/physical/fresnel.h"
+#include "materials/physical/safeReflect.h"
+#include "runtime/builtins.h"
+
+namespace zsi {
+namespace {
+
+/// Reflectance at normal incidence, and what grazing adds, so that both make exactly 1.
+constexpr float kNormalReflectance = 0.92f;
+constexpr float kGrazingRise = 1.0f - 0.92f;
+
+} // namespace
+
+void corvid_Mtl_Mirror::shade(IShaderAPI* api, ShadeState& state) const
+{
+    shadeMasked(*this, api, state, [&] {
+        Vec3f const& I = state.I;
+        float const c = minOf(1.0f, std::fabs(dot(I, state.N)));
+        float const F = schlickWeight(c) * kGrazingRise + kNormalReflectance;
+
+        float const side = dot(I, state.Ng);
+        Vec3f const Nf = -state.N * sign(side); // no normal where the ray runs along the surface
+        Vec3f const Ngf = side <= 0.0f ? state.Ng : -state.Ng;
+        Vec3f const R = f_safe_reflect(api, state, I, Ngf, Nf);
+
+        Vec3f const tint = u_tintColor * F;
+        return tint * api->traceReflection(&state.P, &R, maxComponent(tint));
+    });
+}
+
+void corvid_Mtl_Mirror::transfer(IShaderAPI*, ShadeState&) const { }
+
+void corvid_Mtl_Mirror::sample(IShaderAPI*, ShadeState& state) const
+{
+    if (!state.allowReflection[2]) {
+        state.sampleType = kSampleNone;
+        return;
+    }
+    Vec3f const Nf = -state.N * facingSign(state.I, state.Ng);
+    float const d = -dot(state.I, Nf); // grazing rays divide by 0 below
+    state.sampleCosine = d;
+    state.sampleDirection = state.I + Nf * (2.0f * d);
+    state.outBrdf = u_tintColor * (1.0f / d); // without the rise of `shade`
+    state.sampleInvPdf = 1.0f;
+    state.sampleType = kSampleStraight;
+}
+
+} // namespace zsi
