@@ -258,7 +258,8 @@ void visit(auto& shader, auto& visitor)
 {
     [&]<int... kPlace>(std::integer_sequence<int, kPlace...>)
     {
-        auto const one = [&]<class Found>(std::type_identity<Found>) {
+        auto const one = [&](auto identity) {
+            using Found = typename decltype(identity)::type;
             using Node = typename Found::Node;
             Node::template visit<Found::kPath>(part<Node::template Fields>(shader), visitor);
         };
