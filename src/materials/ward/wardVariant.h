@@ -54,8 +54,9 @@ public:
     }
 
     // Splice points. They stay out of line: the paths without a network pay nothing for them.
+    // A network stands where a map stands: at the coordinate that the channel's transform gives.
+    // The diffuse network is the exception. It stands for transform, map and amount together.
 
-    /// The network's colour as it is, without the amount of the channel.
     [[gnu::noinline]] Vec4f diffuseMap(IShaderAPI* api, ShadeState const& state, Vec2f uv,
                                        Vec3f position) const
     {
@@ -65,7 +66,6 @@ public:
         else
             return Functions::diffuseMap(api, state, uv, position);
     }
-    /// The network stands where the map stands: its uv goes through the channel's transform.
     [[gnu::noinline]] SLArray<float> normal0Heights(IShaderAPI* api, ShadeState const& state,
                                                     SLArray<Vec3f> const& frame, Vec2f uv,
                                                     Vec3f position) const
@@ -86,7 +86,9 @@ public:
     {
         using Root = typename Network::cutout_map;
         if constexpr (kHas<Root>)
-            return Root::evaluate(api, state, *this, {uv, position}).x;
+            return Root::evaluate(api, state, *this,
+                                  {transformUv(this->u_cutoutTransform, uv), position})
+                .x;
         else
             return Functions::cutoutMap(api, state, uv, position);
     }
