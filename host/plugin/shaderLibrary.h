@@ -1,6 +1,9 @@
 /// Loads shader libraries and makes shader objects that can be described and set by name.
 #pragma once
 
+#include "base/names.h"
+#include "plugin/description.h"
+
 #include <filesystem>
 #include <memory>
 #include <string>
@@ -47,12 +50,17 @@ using ParameterValue =
     std::variant<bool, int, float, Vec2f, Vec3f, Vec4f, Mat3f, Mat4f, HostTexture1D const*,
                  HostTexture2D const*, HostTextureCube const*>;
 
-/// A shader object with what it told about itself. Movable; owns the object. The library that
-/// made it must outlive it.
+/// A shader object with what it told about itself. Movable; owns the object and keeps the library
+/// that made it loaded.
 class Shader {
 public:
-    /// Takes the object over and lets it register.
-    Shader(std::string className, std::unique_ptr<IShaderBase> object);
+    /// Takes the object over and lets it register. `library`: what keeps the object's code loaded,
+    /// if anything has to. Throws InputError for a null object, an unknown kind, or an attribute
+    /// outside the attribute block.
+    Shader(std::string className, std::unique_ptr<IShaderBase> object,
+           std::shared_ptr<void const> library = {});
+    Shader(Shader&&) noexcept = default;
+    Shader& operator=(Shader&& other) noexcept;
 
     std::string const& className() const { return className_; }
     int kind() const; ///< a `zsi::ShaderKind`
@@ -60,6 +68,8 @@ public:
     std::vector<Parameter> const& parameters() const { return parameters_; } ///< registered order
     std::vector<Attribute> const& attributes() const { return attributes_; }
     Parameter const* find(std::string_view name) const; ///< null when there is none
+    std::vector<std::string> parameterNames() const; ///< registered order
+    void describe(LibraryDescription const& description); ///< meanings and missing defaults
 
     /// Writes the field. Throws InputError for an unknown name (with the nearest ones) or a type
     /// that does not fit; an int is taken for a float.
@@ -72,6 +82,7 @@ public:
 
 private:
     std::string className_;
+    std::shared_ptr<void const> library_; ///< before the object, so that it goes after it
     std::unique_ptr<IShaderBase> object_;
     int entryPoints_ = 0;
     std::vector<Parameter> parameters_;
@@ -87,8 +98,10 @@ public:
     /// `_getAPIVersion` in its dynamic symbols). Throws InputError when it cannot be loaded, has
     /// none, or was built against another interface version.
     void load(std::filesystem::path const& sharedObject);
-    /// Loads every shared object of the directory.
-    void loadDirectory(std::filesystem::path const& directory);
+    /// Loads every shared object (*.so) of the directory, by name. One that cannot be used does not
+    /// keep the others away: the result tells why each was left out. Throws InputError when the
+    /// directory cannot be read or none of its libraries can be used.
+    std::vector<std::string> loadDirectory(std::filesystem::path const& directory);
 
     std::vector<std::string> const& classNames() const { return names_; } ///< sorted
     bool has(std::string_view className) const;
@@ -105,10 +118,6 @@ private:
     std::unique_ptr<Impl> impl_;
     std::vector<std::string> names_;
 };
-
-/// Up to three of `candidates` that are close to `name` by edit distance, nearest first.
-std::vector<std::string> nearestNames(std::string_view name,
-                                      std::vector<std::string> const& candidates);
 
 /// Where to look for shader libraries: the option when not empty, else ZSI_SHADER_PATH (colon
 /// separated), else `shaders` beside the program.

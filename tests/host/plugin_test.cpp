@@ -1,0 +1,218 @@
+#include "base/error.h"
+#include "plugin/shaderLibrary.h"
+#include "plugin/symbolTable.h"
+#include "support/temporaryFolder.h"
+
+#include <cstdlib>
+#include <fstream>
+#include <gtest/gtest.h>
+#include <random>
+
+namespace zsi::host {
+namespace {
+
+namespace fs = std::filesystem;
+
+fs::path fixture(std::string const& name)
+{
+    return fs::path(ZSI_FIXTURE_DIR) / name / (name + ".so");
+}
+
+std::string errorOf(auto&& action)
+{
+    try {
+        action();
+    } catch (InputError const& error) {
+        return error.what();
+    }
+    return "no error";
+}
+
+void expectContains(std::string const& message, std::vector<std::string> const& parts)
+{
+    for (std::string const& part : parts)
+        EXPECT_NE(message.find(part), std::string::npos) << '"' << part << "\" in: " << message;
+}
+
+TEST(Plugin, FindsAndDescribesTheClassesOfAnyLibrary)
+{
+    ShaderLibraries libraries;
+    libraries.load(fixture("tinyShaders"));
+    libraries.load(ZSI_SHADER_LIBRARY);
+    EXPECT_TRUE(libraries.has("corvid_Mtl_Solid") && libraries.has("TinyLight"));
+    EXPECT_FALSE(libraries.has("Alone") || libraries.has("Half"));
+
+    Shader const shader = libraries.create("TinyMaterial");
+    EXPECT_EQ(shader.kind(), kMaterial);
+    EXPECT_EQ(shader.entryPoints(), kShade | kTransmission);
+    EXPECT_TRUE(shader.material() && !shader.light() && !shader.environment());
+    std::string rows;
+    for (Parameter const& p : shader.parameters())
+        rows += std::string(typeName(p.type)) + ' ' + p.name + (p.hasDefault ? "" : " unset") + ';';
+    // The description file takes the default of tint away and gives matrix one.
+    EXPECT_EQ(rows,
+              "bool flag;int count;float amount;Vec2f pair;Vec3f tint unset;Vec4f quad;"
+              "Mat3f uvMatrix unset;Mat4f matrix;texture1D ramp;texture2D map;"
+              "textureCube cube;");
+    EXPECT_EQ(shader.find("amount")->meaning, "how much, 0..1");
+    ASSERT_EQ(shader.attributes().size(), 2u);
+    EXPECT_EQ(shader.attributes()[1].name, "vtxcolor");
+    EXPECT_EQ(shader.attributes()[1].offset, 8);
+}
+
+TEST(Plugin, ObjectsOutliveTheirLibraries)
+{
+    auto libraries = std::make_unique<ShaderLibraries>();
+    libraries->load(fixture("tinyShaders"));
+    Shader first = libraries->create("TinyMaterial");
+    Shader second = libraries->create("TinyLight");
+    libraries.reset();
+    second = std::move(first);
+    ShadeState state;
+    second.material()->shade(nullptr, state);
+    EXPECT_EQ(state.Ci.y, 0.2f);
+}
+
+TEST(Plugin, WritesValuesByNameAndType)
+{
+    ShaderLibraries libraries;
+    libraries.load(fixture("tinyShaders"));
+    Shader shader = libraries.create("TinyMaterial");
+    auto const at = [&]<class T>(char const* name, T const*) {
+        return *static_cast<T const*>(shader.find(name)->field);
+    };
+    shader.set("flag", false);
+    shader.set("count", -7);
+    shader.set("amount", 2);
+    EXPECT_EQ(at("amount", static_cast<float*>(nullptr)), 2.0f);
+    shader.set("tint", Vec3f(4, 5, 6));
+    shader.set("matrix", Mat4f::identity());
+    auto const* texture = reinterpret_cast<HostTexture2D const*>(&shader);
+    shader.set("map", texture);
+    EXPECT_FALSE(at("flag", static_cast<bool*>(nullptr)));
+    EXPECT_EQ(at("count", static_cast<int*>(nullptr)), -7);
+    EXPECT_EQ(at("tint", static_cast<Vec3f*>(nullptr)), Vec3f(4, 5, 6));
+    EXPECT_EQ(at("matrix", static_cast<Mat4f*>(nullptr)).m[15], 1.0f);
+    auto const handle = at("map", static_cast<TextureSampler2D*>(nullptr));
+    EXPECT_EQ(handle.texture, texture);
+    EXPECT_EQ(handle.index, -1);
+    // Neighbours of the written fields keep their defaults.
+    EXPECT_EQ(at("pair", static_cast<Vec2f*>(nullptr)).y, 2.0f);
+    EXPECT_EQ(at("quad", static_cast<Vec4f*>(nullptr)).x, 1.0f);
+
+    expectContains(errorOf([&] { shader.set("amuont", 1.0f); }),
+                   {"amuont", "TinyMaterial", "did you mean amount?"});
+    expectContains(errorOf([&] { shader.set("count", 1.5f); }), {"count", "int", "float"});
+    expectContains(errorOf([&] { shader.set("cube", texture); }), {"textureCube", "texture2D"});
+}
+
+TEST(Plugin, BadLibrariesAreTurnedAway)
+{
+    test::TemporaryFolder folder;
+    struct Case {
+        fs::path file;
+        std::vector<std::string> message;
+    };
+    Case const cases[] = {
+        {fixture("oldShaders"), {"oldShaders.so", "2700", std::to_string(kApiVersion)}},
+        {fixture("noShaders"), {"noShaders.so", "no shader classes"}},
+        {folder.write("text.so", "this is a text file\n"), {"text.so", "not a 64-bit"}},
+        {folder.write("empty.so", ""), {"empty.so", "not a 64-bit"}},
+        {folder.path / "missing.so", {"missing.so", "no such file"}},
+        {folder.path, {"no such file"}},
+    };
+    for (Case const& c : cases) {
+        ShaderLibraries libraries;
+        expectContains(errorOf([&] { libraries.load(c.file); }), c.message);
+        EXPECT_TRUE(libraries.classNames().empty()) << c.file;
+    }
+
+    ShaderLibraries libraries;
+    libraries.load(fixture("tinyShaders"));
+    expectContains(errorOf([&] { libraries.create("Broken"); }), {"Broken", "could not create"});
+    expectContains(errorOf([&] { libraries.create("tinymateral"); }), {"mean TinyMaterial?"});
+    ShaderLibraries stray;
+    stray.load(fixture("strayShaders"));
+    expectContains(errorOf([&] { stray.create("TinyMaterial"); }), {"vtxcolor", "56"});
+}
+
+TEST(Plugin, ADirectoryLoadsWhatItCan)
+{
+    test::TemporaryFolder folder;
+    ShaderLibraries libraries;
+    expectContains(errorOf([&] { libraries.loadDirectory(folder.path); }), {"no usable"});
+    expectContains(errorOf([&] { libraries.loadDirectory(folder.path / "none"); }),
+                   {"cannot open"});
+    folder.write("a.so", "text");
+    folder.write("notes.txt", "text");
+    expectContains(errorOf([&] { libraries.loadDirectory(folder.path); }), {"no usable", "a.so"});
+    fs::copy_file(fixture("tinyShaders"), folder.path / "b.so");
+    std::vector<std::string> const leftOut = libraries.loadDirectory(folder.path);
+    ASSERT_EQ(leftOut.size(), 1u);
+    expectContains(leftOut[0], {"a.so"});
+    EXPECT_TRUE(libraries.has("TinyMaterial"));
+
+    folder.write("b.json", "{\"TinyMaterial\": {\"parameters\": {\"amount\": 3}}}");
+    expectContains(errorOf([&] { libraries.load(folder.path / "b.so"); }), {"b.json"});
+}
+
+/// Damaged files: cut short anywhere, or with bytes overwritten. No crash, and either an error or
+/// names; what memory checkers say counts too.
+TEST(Plugin, ReadsDamagedSharedObjects)
+{
+    std::ifstream in(fixture("tinyShaders"), std::ios::binary);
+    std::string const good((std::istreambuf_iterator<char>(in)), {});
+    ASSERT_GT(good.size(), 1000u);
+    test::TemporaryFolder folder;
+    std::mt19937 random(7);
+    int errors = 0;
+    for (int round = 0; round < 300; ++round) {
+        std::string bad = good;
+        if (round % 2) {
+            bad.resize(random() % good.size());
+        } else {
+            // The header, and the section table at the end.
+            for (int k = 0; k < 8; ++k) {
+                std::size_t const back = random() % 2400;
+                bad[back < 64 ? back : bad.size() - back] = static_cast<char>(random());
+            }
+        }
+        fs::path const file = folder.write("bad.so", bad);
+        errors += errorOf([&] { exportedFunctions(file); }) != "no error";
+    }
+    EXPECT_GT(errors, 150);
+}
+
+TEST(Names, NearOnesFirst)
+{
+    std::vector<std::string> const names{"u_ior", "u_roughMap", "u_color", "corvid_Mtl_Solid"};
+    struct Case {
+        char const* typed;
+        std::vector<std::string> want;
+    };
+    Case const cases[] = {
+        {"u_iro", {"u_ior"}},
+        {"U_IOR", {"u_ior"}},
+        {"u_colour", {"u_color"}},
+        {"Solid", {"corvid_Mtl_Solid"}},
+        {"zzz", {}},
+        {"", {}},
+    };
+    for (Case const& c : cases)
+        EXPECT_EQ(nearestNames(c.typed, names), c.want) << c.typed;
+    EXPECT_TRUE(nearestNames(std::string(1000000, 'a'), names).empty());
+    EXPECT_EQ(printable("a\x1b[31m\n"), "a\\x1b[31m\\x0a");
+}
+
+TEST(Plugin, LooksWhereItIsTold)
+{
+    ::setenv("ZSI_SHADER_PATH", "/one::/two", 1);
+    EXPECT_EQ(shaderDirectories(""), (std::vector<fs::path>{"/one", "/two"}));
+    EXPECT_EQ(shaderDirectories("/three"), (std::vector<fs::path>{"/three"}));
+    ::unsetenv("ZSI_SHADER_PATH");
+    fs::path const program = fs::read_symlink("/proc/self/exe");
+    EXPECT_EQ(shaderDirectories(""), (std::vector<fs::path>{program.parent_path() / "shaders"}));
+}
+
+} // namespace
+} // namespace zsi::host
