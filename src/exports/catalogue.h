@@ -1,6 +1,7 @@
 /// The catalogue: every class of the library, once. Exports and tests derive from this list.
 #pragma once
 
+#include "environments/BackgroundGeometry.h"
 #include "environments/corvid_Env_Backplate.h"
 #include "environments/corvid_Env_Default.h"
 #include "lights/voPointLight.h"
@@ -29,6 +30,7 @@
     X(voSpotLight)              \
     X(corvid_Env_Default)       \
     X(corvid_Env_Backplate)     \
+    X(BackgroundGeometry)       \
     X(corvid_Mtl_Solid)         \
     X(corvid_Mtl_Unlit)         \
     X(corvid_Mtl_NormalsOnly)   \

@@ -1,0 +1,180 @@
+#include "environments/BackgroundGeometry.h"
+
+#include "environments/iblGrading.h"
+#include "environments/mappedBump.h"
+#include "materials/physical/fresnel.h"
+#include "materials/physical/safeReflect.h"
+#include "materials/utility/straightThrough.h"
+
+namespace zsi {
+
+Vec3f BackgroundGeometry::bumpedNormal(IShaderAPI* api, ShadeState const& state) const
+{
+    if (bumpMode == kMapNone || bumpScale == 0.0f || !bumpTexture.texture)
+        return state.N;
+    BumpPlacement placement{bumpMode,     bumpTextureMatrix,        bumpTextureMatrixInverse,
+                            bumpUVMatrix, attribute_tangent(state), attribute_bitangent(state)};
+    // Box axes by the reference normal; the picture's are chosen by the world normal.
+    Vec4f const texel =
+        f_evalMapping(api, state, bumpMode, {}, bumpTexture, bumpTextureMatrix, bumpAngularRepeat,
+                      state.Pref, state.Nref, false, attribute_uv(state), placement.boxAxes,
+                      placement.tangentU, placement.tangentV, bumpUVMatrix);
+    return bendNormal(placement, texel, bumpScale, state.N, state.objectToWorld);
+}
+
+/// Graded for all cubes, then for this one.
+Vec3f BackgroundGeometry::cube(TextureSamplerCube const& cube, Vec3f direction,
+                               ChannelGrade const& grade) const
+{
+    Vec3f const texel = rgb(cube.lookup(cubeCoordinate(rotate(globalIBLMatrix, direction))));
+    ChannelGrade const global{globalIBLContrastPivot, globalIBLContrastValue, globalIBLGainColor,
+                              globalIBLGainSource,    globalIBLGainValue,     globalIBLSatValue};
+    return gradeChannel(gradeChannel(texel, global), grade);
+}
+
+/// Light that arrives over the light that would arrive without anything in its way, per channel:
+/// 1 where nothing shadows the point and the bump is flat. The picture holds its own light, so
+/// this factor is all that the scene does to it.
+Vec3f BackgroundGeometry::receivedLight(IShaderAPI* api, ShadeState const& state, Vec3f n) const
+{
+    // A light's colour weighs by its largest channel, so that each channel of the ratio is that
+    // of the shadows and no coloured light changes the hue of the picture.
+    float open = 0.0f;
+    Vec3f arriving(0.0f, 0.0f, 0.0f);
+    bool const bumped = !(n == state.N);
+    for (LightSample const* l = api->getLightSamples(0, &state.P, &state.N); l; l = l->next) {
+        float const strength = maxComponent(l->color) * l->weight;
+        float relief = 1.0f;
+        if (bumped) {
+            // The weight knows the smooth surface: cosines of the bump over those. Low light
+            // would make that ratio boundless.
+            constexpr float kLeastCosine = 0.1f, kMostRelief = 2.0f;
+            relief =
+                clamp(dot(n, l->L) / maxOf(dot(state.N, l->L), kLeastCosine), 0.0f, kMostRelief);
+        }
+        open += strength;
+        arriving += (strength * relief) * l->shadow;
+    }
+    Vec3f const occlusion = api->occlusion(&state.P, &n, 1.0f);
+
+    Vec3f ratio = open > 0.0f ? arriving / open : grey(1.0f);
+    if (diffuseCube.texture) {
+        // Lights and sky share the point; occlusion is the sky's.
+        Vec3f const sky =
+            notBelowZero(cube(diffuseCube, n,
+                              {diffuseIBLContrastPivot, diffuseIBLContrastValue,
+                               diffuseIBLGainColor, diffuseIBLGainSource, diffuseIBLGainValue}));
+        auto const share = [open](float lights, float sky_, float unoccluded, float otherwise) {
+            return open + sky_ > 0.0f ? (lights + sky_ * unoccluded) / (open + sky_)
+                                      : otherwise * unoccluded;
+        };
+        ratio = {share(arriving.x, sky.x, occlusion.x, ratio.x),
+                 share(arriving.y, sky.y, occlusion.y, ratio.y),
+                 share(arriving.z, sky.z, occlusion.z, ratio.z)};
+    } else {
+        ratio *= occlusion; // nothing to weigh it against
+    }
+    // Where there is no light at all, full shadow: shadowColor as far as the intensity says.
+    Vec3f const fullShadow = shadowColor * shadowIntensity + grey(1.0f - shadowIntensity);
+    return fullShadow * (grey(1.0f) - ratio) + ratio;
+}
+
+/// What the ground mirrors. Rough ground mirrors sharply only towards the horizon: of its
+/// reflectivity, the share of a clear interface without reflectance of its own goes to the sharp
+/// environment and the rest to the blurred one.
+Vec3f BackgroundGeometry::reflections(IShaderAPI* api, ShadeState const& state, Vec3f n) const
+{
+    Vec3i boxAxes;
+    Vec3f tangentU, tangentV;
+    Vec3f const reflectivity =
+        rgb(f_evalMapping(api, state, specularMode, specularColor, specularTexture,
+                          specularTextureMatrix, specularAngularRepeat, state.Pref, state.N, false,
+                          attribute_uv(state), boxAxes, tangentU, tangentV, specularUVMatrix));
+    if (reflectivity == Vec3f(0.0f, 0.0f, 0.0f))
+        return reflectivity;
+
+    Vec3f const r = f_safe_reflect(api, state, state.I, state.Ng, n);
+    float const sharp = schlick(0.0f, std::fabs(dot(state.I, n)));
+    Vec3f seen(0.0f, 0.0f, 0.0f);
+    if (specularCube.texture)
+        seen = (1.0f - sharp)
+            * cube(specularCube, r,
+                   {specularIBLContrastPivot, specularIBLContrastValue, specularIBLGainColor,
+                    specularIBLGainSource, specularIBLGainValue});
+    float const importance = sharp * maxComponent(reflectivity);
+    if (!useCubeReflection)
+        seen += sharp * api->traceReflection(&state.P, &r, importance);
+    else if (reflectCube.texture)
+        seen += sharp
+            * cube(reflectCube, r,
+                   {.gainColor = reflectIBLChannelGainColor,
+                    .gainSource = reflectIBLChannelGainSource,
+                    .gain = reflectIBLChannelGainValue,
+                    .saturation = reflectIBLChannelSatValue});
+    return reflectivity * seen;
+}
+
+void BackgroundGeometry::shade(IShaderAPI* api, ShadeState& state) const
+{
+    if (dot(state.I, state.Ng) >= 0.0f) {
+        state.discardHit = 1;
+        return;
+    }
+    Vec3i boxAxes;
+    Vec3f tangentU, tangentV;
+    Vec4f const picture =
+        f_evalMapping(api, state, diffuseMode, diffuseColor, diffuseTexture, diffuseTextureMatrix,
+                      diffuseAngularRepeat, state.Pref, state.N, false, attribute_uv(state),
+                      boxAxes, tangentU, tangentV, diffuseUVMatrix);
+    constexpr float kCutOut = 0.05f; // alpha below it is no surface
+    if (kCutOut > picture.w) {
+        state.discardHit = 1;
+        return;
+    }
+    bool const clear = 1.0f > picture.w;
+    Vec4f const behind =
+        clear ? api->traceThrough(&state.P, &state.I, 1.0f) : Vec4f(0.0f, 0.0f, 0.0f, 0.0f);
+
+    Vec3f color;
+    if (state.rayType == kRayReflection && useCubeReflection && reflectCube.texture) {
+        // To reflections the ground is the environment that it stands for.
+        color = cube(reflectCube, state.I,
+                     {.gainColor = reflectIBLChannelGainColor,
+                      .gainSource = reflectIBLChannelGainSource,
+                      .gain = reflectIBLChannelGainValue,
+                      .saturation = reflectIBLChannelSatValue});
+    } else {
+        // Rays that only gather light see the smooth ground, and no mirror of a mirror.
+        bool const gathers = state.rayType == kRayDiffuse || state.rayType == kRayReflection;
+        Vec3f const n = state.rayType == kRayDiffuse ? state.N : bumpedNormal(api, state);
+        color = gradeChannel(rgb(picture),
+                             {.gainColor = diffuseTextureGainColor,
+                              .gainSource = diffuseTextureGainSource,
+                              .gain = diffuseTextureGainValue,
+                              .saturation = diffuseTextureSatValue})
+            * receivedLight(api, state, n);
+        if (!gathers)
+            color += reflections(api, state, n);
+    }
+    if (!clear) {
+        state.Ci = withAlpha(color, 1.0f);
+        return;
+    }
+    float const through = 1.0f - picture.w;
+    state.Ci = withAlpha(color * picture.w + rgb(behind) * through, picture.w + behind.w * through);
+}
+
+void BackgroundGeometry::transmission(IShaderAPI*, ShadeState& state) const
+{
+    // Only ground that faces up along z holds up shadow rays; NaN does too.
+    constexpr float kUpward = 0.9f;
+    bool const clear = state.rayType != kRayShadow || kUpward > state.N.z;
+    state.transmissionColor = grey(clear ? 1.0f : 0.0f);
+}
+
+void BackgroundGeometry::sample(IShaderAPI*, ShadeState& state) const
+{
+    sampleStraightThrough(state);
+}
+
+} // namespace zsi

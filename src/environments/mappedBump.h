@@ -1,0 +1,70 @@
+/// Bump of a normal map that was laid on by `textureMapping.h`.
+#pragma once
+
+#include "environments/textureMapping.h"
+
+namespace zsi {
+
+/// How a normal map lies on the surface.
+struct BumpPlacement {
+    int mode; ///< a MappingMode; kMapUv to kMapAngular bend the normal
+    Mat4f const& textureMatrix;
+    Mat4f const& textureMatrixInverse;
+    Mat3f const& uvMatrix;
+    Vec3f tangent, bitangent; ///< object space, along rising uv
+    Vec3i boxAxes{0, 1, 2}; ///< these three as the mapping wrote them
+    Vec3f tangentU{0.0f, 0.0f, 0.0f}, tangentV{0.0f, 0.0f, 0.0f};
+};
+
+/// Directions of rising u and v of the map, object space, any length: turns and mirrorings of the
+/// transforms count, repeats do not make a bump steeper.
+inline void bumpAxes(BumpPlacement const& b, Vec3f& u, Vec3f& v)
+{
+    float const* const m = b.textureMatrix.m;
+    auto const column = [m](int axis) { return Vec3f(m[axis], m[4 + axis], m[8 + axis]); };
+    switch (b.mode) {
+    case kMapUv:
+        u = b.uvMatrix.m[0] * b.tangent + b.uvMatrix.m[3] * b.bitangent;
+        v = b.uvMatrix.m[1] * b.tangent + b.uvMatrix.m[4] * b.bitangent;
+        break;
+    case kMapAngular: {
+        // The angle runs from y to x, against tangentU.
+        Mat3f const toObject(b.textureMatrixInverse);
+        u = transformDirection(toObject, -b.tangentU);
+        v = transformDirection(toObject, b.tangentV);
+        break;
+    }
+    case kMapBox:
+        u = column(b.boxAxes.x);
+        v = column(b.boxAxes.y);
+        break;
+    default:
+        u = column(0);
+        v = column(1);
+        break;
+    }
+}
+
+/// `N` bent by a texel of a tangent-space normal map, (2r - 1, 2g - 1, 2b - 1) with red along
+/// rising u; unit. amount: scales the slopes; negative turns the relief inside out.
+inline Vec3f bendNormal(BumpPlacement const& b, Vec4f texel, float amount, Vec3f const& N,
+                        Mat4f const& objectToWorld)
+{
+    if (b.mode < kMapUv || b.mode > kMapAngular)
+        return N;
+    Vec3f u, v;
+    bumpAxes(b, u, v);
+    Mat3f const toWorld(objectToWorld);
+    auto const onSurface = [&](Vec3f axis) {
+        axis = transformDirection(toWorld, axis);
+        return normalize(axis - dot(axis, N) * N);
+    };
+    // Texels that point level or down would tear the surface open: slopes stay below 20.
+    constexpr float kLeastHeight = 0.05f;
+    float const z = maxOf(2.0f * texel.z - 1.0f, kLeastHeight);
+    Vec3f const bent = z * N + ((2.0f * texel.x - 1.0f) * amount) * onSurface(u)
+        + ((2.0f * texel.y - 1.0f) * amount) * onSurface(v);
+    return normalize(bent);
+}
+
+} // namespace zsi

@@ -1,0 +1,347 @@
+#include "environments/BackgroundGeometry.h"
+#include "support/parameterWalk.h"
+#include "support/record.h"
+#include "support/scriptedHost.h"
+
+#include <gtest/gtest.h>
+
+namespace zsi {
+namespace {
+
+using Picture = test::FunctionTexture<Vec2f>;
+using Cube = test::FunctionTexture<Vec3f>;
+
+struct Ground {
+    BackgroundGeometry shader;
+    test::ScriptedHost host;
+    ShadeState state = test::plainHit();
+
+    Ground()
+    {
+        state.I = normalize(Vec3f(1, 0, -1));
+        shader.diffuseColor = {0.2f, 0.4f, 0.6f};
+        shader.globalIBLMatrix = Mat3f::identity();
+    }
+    Vec4f shade()
+    {
+        state.Ci = {7, 7, 7, 7};
+        state.discardHit = 0;
+        host.calls.clear();
+        shader.shade(&host, state);
+        return state.Ci;
+    }
+};
+
+void expectColor(Vec4f got, Vec3f want, float alpha = 1)
+{
+    EXPECT_NEAR(got.x, want.x, 1e-6f);
+    EXPECT_NEAR(got.y, want.y, 1e-6f);
+    EXPECT_NEAR(got.z, want.z, 1e-6f);
+    EXPECT_NEAR(got.w, alpha, 1e-6f);
+}
+
+TEST(BackgroundGeometry, FacesCutsAndBlendsByAlpha)
+{
+    struct Case {
+        char const* why;
+        Vec3f I;
+        float alpha;
+        bool kept;
+        int through;
+    };
+    Case const cases[] = {
+        {"front", {0, 0, -1}, 1.0f, true, 0},         {"back", {0, 0, 1}, 1.0f, false, 0},
+        {"edge on", {1, 0, 0}, 1.0f, false, 0},       {"cut out", {0, 0, -1}, 0.04f, false, 0},
+        {"at the limit", {0, 0, -1}, 0.05f, true, 1}, {"half clear", {0, 0, -1}, 0.5f, true, 1},
+    };
+    for (Case const& c : cases) {
+        SCOPED_TRACE(c.why);
+        Picture picture([&](Vec2f) { return Vec4f(0.2f, 0.4f, 0.6f, c.alpha); });
+        Ground g;
+        g.state.I = c.I;
+        g.shader.diffuseMode = 1;
+        g.shader.diffuseTexture.texture = &picture;
+        g.host.onThrough = [](Vec3f, Vec3f) { return Vec4f(1, 2, 3, 0.5f); };
+        Vec4f const got = g.shade();
+        EXPECT_EQ(g.state.discardHit, c.kept ? 0 : 1);
+        EXPECT_EQ(g.host.count("traceThrough"), c.through);
+        float const a = c.alpha, b = 1 - c.alpha;
+        if (c.kept)
+            expectColor(got, Vec3f(0.2f, 0.4f, 0.6f) * a + Vec3f(1, 2, 3) * b, a + 0.5f * b);
+        else
+            expectColor(got, {7, 7, 7}, 7);
+    }
+}
+
+/// However strong the lights are, an open point shows the picture itself; shadow takes away the
+/// share of light that it keeps from the point, down to the tint.
+TEST(BackgroundGeometry, PictureKeepsItsBrightnessAndTakesShadow)
+{
+    struct Case {
+        char const* why;
+        float sky;
+        Vec3f shadow, open;
+        float intensity;
+        Vec3f tint, want; ///< factor on the picture
+    };
+    // Two lights: strength 2 times weight 0.5, and 3 times weight 1 in the shadow of the case.
+    constexpr Case kCases[] = {
+        {"nothing in the way", -1, {1, 1, 1}, {1, 1, 1}, 1, {0, 0, 0}, {1, 1, 1}},
+        {"the same under a sky", 4, {1, 1, 1}, {1, 1, 1}, 1, {0, 0, 0}, {1, 1, 1}},
+        {"3 of 4 kept off", -1, {0, 0, 0}, {1, 1, 1}, 1, {0, 0, 0}, {0.25f, 0.25f, 0.25f}},
+        {"per channel", -1, {1, 0, 0.5f}, {1, 1, 1}, 1, {0, 0, 0}, {1, 0.25f, 0.625f}},
+        {"half as intense", -1, {0, 0, 0}, {1, 1, 1}, 0.5f, {0, 0, 0}, {0.625f, 0.625f, 0.625f}},
+        {"no intensity", -1, {0, 0, 0}, {0, 0, 0}, 0, {0, 0, 0}, {1, 1, 1}},
+        {"tinted", -1, {0, 0, 0}, {1, 1, 1}, 1, {0, 0.4f, 1}, {0.25f, 0.55f, 1}},
+        {"sky 4 fills: 5 of 8", 4, {0, 0, 0}, {1, 1, 1}, 1, {0, 0, 0}, {0.625f, 0.625f, 0.625f}},
+        {"sky half hidden: 6 of 8",
+         4,
+         {1, 1, 1},
+         {0.5f, 0.5f, 0.5f},
+         1,
+         {0, 0, 0},
+         {0.75f, 0.75f, 0.75f}},
+        {"no sky known: all of it",
+         -1,
+         {1, 1, 1},
+         {0.5f, 0.5f, 0.5f},
+         1,
+         {0, 0, 0},
+         {0.5f, 0.5f, 0.5f}},
+    };
+    for (Case const& c : kCases) {
+        SCOPED_TRACE(c.why);
+        for (std::uint32_t rayType : {1u, 2u, 4u, 32u}) {
+            Ground g;
+            g.state.rayType = rayType;
+            g.host.addLight({0, 0, 1}, {2, 1, 0}, {1, 1, 1}, 0.5f);
+            g.host.addLight({1, 0, 0}, {0, 3, 1}, c.shadow, 1);
+            g.host.addLight({0, 0, -1}, {9, 9, 9}, {0, 0, 0}, 0); // below the ground
+            g.host.onOcclusion = [&](Vec3f, Vec3f) { return c.open; };
+            Cube sky([&](Vec3f) { return Vec4f(c.sky, c.sky, c.sky, 1); });
+            if (c.sky >= 0)
+                g.shader.diffuseCube.texture = &sky;
+            g.shader.shadowIntensity = c.intensity;
+            g.shader.shadowColor = c.tint;
+            expectColor(g.shade(), g.shader.diffuseColor * c.want);
+            EXPECT_EQ(g.host.count("getLightSamples"), 1);
+            EXPECT_EQ(g.host.count("occlusion"), 1);
+            EXPECT_EQ(g.host.calls[0].scalars[0], 0.0f); // the common list
+        }
+    }
+    Ground dark; // no light anywhere: the picture, not black
+    expectColor(dark.shade(), dark.shader.diffuseColor);
+}
+
+TEST(BackgroundGeometry, BumpTiltsTheNormalAlongRisingTextureCoordinates)
+{
+    // A texel that leans towards rising u at 45 degrees, then one that leans towards rising v.
+    test::Random random;
+    for (int i = 0; i < 400; ++i) {
+        int const mode = 1 + i % 4;
+        bool const alongU = i % 8 < 4;
+        Picture bump([&](Vec2f) { return alongU ? Vec4f(1, 0.5f, 1, 1) : Vec4f(0.5f, 1, 1, 1); });
+        Ground g;
+        BackgroundGeometry& s = g.shader;
+        s.bumpMode = mode;
+        s.bumpTexture.texture = &bump;
+        // A rotation about z of everything, the texture transform turned by another.
+        auto const turn = [](float a, float scale) {
+            float const c = std::cos(a) * scale, n = std::sin(a) * scale;
+            return Mat4f(c, n, 0, 0, -n, c, 0, 0, 0, 0, scale, 0, 0, 0, 0, 1);
+        };
+        float const a = random.in(-3, 3), scale = random.in(0.5f, 3);
+        s.bumpTextureMatrix = turn(a, scale);
+        s.bumpTextureMatrixInverse = turn(-a, 1 / scale);
+        s.bumpUVMatrix = Mat3f(s.bumpTextureMatrix);
+        g.state.objectToWorld = turn(random.in(-3, 3), 2);
+        test::setAttribute(g.state, 8, Vec3f(1, 0, 0)); // uv = object xy
+        test::setAttribute(g.state, 20, Vec3f(0, 1, 0));
+        // Angular: the cylinder's wall, seen from where its normal is; others: the xy plane.
+        Vec3f object(random.in(-1, 1), random.in(-1, 1), random.in(-1, 1));
+        Vec3f normal(0, 0, 1);
+        if (mode == 4) {
+            // tangentU is taken about the origin: far out, it and the seam's axis agree.
+            object = object * 1e4f;
+            normal = normalize(Vec3f(object.x, object.y, 0));
+        }
+        g.state.Pref = object;
+        g.state.Nref = normal;
+        Vec3f const n = normalize(transformDirection(g.state.objectToWorld, normal));
+        g.state.N = g.state.Ng = n;
+        g.state.I = -n;
+        Vec3f seen(0, 0, 0);
+        g.host.onOcclusion = [&](Vec3f, Vec3f N) { return seen = N, Vec3f(1, 1, 1); };
+        g.shade();
+        EXPECT_NEAR(dot(seen, n), std::sqrt(0.5f), 1e-5f) << "mode " << mode;
+        // A step along the lean, on the surface, must raise that texture coordinate by most.
+        Vec3f const lean = normalize(seen - dot(seen, n) * n);
+        Mat3f back(g.state.objectToWorld); // transposed: a rotation's inverse, up to scale
+        std::swap(back.m[1], back.m[3]);
+        Vec3f const step = transformDirection(back, lean) * (mode == 4 ? 10.0f : 1e-2f);
+        auto const coordinate = [&](Vec3f p) {
+            Picture probe([](Vec2f at) { return Vec4f(at.x, at.y, 0, 1); });
+            TextureSampler2D sampler;
+            sampler.texture = &probe;
+            Vec3i axes;
+            Vec3f u, v;
+            Vec4f const t =
+                s.f_evalMapping(nullptr, g.state, mode, {}, sampler, s.bumpTextureMatrix, 1, p,
+                                normal, false, {p.x, p.y}, axes, u, v, s.bumpUVMatrix);
+            return Vec2f(t.x, t.y);
+        };
+        Vec2f const rise = coordinate(object + step) - coordinate(object);
+        if (mode == 4 && std::fabs(rise.x) > 0.5f)
+            continue; // across the seam
+        float const along = alongU ? rise.x : rise.y, across = alongU ? rise.y : rise.x;
+        EXPECT_GT(along, 0.0f) << "mode " << mode;
+        if (mode != 4) {
+            EXPECT_LT(std::fabs(across), 1e-3f * along) << "mode " << mode;
+        }
+    }
+}
+
+TEST(BackgroundGeometry, ReflectivityIsSplitBetweenBlurredAndSharp)
+{
+    test::Random random;
+    Cube one([](Vec3f) { return Vec4f(1, 1, 1, 1); });
+    for (int i = 0; i < 200; ++i) {
+        Ground g;
+        float const c = random.in(0.05f, 1);
+        g.state.I = {std::sqrt(1 - c * c), 0, -c};
+        g.shader.diffuseColor = {0, 0, 0};
+        g.shader.specularColor = {0.1f, 0.2f, 0.3f};
+        g.host.onTrace = [](Vec3f, Vec3f) { return Vec3f(1, 1, 1); };
+        g.shader.specularCube.texture = &one;
+        g.shader.useCubeReflection = i % 2;
+        g.shader.reflectCube.texture = &one;
+        expectColor(g.shade(), {0.1f, 0.2f, 0.3f}); // in a white room, the reflectivity
+        EXPECT_EQ(g.host.count("traceReflection"), i % 2 ? 0 : 1);
+        g.shader.specularCube = {};
+        float const sharp = std::pow(1 - c, 5.0f); // only the sharp share is left
+        expectColor(g.shade(), Vec3f(0.1f, 0.2f, 0.3f) * sharp);
+    }
+    // A reflection ray takes the ground for the environment, where there is one.
+    Ground g;
+    Cube cube([](Vec3f d) { return Vec4f(d.x + 2, d.y + 2, d.z + 2, 0.3f); });
+    g.state.rayType = 2;
+    expectColor(g.shade(), {0.2f, 0.4f, 0.6f});
+    g.shader.reflectCube.texture = &cube;
+    float const r = std::sqrt(0.5f);
+    expectColor(g.shade(), {2 + r, 2 - r, 2}); // I = (r, 0, -r), looked up at (x, z, -y)
+    g.shader.useCubeReflection = false;
+    expectColor(g.shade(), {0.2f, 0.4f, 0.6f});
+}
+
+TEST(BackgroundGeometry, GradesContrastThenGainThenSaturation)
+{
+    // Luminance of (0.5, 0.25, 1): 0.2125 / 2 + 0.7154 / 4 + 0.0721.
+    constexpr float kL = 0.3572f;
+    struct Case {
+        char const* why;
+        ChannelGrade grade;
+        Vec3f want;
+    };
+    Case const cases[] = {
+        {"defaults", {}, {0.5f, 0.25f, 1}},
+        {"none left: the pivot", {.contrastPivot = {3, 4, 5}, .contrast = 0}, {3, 4, 5}},
+        {"steeper, dark at 0", {.contrastPivot = {0.5f, 0.5f, 0.5f}, .contrast = 3}, {0.5f, 0, 2}},
+        {"value alone", {.gainColor = {9, 9, 9}, .gain = 2}, {1, 0.5f, 2}},
+        {"colour", {.gainColor = {2, 4, 8}, .gainSource = 1, .gain = 0.5f}, {0.5f, 0.5f, 4}},
+        {"luminance",
+         {.gainColor = {1, 2, 4}, .gainSource = 2, .gain = 2},
+         {2 * kL, 4 * kL, 8 * kL}},
+        {"unknown source", {.gainColor = {9, 9, 9}, .gainSource = 3}, {0.5f, 0.25f, 1}},
+        {"grey", {.saturation = 0}, {kL, kL, kL}},
+        {"more colour", {.saturation = 2}, {1 - kL, 0.5f - kL, 2 - kL}},
+    };
+    for (Case const& c : cases) {
+        Vec3f const got = gradeChannel({0.5f, 0.25f, 1}, c.grade);
+        EXPECT_LT(length(got - Vec3f(maxOf(c.want.x, 0), maxOf(c.want.y, 0), c.want.z)), 2e-6f)
+            << c.why;
+    }
+}
+
+TEST(BackgroundGeometry, NoParameterIsDead)
+{
+    Picture picture([](Vec2f at) {
+        return Vec4f(0.3f + 0.1f * std::sin(at.x), 0.4f + 0.1f * std::sin(at.y), 0.8f, 1);
+    });
+    Cube cube([](Vec3f d) {
+        return Vec4f(0.5f + 0.3f * std::sin(d.x), 0.6f + 0.3f * std::sin(d.y), 0.9f, 1);
+    });
+    auto const setUp = [&](BackgroundGeometry& s, std::string const& name) {
+        bool const uv = name.ends_with("UVMatrix") || name.ends_with("Texture");
+        bool const angular = name.ends_with("AngularRepeat") || name.ends_with("Inverse");
+        int const mode = uv ? 1 : angular ? 4 : 2;
+        Mat4f const m(0.9f, 0.2f, 0.1f, 0, -0.2f, 1.1f, 0, 0, 0, 0.3f, 1, 0, 0.1f, 0.2f, 0.3f, 1);
+        for (TextureSampler2D* t : {&s.diffuseTexture, &s.specularTexture, &s.bumpTexture})
+            t->texture = &picture;
+        for (TextureSamplerCube* t : {&s.diffuseCube, &s.specularCube, &s.reflectCube})
+            t->texture = &cube;
+        s.diffuseTextureMatrix = s.specularTextureMatrix = s.bumpTextureMatrix =
+            s.bumpTextureMatrixInverse = m;
+        s.diffuseUVMatrix = s.specularUVMatrix = s.bumpUVMatrix = s.globalIBLMatrix = Mat3f(m);
+        s.diffuseMode = s.specularMode = s.bumpMode = mode;
+        if (name == "diffuseColor" || name == "specularColor")
+            s.diffuseMode = s.specularMode = 0;
+        for (Vec3f* gain : {&s.diffuseIBLGainColor, &s.specularIBLGainColor, &s.globalIBLGainColor,
+                            &s.diffuseTextureGainColor, &s.reflectIBLChannelGainColor})
+            *gain = {0.9f, 0.7f, 0.5f};
+        for (int* source :
+             {&s.diffuseIBLGainSource, &s.specularIBLGainSource, &s.diffuseTextureGainSource,
+              &s.globalIBLGainSource, &s.reflectIBLChannelGainSource})
+            *source = 1;
+        if (name.ends_with("Pivot"))
+            s.diffuseIBLContrastValue = s.specularIBLContrastValue = s.globalIBLContrastValue =
+                0.5f;
+    };
+    auto const run = [](BackgroundGeometry const& s) {
+        std::vector<float> results;
+        for (std::uint32_t rayType : {1u, 2u}) {
+            test::ScriptedHost host;
+            host.addLight(normalize(Vec3f(1, 1, 1)), {1, 0.9f, 0.8f}, {0.2f, 0.3f, 0.4f}, 0.6f);
+            host.onOcclusion = [](Vec3f, Vec3f) { return Vec3f(0.7f, 0.8f, 0.9f); };
+            host.onTrace = [](Vec3f, Vec3f d) { return d + Vec3f(2, 2, 2); };
+            ShadeState state = test::plainHit();
+            state.rayType = rayType;
+            state.I = normalize(Vec3f(3, 1, -1));
+            state.Pref = {0.3f, 0.9f, 0.4f};
+            test::setAttribute(state, 0, Vec2f(0.3f, 0.6f));
+            test::setAttribute(state, 8, Vec3f(1, 0.2f, 0));
+            test::setAttribute(state, 20, Vec3f(0, 1, 0.1f));
+            s.shade(&host, state);
+            results.insert(results.end(), {state.Ci.x, state.Ci.y, state.Ci.z});
+        }
+        return results;
+    };
+    EXPECT_EQ(test::deadParameters<BackgroundGeometry>(setUp, run), std::vector<std::string>{});
+}
+
+TEST(BackgroundGeometry, ShadowRaysStopAtGroundThatFacesUp)
+{
+    struct Case {
+        std::uint32_t rayType;
+        float nz, want;
+    };
+    constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
+    constexpr Case kCases[] = {{16, 0.9f, 0}, {16, 0.89f, 1}, {16, 1, 0}, {16, -1, 1},
+                               {16, kNan, 0}, {1, 1, 1},      {32, 1, 1}};
+    for (Case const& c : kCases) {
+        Ground g;
+        g.state.rayType = c.rayType;
+        g.state.N = {0, 0, c.nz};
+        g.shader.transmission(&g.host, g.state);
+        EXPECT_EQ(g.state.transmissionColor, Vec3f(c.want, c.want, c.want)) << c.nz;
+    }
+    Ground g;
+    g.shader.sample(&g.host, g.state);
+    EXPECT_EQ(g.state.sampleDirection, g.state.I);
+    EXPECT_EQ(g.state.outBrdf, Vec3f(1, 1, 1));
+    EXPECT_EQ(g.state.sampleCosine, 1.0f);
+    EXPECT_EQ(g.state.sampleInvPdf, 1.0f);
+    EXPECT_EQ(g.state.sampleType, 4u);
+}
+
+} // namespace
+} // namespace zsi
