@@ -10,6 +10,7 @@
 /// `attribute_<name>(state)` reader for each attribute.
 #pragma once
 
+#include <bit>
 #include <cstddef>
 #include <cstring>
 #include <type_traits>
@@ -62,9 +63,12 @@ struct Registrar {
 template <class T>
 inline T readAttribute(ShadeState const& state, std::size_t offset)
 {
-    T value;
-    std::memcpy(&value, state.attributes + offset, sizeof value);
-    return value;
+    // Float by float: as one block it would go through memory a second time.
+    constexpr std::size_t kFloats = sizeof(T) / sizeof(float);
+    float value[kFloats];
+    for (std::size_t i = 0; i < kFloats; ++i)
+        std::memcpy(&value[i], state.attributes + offset + i * sizeof(float), sizeof(float));
+    return std::bit_cast<T>(value);
 }
 
 } // namespace zsi

@@ -37,9 +37,10 @@ float interfaceValue(Ggx facets, Vec3f v, float nv, Vec3f l, float nl, float F)
 
 } // namespace
 
-corvid_Mtl_Dielectric::Indices corvid_Mtl_Dielectric::indices(ShadeState const& state) const
+inline corvid_Mtl_Dielectric::Indices corvid_Mtl_Dielectric::indices(ShadeState const& state,
+                                                                     bool leaving) const
 {
-    if (isLeaving(state))
+    if (leaving)
         return {u_ior, state.beyondIor};
     return {state.incomingIor, u_ior};
 }
@@ -57,16 +58,23 @@ float corvid_Mtl_Dielectric::roughness(ShadeState const& state) const
     return u_roughAmount * u_roughMap.lookup(uv).x;
 }
 
-[[gnu::noinline]] void corvid_Mtl_Dielectric::bendFrame(IShaderAPI* api, ShadeState const& state,
-                                                        Vec3f const& P, Mat3f const& toWorld,
-                                                        SLArray<Vec3f>& frame) const
+inline bool corvid_Mtl_Dielectric::bends() const
+{
+    return u_normal0MapEnable || u_normal1MapEnable || u_procedureMapEnable == 1;
+}
+
+/// By value, so that a frame that nothing bends need not be in memory.
+[[gnu::noinline]] SLArray<Vec3f>
+corvid_Mtl_Dielectric::bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f const& P,
+                                 Mat4f const& toWorld, SLArray<Vec3f> frame) const
 {
     if (u_normal0MapEnable) {
         f_rtBumpPerturb(api, state, frame, attribute_uv(state), u_normal0Map, u_normal0Transform,
                         u_normal0Amount, u_normal0UVScale);
         normalizeAndReorthogonalize(frame);
     } else if (u_procedureMapEnable == 1) {
-        Vec3f const ripple = castRippleOffset(api, state, P, toWorld, u_procedureMapTiling, frame);
+        Vec3f const ripple =
+            castRippleOffset(api, state, P, Mat3f(toWorld), u_procedureMapTiling, frame);
         bendByOffset(frame, ripple * u_procedureMapAmount); // the normal stays unnormalised
     }
     if (u_normal1MapEnable) {
@@ -74,16 +82,17 @@ float corvid_Mtl_Dielectric::roughness(ShadeState const& state) const
                         u_normal1Amount, 1.0f);
         normalizeAndReorthogonalize(frame);
     }
+    return frame;
 }
 
 inline void corvid_Mtl_Dielectric::f_computeShadingFrame(IShaderAPI* api, ShadeState const& state,
                                                          Vec3f const& P, Vec3f const& N,
-                                                         Mat3f const& toWorld,
+                                                         Mat4f const& toWorld,
                                                          SLArray<Vec3f>& frame) const
 {
-    frame = computeBaseFrame(attribute_tangent(state), N, toWorld);
-    if (u_normal0MapEnable || u_normal1MapEnable || u_procedureMapEnable == 1) [[unlikely]]
-        bendFrame(api, state, P, toWorld, frame);
+    frame = computeBaseFrame(attribute_tangent(state), N, Mat3f(toWorld));
+    if (bends()) [[unlikely]]
+        frame = bentFrame(api, state, P, toWorld, frame);
 }
 
 /// Colour per light of the weight, from the direction L.
@@ -116,9 +125,9 @@ void corvid_Mtl_Dielectric::f_calculateColors(IShaderAPI* api, ShadeState const&
                                               PhysicalColors& out) const
 {
     bool const leaving = isLeaving(state);
-    Indices const n = indices(state);
+    Indices const n = indices(state, leaving);
     SLArray<Vec3f> frame;
-    f_computeShadingFrame(api, state, state.P, state.N, Mat3f(state.objectToWorld), frame);
+    f_computeShadingFrame(api, state, state.P, state.N, state.objectToWorld, frame);
     Vec3f const& N = frame[2];
     Vec3f const v = toLocal(frame, -state.I);
     float const r = roughness(state);
@@ -171,10 +180,10 @@ void corvid_Mtl_Dielectric::transmission(IShaderAPI*, ShadeState& state) const
 
 void corvid_Mtl_Dielectric::transfer(IShaderAPI* api, ShadeState& state) const
 {
-    Indices const n = indices(state);
-    Vec3f const Nf = -state.N * facingSign(state.I, state.Ng);
+    float const side = dot(state.I, state.Ng);
+    Indices const n = indices(state, side > 0.0f);
     SLArray<Vec3f> frame;
-    f_computeShadingFrame(api, state, state.P, Nf, Mat3f(state.objectToWorld), frame);
+    f_computeShadingFrame(api, state, state.P, state.N * -sign(side), state.objectToWorld, frame);
     Vec3f const v = toLocal(frame, -state.I);
     Vec3f const l = toLocal(frame, state.sampleDirection);
     float const r = roughness(state);
@@ -183,73 +192,116 @@ void corvid_Mtl_Dielectric::transfer(IShaderAPI* api, ShadeState& state) const
     state.outBrdf = grey(interfaceValue(Ggx{r * r}, v, n.outer, l, n.inner, F));
 }
 
-void corvid_Mtl_Dielectric::sample(IShaderAPI* api, ShadeState& state) const
+/// cosine: of the view direction against the frame normal; c: against the facet.
+inline corvid_Mtl_Dielectric::Event corvid_Mtl_Dielectric::chooseEvent(IShaderAPI* api,
+                                                                       ShadeState const& state,
+                                                                       float cosine, float c,
+                                                                       float eta) const
 {
+    constexpr Event kEnd{-1.0f, 0.0f, 0.0f, false};
+    if (c < 0.0f)
+        return kEnd;
     bool const mayReflect = anySwitch(state.allowReflection);
     bool const mayTransmit = anySwitch(state.allowTransmission);
-    if (!mayReflect && !mayTransmit) {
-        state.sampleType = kSampleNone;
-        return;
-    }
-    Indices const n = indices(state);
-    Vec3f const Nf = -state.N * facingSign(state.I, state.Ng);
-    SLArray<Vec3f> frame;
-    f_computeShadingFrame(api, state, state.P, Nf, Mat3f(state.objectToWorld), frame);
-    Vec3f const v = toLocal(frame, -state.I);
-    float const F = schlick(u_reflectance, v.z);
-    float const r = roughness(state);
-    Ggx const facets{r * r};
-
-    bool const smooth = isLeaving(state) || r < kSmoothRoughness;
-    Vec3f m(0.0f, 0.0f, 1.0f);
-    if (!smooth) {
-        Vec2f const xi = api->random2D();
-        float const tan2 = facets.sampleTan2(xi.x);
-        float const cosine = 1.0f / std::sqrt(1.0f + tan2);
-        float const sine = std::sqrt(tan2) * cosine;
-        float const phi = 6.283185f * xi.y;
-        m = {sine * std::cos(phi), sine * std::sin(phi), cosine};
-    }
-    float const c = smooth ? v.z : dot(v, m);
-    if (c < 0.0f) {
-        state.sampleType = kSampleNone;
-        return;
-    }
-
+    float const F = schlick(u_reflectance, cosine);
     float weight = 1.0f;
     bool refracts = mayTransmit;
     if (mayReflect && mayTransmit)
         refracts = F < api->random();
     else
         weight = mayReflect ? F : 1.0f - F;
-
-    Vec3f d;
-    float beyond = n.outer; // a reflection stays in its medium
     if (refracts) {
-        float const eta = n.eta();
         float const k = (c * c - 1.0f) * eta * eta + 1.0f;
-        if (k >= 0.0f) {
-            d = normalize((eta * c - std::sqrt(k)) * m - eta * v);
-            beyond = n.inner;
-        } else if (mayReflect) { // total internal reflection
-            weight = 1.0f;
-            refracts = false;
-        } else {
-            state.sampleType = kSampleNone;
-            return;
-        }
+        if (k >= 0.0f)
+            return {weight, eta * c - std::sqrt(k), eta, true};
+        if (!mayReflect)
+            return kEnd;
+        weight = 1.0f; // total internal reflection
     }
-    if (!refracts)
-        d = 2.0f * c * m - v;
+    return {weight, 2.0f * c, 1.0f, false};
+}
 
-    if (!smooth)
-        weight *= clamp(facets.sampleWeight(v, d, m), 0.0f, 4.0f);
+/// d: local direction of the event.
+inline void corvid_Mtl_Dielectric::continuePath(ShadeState& state, SLArray<Vec3f> const& frame,
+                                                Vec3f d, float weight, Event event, Indices n)
+{
     state.sampleCosine = 1.0f;
     state.sampleInvPdf = 1.0f;
-    state.sampleType = smooth ? kSampleSmooth : kSampleRough;
-    state.beyondIor = beyond;
+    state.beyondIor = event.refracts ? n.inner : n.outer; // a reflection stays in its medium
     state.sampleDirection = toWorld(frame, d);
     state.outBrdf = grey(weight);
+}
+
+[[gnu::always_inline]] inline void
+corvid_Mtl_Dielectric::samplePolished(IShaderAPI* api, ShadeState& state, Vec3f Nf, Indices n) const
+{
+    // The facet is the frame normal: without bumps the frame waits until the host has been asked.
+    bool const bent = bends();
+    SLArray<Vec3f> frame;
+    Vec3f N = Nf;
+    if (bent) [[unlikely]] {
+        f_computeShadingFrame(api, state, state.P, Nf, state.objectToWorld, frame);
+        N = frame[2];
+    }
+    float const c = dot(N, -state.I);
+    Event const event = chooseEvent(api, state, c, c, n.eta());
+    if (event.ends()) {
+        state.sampleType = kSampleNone;
+        return;
+    }
+    if (!bent) [[likely]]
+        frame = computeBaseFrame(attribute_tangent(state), N, Mat3f(state.objectToWorld));
+    float const b = event.alongView;
+    Vec3f d(b * dot(frame[0], state.I), b * dot(frame[1], state.I), event.alongFacet - b * c);
+    if (event.refracts)
+        d = normalize(d);
+    state.sampleType = kSampleSmooth;
+    continuePath(state, frame, d, event.weight, event, n);
+}
+
+[[gnu::always_inline]] inline void corvid_Mtl_Dielectric::sampleRough(IShaderAPI* api,
+                                                                      ShadeState& state, Vec3f Nf,
+                                                                      Indices n, float r) const
+{
+    Ggx const facets{r * r};
+    Vec2f const xi = api->random2D();
+    float const tan2 = facets.sampleTan2(xi.x);
+    float const cosine = 1.0f / std::sqrt(1.0f + tan2);
+    float const sine = std::sqrt(tan2) * cosine;
+    float const phi = 6.283185f * xi.y;
+    Vec3f const m(sine * std::cos(phi), sine * std::sin(phi), cosine);
+
+    SLArray<Vec3f> frame;
+    f_computeShadingFrame(api, state, state.P, Nf, state.objectToWorld, frame);
+    Vec3f const v = toLocal(frame, -state.I);
+    Event const event = chooseEvent(api, state, v.z, dot(v, m), n.eta());
+    if (event.ends()) {
+        state.sampleType = kSampleNone;
+        return;
+    }
+    Vec3f d = event.alongFacet * m - event.alongView * v;
+    if (event.refracts)
+        d = normalize(d);
+    float const weight = event.weight * clamp(facets.sampleWeight(v, d, m), 0.0f, 4.0f);
+    state.sampleType = kSampleRough;
+    continuePath(state, frame, d, weight, event, n);
+}
+
+void corvid_Mtl_Dielectric::sample(IShaderAPI* api, ShadeState& state) const
+{
+    if (!anySwitch(state.allowReflection) && !anySwitch(state.allowTransmission)) {
+        state.sampleType = kSampleNone;
+        return;
+    }
+    float const side = dot(state.I, state.Ng);
+    bool const leaving = side > 0.0f;
+    Vec3f const Nf = state.N * -sign(side);
+    Indices const n = indices(state, leaving);
+    float const r = roughness(state);
+    if (leaving || r < kSmoothRoughness)
+        samplePolished(api, state, Nf, n);
+    else
+        sampleRough(api, state, Nf, n, r);
 }
 
 } // namespace zsi

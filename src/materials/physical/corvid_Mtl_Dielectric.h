@@ -49,7 +49,7 @@ public:
     void f_calculateColors(IShaderAPI* api, ShadeState const& state, PhysicalColors& out) const;
     /// Frame of a world-space normal, bent by the ripple or the first bump map, then the second.
     void f_computeShadingFrame(IShaderAPI* api, ShadeState const& state, Vec3f const& P,
-                               Vec3f const& N, Mat3f const& toWorld, SLArray<Vec3f>& frame) const;
+                               Vec3f const& N, Mat4f const& toWorld, SLArray<Vec3f>& frame) const;
 
 private:
     /// Refractive indices on the two sides: of the incident ray, and beyond the surface.
@@ -57,14 +57,28 @@ private:
         float outer, inner;
         float eta() const { return outer / inner; }
     };
-    Indices indices(ShadeState const& state) const;
+    /// What becomes of a path at a facet of normal m: it goes on along `alongFacet` m - `alongView`
+    /// v, or ends where the weight is negative.
+    struct Event {
+        float weight, alongFacet, alongView;
+        bool refracts;
+        bool ends() const { return weight < 0.0f; }
+    };
+    Indices indices(ShadeState const& state, bool leaving) const;
     float roughness(ShadeState const& state) const;
     float mappedRoughness(ShadeState const& state) const;
-    void bendFrame(IShaderAPI* api, ShadeState const& state, Vec3f const& P, Mat3f const& toWorld,
-                   SLArray<Vec3f>& frame) const;
+    bool bends() const;
+    SLArray<Vec3f> bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f const& P,
+                             Mat4f const& toWorld, SLArray<Vec3f> frame) const;
     float lightValue(SLArray<Vec3f> const& frame, Vec3f v, Vec3f L, Indices n, float r,
                      float F) const;
     Vec3f pathTransmittance(ShadeState const& state) const;
+    Event chooseEvent(IShaderAPI* api, ShadeState const& state, float cosine, float c,
+                      float eta) const;
+    void samplePolished(IShaderAPI* api, ShadeState& state, Vec3f Nf, Indices n) const;
+    void sampleRough(IShaderAPI* api, ShadeState& state, Vec3f Nf, Indices n, float r) const;
+    static void continuePath(ShadeState& state, SLArray<Vec3f> const& frame, Vec3f d, float weight,
+                             Event event, Indices n);
 };
 
 } // namespace zsi

@@ -96,32 +96,25 @@ void corvid_Mtl_Glazing::sample(IShaderAPI* api, ShadeState& state) const
         state.sampleType = kSampleNone;
         return;
     }
-    Vec3f const Nf = -state.N * facingSign(state.I, state.Ng);
-    float const R = reflectance();
     float factor = 1.0f;
-    bool transmits = false;
-    if (!mayReflect) {
-        transmits = true;
-        factor = 1.0f - R;
-    } else if (mayTransmit) {
-        transmits = api->random() > R;
-    } else {
-        factor = R;
-    }
+    bool transmits = mayTransmit;
+    if (mayReflect && mayTransmit)
+        transmits = api->random() > reflectance();
+    else
+        factor = mayReflect ? reflectance() : 1.0f - reflectance();
 
-    float const c = dot(Nf, state.I); // below 0 for a ray that meets the faced side
+    auto const [cosine, along] = incidence(state);
     state.sampleInvPdf = 1.0f;
     if (transmits) {
-        factor /= c; // keeps the sign, as the cosine below: their product is what counts
-        state.sampleCosine = c;
+        // Value and cosine are negative: their product counts.
+        state.sampleCosine = -cosine;
         state.sampleDirection = state.I;
-        state.outBrdf = u_refractColor * factor;
+        state.outBrdf = u_refractColor * (factor / -cosine);
         state.sampleType = kSampleSmooth;
     } else {
-        factor /= -c;
-        state.sampleCosine = -c;
-        state.sampleDirection = state.I + Nf * (2.0f * -c);
-        state.outBrdf = u_reflectColor * factor;
+        state.sampleCosine = cosine;
+        state.sampleDirection = state.I - state.N * (2.0f * along);
+        state.outBrdf = u_reflectColor * (factor / cosine);
         state.sampleType = kSampleStraight;
     }
 }

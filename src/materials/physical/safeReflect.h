@@ -38,6 +38,21 @@ inline Vec3f keepAboveSurface(Vec3f const& R, Vec3f const& I, Vec3f const& Ng, V
     return normalize(alpha * I + beta * N);
 }
 
+/// How the ray of a hit meets the shading normal, the side told by the geometric one.
+struct Incidence {
+    float
+        cosine; ///< -I.N for the normal faced to the viewer; 0 where the ray runs along Ng's plane
+    float along; ///< I.N for the normal as it is; I - 2 along N is the mirror direction
+};
+inline Incidence incidence(ShadeState const& state)
+{
+    float const side = dot(state.I, state.Ng);
+    float along = dot(state.I, state.N);
+    if (!(side < 0.0f) && !(side > 0.0f)) [[unlikely]]
+        along = 0.0f; // neither side: no normal to mirror at
+    return {side < 0.0f ? -along : along, along};
+}
+
 /// I mirrored about N, kept above the surface.
 inline Vec3f f_safe_reflect(IShaderAPI*, ShadeState const&, Vec3f I, Vec3f Ng, Vec3f N)
 {

@@ -11,20 +11,21 @@
 
 namespace zsi {
 
-/// Tangent and bitangent made unit and perpendicular to the normal as it is, unit or not.
-inline void reorthogonalize(SLArray<Vec3f>& frame)
+/// Frame of a normal as it is, unit or not: the tangent made perpendicular to it, both unit.
+[[gnu::always_inline]] inline SLArray<Vec3f> orthonormalFrame(Vec3f const& tangent, Vec3f const& N)
 {
-    Vec3f const& N = frame[2];
-    frame[0] = normalize(frame[0] - dot(frame[0], N) * N);
-    frame[1] = normalize(cross(N, frame[0]));
+    Vec3f const T = normalize(tangent - dot(tangent, N) * N);
+    return {{T, normalize(cross(N, T)), N}};
 }
 
+/// Tangent and bitangent made unit and perpendicular to the normal.
+inline void reorthogonalize(SLArray<Vec3f>& frame) { frame = orthonormalFrame(frame[0], frame[2]); }
+
 /// Frame of the "tangent" attribute (object space) and a world-space normal, not normalised here.
-inline SLArray<Vec3f> computeBaseFrame(Vec3f const& tangent, Vec3f const& N, Mat3f const& toWorld)
+[[gnu::always_inline]] inline SLArray<Vec3f> computeBaseFrame(Vec3f const& tangent, Vec3f const& N,
+                                                              Mat3f const& toWorld)
 {
-    SLArray<Vec3f> frame{{transformDirection(toWorld, tangent), Vec3f(0.0f, 0.0f, 0.0f), N}};
-    reorthogonalize(frame);
-    return frame;
+    return orthonormalFrame(transformDirection(toWorld, tangent), N);
 }
 
 /// World direction in local coordinates.

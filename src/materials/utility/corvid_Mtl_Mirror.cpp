@@ -38,11 +38,10 @@ void corvid_Mtl_Mirror::sample(IShaderAPI*, ShadeState& state) const
         state.sampleType = kSampleNone;
         return;
     }
-    Vec3f const Nf = -state.N * facingSign(state.I, state.Ng);
-    float const d = -dot(state.I, Nf); // grazing rays divide by 0 below
-    state.sampleCosine = d;
-    state.sampleDirection = state.I + Nf * (2.0f * d);
-    state.outBrdf = u_tintColor * (1.0f / d); // without the rise of `shade`
+    auto const [cosine, along] = incidence(state);
+    state.sampleCosine = cosine;
+    state.sampleDirection = state.I - state.N * (2.0f * along); // not kept above the surface
+    state.outBrdf = u_tintColor * (1.0f / cosine); // without the rise of `shade`
     state.sampleInvPdf = 1.0f;
     state.sampleType = kSampleStraight;
 }
