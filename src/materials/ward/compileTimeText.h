@@ -12,6 +12,7 @@ struct Text {
 
     constexpr Text() = default;
     // Implicit, so that a literal can stand as a template argument.
+    // cppcheck-suppress noExplicitConstructor
     constexpr Text(char const (&literal)[N])
     {
         for (std::size_t i = 0; i < N; ++i)
