@@ -59,11 +59,12 @@ float brickCoverage(float x, float gap, float width)
     return clamp01(before + here + behind);
 }
 
-/// Whether any of the brick round `x` lies in the square. cell: its size; at: where in the cell.
-bool brickInSquare(float x, float cell, float at, float gap)
+/// A coordinate after its edge was displaced, kept off the ends of the square by half a gap: no
+/// sliver of a brick shows beyond the mortar that closes the square.
+float displaced(float x, float by, float gap, float cell)
 {
-    constexpr float kRounding = 1e-4f;
-    return x + (gap - at) * cell < 1.0f - kRounding && x + (1.0f - gap - at) * cell > kRounding;
+    float const margin = minOf(0.5f * gap * cell, 0.5f);
+    return clamp(x + by, margin, 1.0f - margin);
 }
 
 float variation(float random, float spread)
@@ -95,8 +96,8 @@ Vec4f TileFunctions::f_Tile(IShaderAPI* api, ShadeState const&, Vec2f uv, Vec3f,
         Vec2f const at(s / (cellWidth / kRoughnessFrequency),
                        t / (cellHeight / kRoughnessFrequency));
         float const d = (2.0f * api->noise2D(&at) - 1.0f) * tile.edgeRoughness * kRoughnessScale;
-        s += d;
-        t += d;
+        s = displaced(s, d, tile.horizontalGap, cellWidth);
+        t = displaced(t, d, tile.verticalGap, cellHeight);
     }
 
     float const seed = static_cast<float>(tile.randomSeed);
@@ -113,16 +114,8 @@ Vec4f TileFunctions::f_Tile(IShaderAPI* api, ShadeState const&, Vec2f uv, Vec3f,
     Mat4f const& m = tile.xform;
     float const ds = std::fabs(m.m[0]) * footprint.x + std::fabs(m.m[4]) * footprint.y;
     float const dt = std::fabs(m.m[1]) * footprint.x + std::fabs(m.m[5]) * footprint.y;
-    float const x = fract(columns);
-    float const y = fract(rows);
-    float mask = brickCoverage(x, tile.horizontalGap, ds / std::fabs(cellWidth))
-        * brickCoverage(y, tile.verticalGap, dt / std::fabs(cellHeight));
-    // Rough edges must not reach out for slivers of bricks beyond the mortar that closes the
-    // square.
-    if (tile.edgeRoughness != 0.0f
-        && !(brickInSquare(s, cellWidth, x, tile.horizontalGap)
-             && brickInSquare(t, cellHeight, y, tile.verticalGap)))
-        mask = 0.0f;
+    float mask = brickCoverage(fract(columns), tile.horizontalGap, ds / std::fabs(cellWidth))
+        * brickCoverage(fract(rows), tile.verticalGap, dt / std::fabs(cellHeight));
 
     float shade = 1.0f;
     bool const someHoles = tile.holes > 0 && tile.holes < 100;
