@@ -1,1 +1,129 @@
 #include "film/imageFile.h"
+
+#include "base/error.h"
+
+#include <OpenImageIO/imageio.h>
+#include <algorithm>
+#include <cctype>
+#include <cmath>
+#include <fmt/format.h>
+#include <unistd.h>
+#include <zsi/vecmath.h>
+
+namespace zsi::host {
+namespace {
+
+/// IEC 61966-2-1, to the nearest of 256 steps; NaN becomes 0.
+std::uint8_t encodeSrgb(float linear)
+{
+    if (!(linear > 0.0f))
+        return 0;
+    if (linear >= 1.0f)
+        return 255;
+    float const v =
+        linear <= 0.0031308f ? 12.92f * linear : 1.055f * std::pow(linear, 1.0f / 2.4f) - 0.055f;
+    return static_cast<std::uint8_t>(v * 255.0f + 0.5f);
+}
+
+std::uint8_t encodeLinear(float v)
+{
+    return !(v > 0.0f) ? std::uint8_t(0)
+                       : static_cast<std::uint8_t>(minOf(v, 1.0f) * 255.0f + 0.5f);
+}
+
+struct Encoding {
+    int channels;
+    OIIO::TypeDesc type;
+};
+
+Encoding encodingOf(std::filesystem::path const& file)
+{
+    std::string extension = file.extension().string();
+    std::transform(extension.begin(), extension.end(), extension.begin(),
+                   [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
+    if (extension == ".exr")
+        return {4, OIIO::TypeDesc::FLOAT};
+    if (extension == ".hdr")
+        return {3, OIIO::TypeDesc::FLOAT};
+    if (extension == ".png")
+        return {4, OIIO::TypeDesc::UINT8};
+    if (extension == ".jpg" || extension == ".jpeg")
+        return {3, OIIO::TypeDesc::UINT8};
+    throw InputError(file.string()
+                     + ": unknown kind of picture; expected .exr, .hdr, .png, .jpg or .jpeg");
+}
+
+/// Removes the file on the way out unless it was handed over.
+struct TemporaryFile {
+    std::filesystem::path path;
+    ~TemporaryFile()
+    {
+        std::error_code ignored;
+        if (!path.empty())
+            std::filesystem::remove(path, ignored);
+    }
+};
+
+void writeTo(std::filesystem::path const& file, Picture const& picture, float exposure,
+             Encoding encoding)
+{
+    auto const fail = [&](std::string const& why) {
+        throw InputError(file.string() + ": cannot be written: " + why);
+    };
+    auto const output = OIIO::ImageOutput::create(file.string());
+    if (!output)
+        fail(OIIO::geterror());
+    OIIO::ImageSpec spec(picture.width, picture.height, encoding.channels, encoding.type);
+    bool const encoded = encoding.type == OIIO::TypeDesc::UINT8;
+    spec.attribute("oiio:ColorSpace", encoded ? "sRGB" : "Linear");
+    spec.attribute("Software", "zsi");
+    if (encoded)
+        spec.attribute("oiio:UnassociatedAlpha", 1); // colours go out as they are
+    if (file.extension() == ".exr")
+        spec.attribute("compression", "zip");
+    spec.attribute("CompressionQuality", 95);
+    if (!output->open(file.string(), spec))
+        fail(output->geterror());
+
+    auto const pixels =
+        static_cast<std::size_t>(picture.width) * static_cast<std::size_t>(picture.height);
+    auto const channels = static_cast<std::size_t>(encoding.channels);
+    bool written;
+    if (encoded) {
+        float const gain = std::exp2(exposure);
+        std::vector<std::uint8_t> bytes(pixels * channels);
+        for (std::size_t i = 0; i < pixels; ++i)
+            for (std::size_t c = 0; c < channels; ++c) {
+                float const v = picture.rgba[i * 4 + c];
+                bytes[i * channels + c] = c == 3 ? encodeLinear(v) : encodeSrgb(v * gain);
+            }
+        written = output->write_image(OIIO::TypeDesc::UINT8, bytes.data());
+    } else {
+        written = output->write_image(OIIO::TypeDesc::FLOAT, picture.rgba.data(),
+                                      static_cast<OIIO::stride_t>(4 * sizeof(float)));
+    }
+    bool const closed = output->close();
+    if (!written || !closed)
+        fail(output->geterror());
+}
+
+} // namespace
+
+void writePicture(std::filesystem::path const& file, Picture const& picture, float exposure)
+{
+    Encoding const encoding = encodingOf(file);
+    if (picture.width <= 0 || picture.height <= 0)
+        throw InputError(file.string() + ": the picture is empty");
+    // The extension stays last: it tells the format.
+    TemporaryFile temporary{
+        file.parent_path()
+        / fmt::format(".{}.{}{}", file.stem().string(), getpid(), file.extension().string())};
+    writeTo(temporary.path, picture, exposure, encoding);
+    std::error_code error;
+    std::filesystem::rename(temporary.path, file, error);
+    if (error)
+        throw InputError(file.string() + ": cannot be written: " + error.message());
+    temporary.path.clear();
+}
+
+} // namespace zsi::host

@@ -65,6 +65,7 @@ struct Settings {
     int indirectSamples = 1; ///< rays of one indirect-diffuse query at the first hit
     float occlusionDistance = 0.0f; ///< 0: unlimited
     Vec3f ambient{0, 0, 0}; ///< what `ambientLight` gives
+    float sampleClamp = 0.0f; ///< brightest channel that a camera sample may have; 0: no limit
     std::uint32_t seed = 1;
     std::string integrator = "shade"; ///< "shade": the materials' shade; "path": sample/transfer
 };

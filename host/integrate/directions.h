@@ -1,0 +1,48 @@
+/// Random directions around an axis.
+#pragma once
+
+#include <cmath>
+#include <zsi/vecmath.h>
+
+namespace zsi::host {
+
+/// Two unit vectors that make a right-handed frame with unit `n`.
+/// Duff et al. 2017, "Building an Orthonormal Basis, Revisited".
+inline void basisAround(Vec3f n, Vec3f& t, Vec3f& b)
+{
+    float const s = std::copysign(1.0f, n.z);
+    float const a = -1.0f / (s + n.z);
+    float const c = n.x * n.y * a;
+    t = {1.0f + s * n.x * n.x * a, s * c, -s * n.x};
+    b = {c, s + n.y * n.y * a, -n.y};
+}
+
+/// The direction at `cosine` from `axis` and `u` of a turn around it.
+inline Vec3f around(Vec3f axis, float cosine, float u)
+{
+    Vec3f t, b;
+    basisAround(axis, t, b);
+    float const sine = std::sqrt(maxOf(0.0f, 1.0f - cosine * cosine));
+    float const phi = 6.28318531f * u;
+    return normalize(t * (sine * std::cos(phi)) + b * (sine * std::sin(phi)) + axis * cosine);
+}
+
+/// Density cosine / pi around `n`.
+inline Vec3f cosineDirection(Vec3f n, Vec2f u) { return around(n, std::sqrt(1.0f - u.x), u.y); }
+
+/// Around `axis`, as far off it as a facet of a GGX surface of width `alpha` (Walter et al. 2007,
+/// eq. 35) turns a ray: `turn` times the facet's tilt, 2 for a reflection.
+inline Vec3f lobeDirection(Vec3f axis, float alpha, float turn, Vec2f u)
+{
+    float const tilt = std::atan(alpha * std::sqrt(u.x / (1.0f - u.x)));
+    return around(axis, std::cos(turn * tilt), u.y);
+}
+
+/// `d` mirrored to the side of the plane that `n` points to, where it is not there.
+inline Vec3f towardsSide(Vec3f d, Vec3f n)
+{
+    float const h = dot(d, n);
+    return h < 0.0f ? d - n * (2.0f * h) : d;
+}
+
+} // namespace zsi::host

@@ -1,0 +1,92 @@
+#include "integrate/preparedScene.h"
+
+#include <cstring>
+#include <string_view>
+
+namespace zsi::host {
+namespace {
+
+struct KnownAttribute {
+    std::string_view name;
+    int kind;
+    PreparedMaterial::Source source;
+};
+
+constexpr KnownAttribute kKnownAttributes[] = {
+    {"uv", kAttributeVec2f, PreparedMaterial::Source::Uv},
+    {"uv1", kAttributeVec2f, PreparedMaterial::Source::Uv1},
+    {"tangent", kAttributeVec3f, PreparedMaterial::Source::Tangent},
+    {"bitangent", kAttributeVec3f, PreparedMaterial::Source::Bitangent},
+    {"vtxcolor", kAttributeVec4f, PreparedMaterial::Source::Color},
+};
+
+std::size_t sizeOf(int kind)
+{
+    return kind == kAttributeVec2f ? sizeof(Vec2f)
+        : kind == kAttributeVec3f  ? sizeof(Vec3f)
+                                   : sizeof(Vec4f);
+}
+
+PreparedMaterial prepare(Shader const& shader)
+{
+    PreparedMaterial material{shader.material(), shader.entryPoints(), nullptr, {}};
+    // The contract has no other place where a material tells the index of its medium.
+    for (char const* name : {"u_ior", "refractiveIndex"})
+        if (Parameter const* p = shader.find(name); p && p->type == ParameterType::Float)
+            material.ior = static_cast<float const*>(p->field);
+    for (Attribute const& attribute : shader.attributes())
+        for (KnownAttribute const& known : kKnownAttributes) {
+            auto const offset = static_cast<std::size_t>(attribute.offset);
+            bool const fits = attribute.offset >= 0
+                && offset + sizeOf(attribute.kind) <= sizeof(ShadeState::attributes);
+            if (fits && attribute.name == known.name && attribute.kind == known.kind)
+                material.attributes.push_back({known.source, offset});
+        }
+    return material;
+}
+
+} // namespace
+
+PreparedScene::PreparedScene(Scene const& scene_)
+    : scene(scene_)
+    , rays(scene_)
+{
+    for (Shader const& shader : scene.materials)
+        materials.push_back(prepare(shader));
+}
+
+void PreparedScene::fillAttributes(SurfacePoint const& s, ShadeState& state) const
+{
+    PreparedMaterial const& material = materialOf(s);
+    if (material.attributes.empty())
+        return;
+    Mesh const& mesh = scene.meshes[static_cast<std::size_t>(scene.instances[s.instance].mesh)];
+    auto const& corner = mesh.triangles[s.triangle];
+    float const w = 1.0f - s.u - s.v;
+    auto const deliver = [&](auto const& values, auto missing, std::size_t offset) {
+        auto const value = values.empty()
+            ? missing
+            : values[corner[0]] * w + values[corner[1]] * s.u + values[corner[2]] * s.v;
+        std::memcpy(state.attributes + offset, &value, sizeof(value));
+    };
+    for (PreparedMaterial::Slot const& slot : material.attributes)
+        switch (slot.source) {
+        case PreparedMaterial::Source::Uv:
+            deliver(mesh.uv, Vec2f(0, 0), slot.offset);
+            break;
+        case PreparedMaterial::Source::Uv1:
+            deliver(mesh.uv1.empty() ? mesh.uv : mesh.uv1, Vec2f(0, 0), slot.offset);
+            break;
+        case PreparedMaterial::Source::Tangent:
+            deliver(mesh.tangents, Vec3f(0, 0, 0), slot.offset);
+            break;
+        case PreparedMaterial::Source::Bitangent:
+            deliver(mesh.bitangents, Vec3f(0, 0, 0), slot.offset);
+            break;
+        case PreparedMaterial::Source::Color:
+            deliver(mesh.colors, Vec4f(1, 1, 1, 1), slot.offset);
+            break;
+        }
+}
+
+} // namespace zsi::host

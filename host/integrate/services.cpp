@@ -1,0 +1,292 @@
+// The services of a shading call. docs/services.md describes them.
+#include "integrate/directions.h"
+#include "integrate/noise.h"
+#include "integrate/tracer.h"
+
+#include <limits>
+
+namespace zsi::host {
+namespace {
+
+/// Rays that count less than this are traced with a chance in proportion, and count for more.
+constexpr float kFullImportance = 1.0f / 32.0f;
+/// Further bounces of indirect light add little and cost much.
+constexpr int kMaxDiffuseBounces = 3;
+/// A shadow ray that went through so many surfaces is taken for blocked.
+constexpr int kMaxShadowSurfaces = 256;
+/// Shadow segments end a little before their goal, which may be a surface.
+constexpr float kShadowEnd = 1.0f - 1e-5f;
+
+bool unit(Vec3f& v)
+{
+    float const l = length(v);
+    if (!(l > 0.0f) || !std::isfinite(l))
+        return false;
+    v = v / l;
+    return true;
+}
+
+} // namespace
+
+LightSample* Tracer::getLightSamples(int, Vec3f const* P, Vec3f const* normal)
+{
+    if (!call_)
+        return nullptr;
+    LightSample* head = nullptr;
+    LightSample** end = &head;
+    for (Light const& light : scene_.scene.lights) {
+        Vec2f const u = light.radius > 0.0f ? sampler_->next2D() : Vec2f(0, 0);
+        ShadeState state = call_->state;
+        LightSample sample;
+        if (!askLight(light, lightPoint(light, *P, u), *P, *normal, this, state, sample))
+            continue;
+        sample.color = finite(sample.color);
+        sample.shadow = finite(sample.shadow);
+        LightSample& kept = lightRecords_.add();
+        kept = sample;
+        *end = &kept;
+        end = &kept.next;
+    }
+    return head;
+}
+
+Vec3f Tracer::ambientLight(Vec3f const*, Vec3f const*) { return settings_.ambient; }
+
+Vec3f Tracer::shadowTransmission(Vec3f const* from, Vec3f const* to)
+{
+    Vec3f direction = *to - *from;
+    if (!unit(direction))
+        return {1, 1, 1};
+    Vec3f const origin = shadowStart(*from, direction);
+    direction = *to - origin;
+    float const distance = length(direction);
+    if (!unit(direction))
+        return {1, 1, 1};
+    return transmit(*from, origin, direction, distance * kShadowEnd);
+}
+
+Vec3f Tracer::transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMax)
+{
+    ++rays_;
+    if (scene_.rays.occluded({origin, direction, tMax}, Visibility::Opaque))
+        return {0, 0, 0};
+
+    PathRay ray;
+    if (call_)
+        ray = call_->ray;
+    ray.type = kRayShadow;
+    ray.depth += 1;
+    ray.direction = direction;
+    ray.E = E;
+    ray.origin = origin;
+    Vec3f passed{1, 1, 1};
+    for (int i = 0; i < kMaxShadowSurfaces; ++i) {
+        Hit hit;
+        if (!scene_.rays.intersect({ray.origin, direction, tMax}, Visibility::Clear, hit))
+            return passed;
+        SurfacePoint const surface = scene_.rays.surface(hit);
+        PreparedMaterial const& material = scene_.materialOf(surface);
+        {
+            Call call(*this, ray, surface);
+            material.shader->transmission(this, call.state);
+            passed *= finite(call.state.transmissionColor);
+        }
+        if (passed == Vec3f(0, 0, 0))
+            return passed;
+        bool const leaves = dot(direction, surface.Ng) > 0.0f;
+        if (leaves)
+            ray.media.leave(surface.instance);
+        else if (material.ior)
+            ray.media.enter(surface.instance, *material.ior);
+        // Each stretch between two surfaces is a ray of its own: where the next surface absorbs
+        // over the distance from `E`, that is the way inside the medium.
+        ray.E = surface.P;
+        ray.origin = offsetPoint(surface.P, leaves ? surface.Ng : -surface.Ng);
+        tMax -= hit.t;
+        if (!(tMax > 0.0f))
+            return passed;
+    }
+    return {0, 0, 0};
+}
+
+bool Tracer::child(Vec3f const* origin, Vec3f const* direction, float importance, PathRay& ray,
+                   float& scale)
+{
+    if (!call_ || !isFinite(*origin) || importance <= 0.0f)
+        return false;
+    ray = call_->ray;
+    ray.direction = *direction;
+    if (!unit(ray.direction))
+        return false;
+    ray.E = *origin;
+    ray.origin = start(*origin, ray.direction);
+    ray.depth += 1;
+    ray.importance *= importance < 1.0f ? importance : 1.0f;
+    scale = 1.0f;
+    if (ray.importance < kFullImportance) {
+        float const chance = ray.importance / kFullImportance;
+        if (!(sampler_->next() < chance))
+            return false;
+        scale = 1.0f / chance;
+        ray.importance = kFullImportance;
+    }
+
+    SurfacePoint const& s = call_->surface;
+    bool const front = dot(call_->ray.direction, s.Ng) <= 0.0f;
+    bool const inwards = dot(ray.direction, s.Ng) < 0.0f;
+    PreparedMaterial const& material = scene_.materialOf(s);
+    if (front && inwards && material.ior)
+        ray.media.enter(s.instance, *material.ior);
+    else if (!front && !inwards)
+        ray.media.leave(s.instance);
+    return true;
+}
+
+bool Tracer::continuation(Vec3f const* origin, Vec3f const* direction, float importance,
+                          PathRay& ray)
+{
+    if (!call_ || !isFinite(*origin))
+        return false;
+    ray = call_->ray;
+    ray.direction = *direction;
+    if (!unit(ray.direction))
+        return false;
+    ray.E = *origin;
+    ray.origin = start(*origin, ray.direction);
+    ray.passes += 1;
+    ray.importance *= importance < 1.0f ? maxOf(importance, 0.0f) : 1.0f;
+    return true;
+}
+
+Vec3f Tracer::traceContinue(int rayType, Vec3f const* origin, Vec3f const* direction,
+                            float importance)
+{
+    PathRay ray;
+    if (!continuation(origin, direction, importance, ray))
+        return {0, 0, 0};
+    ray.type = static_cast<std::uint32_t>(rayType);
+    return rgb(radiance(ray));
+}
+
+Vec4f Tracer::traceThrough(Vec3f const* P, Vec3f const* I, float importance)
+{
+    PathRay ray;
+    if (!continuation(P, I, importance, ray))
+        return {0, 0, 0, 0};
+    if (ray.type == kRayCamera)
+        ray.type = kRayTransmission;
+    return radiance(ray);
+}
+
+Vec3f Tracer::traceReflection(Vec3f const* origin, Vec3f const* direction, float importance)
+{
+    return traceLobe(origin, direction, 0.0f, 2.0f, importance);
+}
+
+Vec3f Tracer::traceSpecular(Vec3f const* origin, Vec3f const* direction, float spread,
+                            float importance)
+{
+    return traceLobe(origin, direction, spread, 2.0f, importance);
+}
+
+Vec3f Tracer::traceRefraction(Vec3f const* origin, Vec3f const* direction, float spread,
+                              float importance)
+{
+    // A refracted ray turns by |1 - 1/n| to |n - 1| of the facet's tilt: about a half for glass.
+    return traceLobe(origin, direction, spread, 0.5f, importance);
+}
+
+Vec3f Tracer::traceLobe(Vec3f const* origin, Vec3f const* direction, float spread, float turn,
+                        float importance)
+{
+    Vec3f axis = *direction;
+    if (!call_ || !unit(axis))
+        return {0, 0, 0};
+    if (spread > 0.0f) {
+        Vec3f const Ng = call_->surface.Ng;
+        Vec3f const side = dot(axis, Ng) < 0.0f ? -Ng : Ng;
+        axis =
+            towardsSide(lobeDirection(axis, minOf(spread, 1.0f), turn, sampler_->next2D()), side);
+    }
+    PathRay ray;
+    float scale;
+    if (!child(origin, &axis, importance, ray, scale))
+        return {0, 0, 0};
+    ray.type = kRayReflection;
+    return rgb(radiance(ray)) * scale;
+}
+
+Vec3f Tracer::gatherNormal(Vec3f P, Vec3f N) const
+{
+    if (!(P == call_->surface.P))
+        return N;
+    Vec3f const Ng = call_->surface.Ng;
+    return dot(N, Ng) < 0.0f ? -Ng : Ng;
+}
+
+Vec3f Tracer::occlusion(Vec3f const* P, Vec3f const* N, float)
+{
+    Vec3f axis = *N;
+    if (!call_ || !isFinite(*P) || !unit(axis)) // no normal, no hemisphere to be blocked
+        return {1, 1, 1};
+    float const tMax = settings_.occlusionDistance > 0.0f ? settings_.occlusionDistance
+                                                          : std::numeric_limits<float>::infinity();
+    int const count = call_->ray.depth == 0 ? std::max(1, settings_.occlusionSamples) : 1;
+    Vec3f const side = gatherNormal(*P, axis);
+    Sampler::Points const points = sampler_->next2D(count);
+    Vec3f open{0, 0, 0};
+    for (int i = 0; i < count; ++i) {
+        Vec3f const direction = towardsSide(cosineDirection(axis, points[i]), side);
+        open += transmit(*P, shadowStart(*P, direction), direction, tMax);
+    }
+    return open / static_cast<float>(count); // exactly 1 when every ray is free
+}
+
+Vec3f Tracer::indirectDiffuse(Vec3f const* P, Vec3f const* N, float importance)
+{
+    Vec3f axis = *N;
+    if (!call_ || !unit(axis) || call_->ray.diffuseBounces >= kMaxDiffuseBounces)
+        return {0, 0, 0};
+    int const count = call_->ray.depth == 0 ? std::max(1, settings_.indirectSamples) : 1;
+    Vec3f const side = gatherNormal(*P, axis);
+    Sampler::Points const points = sampler_->next2D(count);
+    Vec3f sum{0, 0, 0};
+    for (int i = 0; i < count; ++i) {
+        Vec3f const direction = towardsSide(cosineDirection(axis, points[i]), side);
+        PathRay ray;
+        float scale;
+        if (!child(P, &direction, importance, ray, scale))
+            continue;
+        ray.type = kRayDiffuse;
+        ray.diffuseBounces += 1;
+        ray.origin = shadowStart(*P, direction);
+        sum += rgb(radiance(ray)) * scale;
+    }
+    return sum / static_cast<float>(count);
+}
+
+Vec3f Tracer::start(Vec3f origin, Vec3f direction) const
+{
+    if (!call_ || !(origin == call_->surface.P))
+        return origin;
+    Vec3f const Ng = call_->surface.Ng;
+    return offsetPoint(origin, dot(direction, Ng) < 0.0f ? -Ng : Ng);
+}
+
+Vec3f Tracer::shadowStart(Vec3f origin, Vec3f direction) const
+{
+    if (call_ && origin == call_->surface.P && dot(direction, call_->surface.Ng) > 0.0f)
+        return offsetPoint(call_->surface.smoothP, call_->surface.Ng);
+    return start(origin, direction);
+}
+
+float Tracer::random() { return sampler_->next(); }
+Vec2f Tracer::random2D() { return sampler_->next2D(); }
+float Tracer::cellNoise1D(float x) { return host::cellNoise1D(x); }
+float Tracer::noise2D(Vec2f const* p) { return host::noise2D(*p); }
+float Tracer::noise3DPoint(Vec3f const* p) { return signedNoise3D(*p); }
+float Tracer::noise3D(Vec4f const* pointAndPhase) { return noise4D(*pointAndPhase); }
+float Tracer::noise3DRecord(Vec3f const* p) { return host::noise3D(*p); }
+Vec3f Tracer::cellNoise3D(Vec3f const* p) { return host::cellNoise3D(*p); }
+
+} // namespace zsi::host

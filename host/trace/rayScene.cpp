@@ -1,0 +1,243 @@
+#include "trace/rayScene.h"
+
+#include "base/error.h"
+
+#include <bit>
+#include <cmath>
+#include <cstring>
+#include <embree3/rtcore.h>
+
+namespace zsi::host {
+namespace {
+
+using DeviceHandle = std::unique_ptr<RTCDeviceTy, decltype(&rtcReleaseDevice)>;
+using SceneHandle = std::unique_ptr<RTCSceneTy, decltype(&rtcReleaseScene)>;
+
+struct PreparedInstance {
+    Mesh const* mesh;
+    Mat4f toWorld;
+    Mat3f normalToWorld; ///< for `transformDirection`; the inverse transposed
+};
+
+/// Inverse transposed of the 3x3 part, up to a positive factor: its cofactors, with the sign of
+/// the determinant so that mirrored instances keep their outside. False when it has no inverse.
+bool normalMatrix(Mat4f const& a, Mat3f& result)
+{
+    Vec3f const r0{a.m[0], a.m[1], a.m[2]}, r1{a.m[4], a.m[5], a.m[6]}, r2{a.m[8], a.m[9], a.m[10]};
+    Vec3f c0 = cross(r1, r2), c1 = cross(r2, r0), c2 = cross(r0, r1);
+    float const determinant = dot(r0, c0);
+    if (!std::isfinite(determinant) || determinant == 0.0f)
+        return false;
+    float const s = determinant < 0.0f ? -1.0f : 1.0f;
+    c0 = c0 * s, c1 = c1 * s, c2 = c2 * s;
+    result = {c0.x, c0.y, c0.z, c1.x, c1.y, c1.z, c2.x, c2.y, c2.z};
+    return true;
+}
+
+RTCRayHit embreeRay(Ray const& ray)
+{
+    RTCRayHit r;
+    r.ray.org_x = ray.origin.x;
+    r.ray.org_y = ray.origin.y;
+    r.ray.org_z = ray.origin.z;
+    r.ray.dir_x = ray.direction.x;
+    r.ray.dir_y = ray.direction.y;
+    r.ray.dir_z = ray.direction.z;
+    r.ray.tnear = 0.0f;
+    r.ray.tfar = ray.tMax;
+    r.ray.time = 0.0f;
+    r.ray.mask = ~0u;
+    r.ray.id = 0;
+    r.ray.flags = 0;
+    r.hit.geomID = RTC_INVALID_GEOMETRY_ID;
+    r.hit.instID[0] = RTC_INVALID_GEOMETRY_ID;
+    return r;
+}
+
+SceneHandle newScene(RTCDevice device)
+{
+    SceneHandle scene(rtcNewScene(device), rtcReleaseScene);
+    // Watertight at shared edges; the quality build is repaid by every ray.
+    rtcSetSceneFlags(scene.get(), RTC_SCENE_FLAG_ROBUST);
+    rtcSetSceneBuildQuality(scene.get(), RTC_BUILD_QUALITY_HIGH);
+    return scene;
+}
+
+SceneHandle buildMesh(RTCDevice device, Mesh const& mesh)
+{
+    SceneHandle scene = newScene(device);
+    if (!mesh.triangles.empty()) {
+        RTCGeometry const geometry = rtcNewGeometry(device, RTC_GEOMETRY_TYPE_TRIANGLE);
+        // Embree owns and pads its copies, so that the mesh may lie in memory as it likes.
+        std::size_t const vertices = mesh.positions.size() * sizeof(Vec3f);
+        std::memcpy(rtcSetNewGeometryBuffer(geometry, RTC_BUFFER_TYPE_VERTEX, 0, RTC_FORMAT_FLOAT3,
+                                            sizeof(Vec3f), mesh.positions.size()),
+                    mesh.positions.data(), vertices);
+        std::size_t const indices = mesh.triangles.size() * sizeof(mesh.triangles[0]);
+        std::memcpy(rtcSetNewGeometryBuffer(geometry, RTC_BUFFER_TYPE_INDEX, 0, RTC_FORMAT_UINT3,
+                                            sizeof(mesh.triangles[0]), mesh.triangles.size()),
+                    mesh.triangles.data(), indices);
+        rtcCommitGeometry(geometry);
+        rtcAttachGeometry(scene.get(), geometry);
+        rtcReleaseGeometry(geometry);
+    }
+    rtcCommitScene(scene.get());
+    return scene;
+}
+
+template <class Value>
+Value interpolate(std::vector<Value> const& values, std::array<std::uint32_t, 3> const& corner,
+                  float u, float v)
+{
+    return values[corner[0]] * (1.0f - u - v) + values[corner[1]] * u + values[corner[2]] * v;
+}
+
+} // namespace
+
+struct RayScene::Impl {
+    DeviceHandle device;
+    std::vector<SceneHandle> meshes;
+    SceneHandle all, opaque, clear;
+    std::vector<PreparedInstance> instances;
+
+    Impl()
+        // One thread builds: the structure, and with it the order of equal hits, is repeatable.
+        : device(rtcNewDevice("threads=1"), rtcReleaseDevice)
+        , all(nullptr, rtcReleaseScene)
+        , opaque(nullptr, rtcReleaseScene)
+        , clear(nullptr, rtcReleaseScene)
+    {
+        if (!device)
+            throw InputError("the ray tracing device cannot be created");
+        all = newScene(device.get());
+        opaque = newScene(device.get());
+        clear = newScene(device.get());
+    }
+
+    RTCScene visible(Visibility v) const
+    {
+        return (v == Visibility::All ? all : v == Visibility::Clear ? clear : opaque).get();
+    }
+
+    void attach(Instance const& instance, std::uint32_t index, bool isClear)
+    {
+        RTCGeometry const geometry = rtcNewGeometry(device.get(), RTC_GEOMETRY_TYPE_INSTANCE);
+        rtcSetGeometryInstancedScene(geometry,
+                                     meshes[static_cast<std::size_t>(instance.mesh)].get());
+        rtcSetGeometryTransform(geometry, 0, RTC_FORMAT_FLOAT4X4_COLUMN_MAJOR,
+                                instance.objectToWorld.m);
+        rtcCommitGeometry(geometry);
+        rtcAttachGeometryByID(all.get(), geometry, index);
+        rtcAttachGeometryByID(isClear ? clear.get() : opaque.get(), geometry, index);
+        rtcReleaseGeometry(geometry);
+    }
+};
+
+RayScene::RayScene(Scene const& scene)
+    : impl_(std::make_unique<Impl>())
+{
+    for (Mesh const& mesh : scene.meshes)
+        impl_->meshes.push_back(buildMesh(impl_->device.get(), mesh));
+    for (std::size_t i = 0; i < scene.instances.size(); ++i) {
+        Instance const& instance = scene.instances[i];
+        PreparedInstance prepared{&scene.meshes[static_cast<std::size_t>(instance.mesh)],
+                                  instance.objectToWorld, Mat3f::identity()};
+        // A flattened instance has no inside and no inverse; rays do not meet it.
+        if (normalMatrix(instance.objectToWorld, prepared.normalToWorld)) {
+            Shader const& material = scene.materials[static_cast<std::size_t>(instance.material)];
+            impl_->attach(instance, static_cast<std::uint32_t>(i),
+                          (material.entryPoints() & kTransmission) != 0);
+        }
+        impl_->instances.push_back(prepared);
+    }
+    rtcCommitScene(impl_->all.get());
+    rtcCommitScene(impl_->opaque.get());
+    rtcCommitScene(impl_->clear.get());
+}
+
+RayScene::~RayScene() = default;
+
+bool RayScene::intersect(Ray const& ray, Visibility visible, Hit& hit) const
+{
+    RTCRayHit r = embreeRay(ray);
+    RTCIntersectContext context;
+    rtcInitIntersectContext(&context);
+    context.flags = RTC_INTERSECT_CONTEXT_FLAG_INCOHERENT;
+    rtcIntersect1(impl_->visible(visible), &context, &r);
+    if (r.hit.geomID == RTC_INVALID_GEOMETRY_ID)
+        return false;
+    hit = {r.ray.tfar, r.hit.instID[0], r.hit.primID, r.hit.u, r.hit.v};
+    return true;
+}
+
+bool RayScene::occluded(Ray const& ray, Visibility visible) const
+{
+    RTCRayHit r = embreeRay(ray);
+    RTCIntersectContext context;
+    rtcInitIntersectContext(&context);
+    context.flags = RTC_INTERSECT_CONTEXT_FLAG_INCOHERENT;
+    rtcOccluded1(impl_->visible(visible), &context, &r.ray);
+    return r.ray.tfar < 0.0f;
+}
+
+SurfacePoint RayScene::surface(Hit const& hit) const
+{
+    PreparedInstance const& instance = impl_->instances[hit.instance];
+    Mesh const& mesh = *instance.mesh;
+    auto const& corner = mesh.triangles[hit.triangle];
+
+    SurfacePoint s;
+    s.instance = hit.instance;
+    s.triangle = hit.triangle;
+    s.u = hit.u;
+    s.v = hit.v;
+    Vec3f position[3];
+    for (int i = 0; i < 3; ++i)
+        position[i] = transformPoint(instance.toWorld, mesh.positions[corner[i]]);
+    float const w = 1.0f - hit.u - hit.v;
+    // From the corners, not along the ray: the error does not grow with the ray's length.
+    s.P = position[0] * w + position[1] * hit.u + position[2] * hit.v;
+    s.objectP = interpolate(mesh.positions, corner, hit.u, hit.v);
+    s.Ng = normalize(cross(position[1] - position[0], position[2] - position[0]));
+    s.smoothP = s.P;
+
+    if (mesh.normals.empty()) {
+        Vec3f const* p = mesh.positions.data();
+        s.N = s.Ng;
+        s.objectN = normalize(cross(p[corner[1]] - p[corner[0]], p[corner[2]] - p[corner[0]]));
+        return s;
+    }
+    Vec3f normal[3];
+    for (int i = 0; i < 3; ++i)
+        normal[i] = normalize(transformDirection(instance.normalToWorld, mesh.normals[corner[i]]));
+    if (dot(s.Ng, normal[0] + normal[1] + normal[2]) < 0.0f)
+        s.Ng = -s.Ng;
+    s.N = normalize(normal[0] * w + normal[1] * hit.u + normal[2] * hit.v);
+    if (!(dot(s.N, s.N) > 0.5f)) // opposite normals cancel out
+        s.N = s.Ng;
+    s.objectN = normalize(interpolate(mesh.normals, corner, hit.u, hit.v));
+
+    // The mean of the projections of P onto the corners' tangent planes, as far as P lies below
+    // them.
+    float const weight[3] = {w, hit.u, hit.v};
+    Vec3f rise{0, 0, 0};
+    for (int i = 0; i < 3; ++i)
+        rise += normal[i] * (-minOf(0.0f, dot(s.P - position[i], normal[i])) * weight[i]);
+    s.smoothP = s.P + rise;
+    return s;
+}
+
+Vec3f offsetPoint(Vec3f P, Vec3f n)
+{
+    // Near the origin a fixed step, elsewhere a step of 256 units in the last place.
+    constexpr float kNear = 1.0f / 32.0f, kStep = 1.0f / 65536.0f, kUnits = 256.0f;
+    auto const move = [](float p, float d) {
+        if (std::fabs(p) < kNear)
+            return p + kStep * d;
+        auto const units = static_cast<std::int32_t>(kUnits * d);
+        return std::bit_cast<float>(std::bit_cast<std::int32_t>(p) + (p < 0.0f ? -units : units));
+    };
+    return {move(P.x, n.x), move(P.y, n.y), move(P.z, n.z)};
+}
+
+} // namespace zsi::host
