@@ -20,8 +20,8 @@ public:
 private:
     float offset(float u) const;
 
-    static constexpr int kSteps = 256;
-    std::array<float, kSteps + 1> inverse_; ///< offset at every 1/kSteps of the distribution
+    static constexpr int kSteps = 2048;
+    std::array<float, kSteps + 1> inverse_; ///< offset at every 1 / kSteps of the distribution
 };
 
 } // namespace zsi::host

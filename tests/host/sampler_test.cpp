@@ -1,0 +1,117 @@
+#include "film/pixelFilter.h"
+#include "integrate/sampler.h"
+
+#include <cmath>
+#include <functional>
+#include <gtest/gtest.h>
+#include <set>
+#include <vector>
+
+using namespace zsi;
+using host::Sampler;
+
+namespace {
+
+// Of 2^k points of a pair of dimensions, each box of any shape of area 2^-k holds exactly one.
+TEST(Sampler, PairsAreNets)
+{
+    int const k = 8, n = 1 << k;
+    Sampler sampler(3, 17, 5);
+    for (int dimension = 0; dimension < 5; ++dimension) {
+        std::vector<Vec2f> points;
+        for (int i = 0; i < n; ++i) {
+            sampler.start(static_cast<std::uint32_t>(i));
+            for (int d = 0; d < dimension; ++d)
+                sampler.next2D();
+            points.push_back(sampler.next2D());
+        }
+        for (int split = 0; split <= k; ++split) {
+            std::set<std::pair<int, int>> boxes;
+            for (Vec2f const p : points)
+                boxes.emplace(static_cast<int>(p.x * static_cast<float>(1 << split)),
+                              static_cast<int>(p.y * static_cast<float>(1 << (k - split))));
+            EXPECT_EQ(boxes.size(), static_cast<std::size_t>(n)) << dimension << ' ' << split;
+        }
+    }
+}
+
+// A query of several points per sample is stratified over all samples together.
+TEST(Sampler, PointsOfAQueryAreStratifiedOverSamples)
+{
+    int const samples = 64, count = 4, n = samples * count;
+    Sampler sampler(1, 0, 0);
+    std::set<int> strata;
+    std::set<float> lines;
+    for (int s = 0; s < samples; ++s) {
+        sampler.start(static_cast<std::uint32_t>(s));
+        lines.insert(std::floor(sampler.next() * static_cast<float>(samples)));
+        Sampler::Points const points = sampler.next2D(count);
+        for (int i = 0; i < count; ++i)
+            strata.insert(static_cast<int>(points[i].x * static_cast<float>(n)));
+    }
+    EXPECT_EQ(strata.size(), static_cast<std::size_t>(n));
+    EXPECT_EQ(lines.size(), static_cast<std::size_t>(samples));
+}
+
+// Dimensions, pixels and seeds are unrelated: products of centred numbers average to 0.
+TEST(Sampler, DimensionsPixelsAndSeedsAreUnrelated)
+{
+    struct Case {
+        char const* why;
+        std::function<double(int)> product;
+    };
+    auto const draw = [](std::uint32_t seed, int x, int y, std::uint32_t index, int skip) {
+        Sampler sampler(seed, x, y);
+        sampler.start(index);
+        for (int i = 0; i < skip; ++i)
+            sampler.next();
+        return static_cast<double>(sampler.next()) - 0.5;
+    };
+    Case const cases[] = {
+        {"dimensions", [&](int i) { return draw(1, i, 0, 0, 0) * draw(1, i, 0, 0, 1); }},
+        {"neighbours", [&](int i) { return draw(1, i, 7, 0, 0) * draw(1, i + 1, 7, 0, 0); }},
+        {"transposed", [&](int i) { return draw(1, i, 9999, 0, 2) * draw(1, 9999, i, 0, 2); }},
+        {"seeds", [&](int i) { return draw(1, i, 3, 5, 0) * draw(2, i, 3, 5, 0); }},
+    };
+    int const n = 4000;
+    for (Case const& c : cases) {
+        double sum = 0;
+        for (int i = 0; i < n; ++i)
+            sum += c.product(i);
+        EXPECT_LT(std::fabs(sum / n), 4.0 / 12 / std::sqrt(n)) << c.why; // variance of each: 1/12
+    }
+}
+
+// The sampled offsets have the filter's moments: mean 0 and, for the window by quadrature,
+// variance.
+TEST(PixelFilter, SamplesFollowTheWindow)
+{
+    auto const window = [](double x) { // x in [-1, 1]
+        double const t = 3.14159265358979 * (x + 1);
+        return 0.35875 - 0.48829 * std::cos(t) + 0.14128 * std::cos(2 * t)
+            - 0.01168 * std::cos(3 * t);
+    };
+    double area = 0, second = 0;
+    for (int i = 0; i < 20000; ++i) {
+        double const x = (i + 0.5) / 10000 - 1;
+        area += window(x), second += window(x) * x * x;
+    }
+    double const want = second / area * 1.5 * 1.5;
+
+    host::PixelFilter const filter;
+    double mean = 0, variance = 0;
+    int const n = 4096;
+    for (int i = 0; i < n; ++i) {
+        float const u = (static_cast<float>(i) + 0.5f) / static_cast<float>(n);
+        Vec2f const o = filter.offset({u, 1.0f - u});
+        EXPECT_NEAR(o.x, -o.y, 2e-3f); // symmetric
+        mean += static_cast<double>(o.x) / n;
+        variance += static_cast<double>(o.x) * static_cast<double>(o.x) / n;
+    }
+    EXPECT_NEAR(mean, 0, 1e-4);
+    EXPECT_NEAR(variance, want, 0.005 * want);
+    for (float const u : {0.0f, 0.99999994f})
+        EXPECT_LE(std::fabs(filter.offset({u, u}).x), 1.5f);
+}
+
+} // namespace
