@@ -1,0 +1,354 @@
+#include "materials/physical/corvid_Mtl_Dielectric.h"
+#include "support/reference.h"
+#include "support/scriptedHost.h"
+
+#include <gtest/gtest.h>
+
+namespace zsi {
+namespace {
+
+using test::D3;
+using test::minus;
+using test::plus;
+using test::times;
+
+using Span = std::pair<std::size_t, std::size_t>;
+
+corvid_Mtl_Dielectric randomGlass(test::Random& random)
+{
+    corvid_Mtl_Dielectric glass;
+    glass.maskingMode = -1;
+    glass.u_ior = random.in(1.3f, 1.9f);
+    glass.u_reflectance = random.in(0, 0.5f);
+    glass.u_roughValue = random.in(0.05f, 0.8f);
+    glass.u_reflectColor = random.color();
+    glass.u_refractColor = random.color();
+    glass.u_absorptionCoef = random.color();
+    return glass;
+}
+
+struct Indices {
+    double outer, inner;
+};
+Indices indicesOf(corvid_Mtl_Dielectric const& glass, ShadeState const& s, bool front)
+{
+    return front ? Indices{double(s.incomingIor), double(glass.u_ior)}
+                 : Indices{double(glass.u_ior), double(s.beyondIor)};
+}
+
+/// Walter et al. 2007, eq. 21, with V in the outer medium.
+double transmittedOf(double a2, D3 v, D3 l, Indices n)
+{
+    D3 const h = test::unitOf(times(plus(times(l, n.inner), times(v, n.outer)), -1));
+    double const i = inner(v, h), o = inner(l, h);
+    return smithG1(a2, v, h) * smithG1(a2, l, h) * test::ggxOf(a2, h.z) * n.inner * n.inner
+        * std::fabs(i * o) / (std::fabs(v.z * l.z) * std::pow(n.outer * i + n.inner * o, 2));
+}
+
+TEST(Dielectric, TransferIsTheFacetModelOnBothSides)
+{
+    test::Random random;
+    test::ScriptedHost host;
+    int transmitted = 0;
+    for (int i = 0; i < 8000; ++i) {
+        corvid_Mtl_Dielectric const glass = randomGlass(random);
+        bool const front = i % 2;
+        ShadeState s = test::randomHit(random, front);
+        test::DFrame const frame = test::frameOf(s, front ? 1 : -1);
+        D3 const v = frame.in(times(s.I, -1));
+        // Half of the directions about straight on, where transmission is.
+        s.sampleDirection = i % 4 < 2 ? random.unit() : normalize(s.I + random.unit() * 0.6f);
+        D3 const l = frame.in(s.sampleDirection);
+        if (std::fabs(l.z) < 1e-2)
+            continue;
+        glass.transfer(&host, s);
+        double const r = double(glass.u_roughValue),
+                     F = test::schlickOf(double(glass.u_reflectance), v.z);
+        double const through = transmittedOf(r * r, v, l, indicesOf(glass, s, front));
+        double const want =
+            F * reflectedOf(r * r, v, l, test::unitOf(plus(v, l))) + (1 - F) * through;
+        // 1e-7 of rounding in h, over the width of the lobe (0.05 at least) and the length of the
+        // unnormalised half-vector (0.1 at least for these indices).
+        EXPECT_NEAR(double(s.outBrdf.x), want, 1e-3 * want + 1e-6) << front;
+        EXPECT_EQ(s.outBrdf, grey(s.outBrdf.x)) << "no tint";
+        EXPECT_NEAR(double(s.sampleCosine), std::fabs(l.z), 1e-4);
+        transmitted += through > 1e-3;
+    }
+    EXPECT_GT(transmitted, 300);
+}
+
+TEST(Dielectric, SamplesWhatTheStepsSay)
+{
+    test::Random random;
+    int seen[4] = {}; // polished, rough, ended by the facet, totally reflected
+    for (int i = 0; i < 12000; ++i) {
+        corvid_Mtl_Dielectric glass = randomGlass(random);
+        bool const front = i % 2, mayReflect = i % 3, mayTransmit = (i / 3) % 3;
+        if (i % 5 == 0)
+            glass.u_roughValue = i % 10 ? 0.01f : 0.0099f;
+        ShadeState s = test::randomHit(random, front);
+        if (i % 7 == 0)
+            s.incomingIor = 2.4f; // from the denser side, so that facets reflect totally too
+        s.allowReflection[i % 3 ? i % 2 : 2] = mayReflect;
+        s.allowTransmission[i % 3] = mayTransmit;
+        test::ScriptedHost host;
+        double const u[3] = {0.875 * double(random.in(0, 1)), double(random.in(0, 1)),
+                             double(random.in(0, 1))};
+        bool const rough = front && glass.u_roughValue >= 0.01f;
+        host.randoms = {float(u[0]), float(u[1]), float(u[2])};
+        if (!rough)
+            host.randoms = {float(u[2])};
+        ShadeState const before = s;
+        glass.sample(&host, s);
+
+        test::DFrame const frame = test::frameOf(s, front ? 1 : -1);
+        D3 const v = frame.in(times(s.I, -1));
+        double const r = double(glass.u_roughValue), a2 = r * r;
+        Indices const n = indicesOf(glass, before, front);
+        double const eta = n.outer / n.inner;
+        D3 m(0, 0, 1);
+        if (rough) {
+            double const t = std::sqrt(a2 * u[0] / (1 - u[0])), phi = 2 * std::numbers::pi * u[1];
+            m = times({t * std::cos(phi), t * std::sin(phi), 1}, 1 / std::sqrt(1 + t * t));
+        }
+        double const c = inner(v, m), F = test::schlickOf(double(glass.u_reflectance), v.z);
+        bool refracts = mayReflect && mayTransmit ? F < u[2] : mayTransmit;
+        double weight = mayReflect && mayTransmit ? 1 : mayReflect ? F : 1 - F;
+        double const k = (c * c - 1) * eta * eta + 1;
+        if (std::fabs(c) < 1e-4 || std::fabs(k) < 1e-4 || std::fabs(F - u[2]) < 1e-5)
+            continue; // too near to a decision for single precision
+        bool const total = refracts && k < 0;
+        if ((!mayReflect && !mayTransmit) || c < 0 || (total && !mayReflect)) {
+            EXPECT_EQ(s.sampleType, 0u);
+            EXPECT_EQ(test::strayWrite(before, s, std::array{Span(396, 4)}), "");
+            ++seen[2];
+            continue;
+        }
+        if (total) {
+            refracts = false;
+            weight = 1;
+            ++seen[3];
+        }
+        D3 d = minus(times(m, 2 * c), v);
+        if (refracts)
+            d = test::unitOf(minus(times(m, eta * c - std::sqrt(k)), times(v, eta)));
+        if (std::fabs(d.z) < 1e-3)
+            continue;
+        if (rough) {
+            double const w = c * smithG1(a2, v, m) * smithG1(a2, d, m) / (v.z * m.z);
+            weight *= w < 0 ? 0 : w > 4 ? 4 : w;
+        }
+        ++seen[rough];
+        EXPECT_EQ(s.sampleType, rough ? 16u : 32u);
+        EXPECT_EQ(s.sampleCosine, 1);
+        EXPECT_EQ(s.sampleInvPdf, 1);
+        EXPECT_EQ(double(s.beyondIor), refracts ? n.inner : n.outer) << "the medium it goes on in";
+        // sqrt(k) with k of 1e-4 at least carries 1e-7 / 1e-2; tangents may be short.
+        EXPECT_LT(test::distance(s.sampleDirection, frame.out(d)), 2e-4);
+        EXPECT_NEAR(double(s.outBrdf.y), weight, 1e-3 * weight + 1e-5);
+        EXPECT_EQ(s.outBrdf, grey(s.outBrdf.y));
+        EXPECT_EQ(test::strayWrite(before, s, std::array{Span(116, 4), Span(364, 36)}), "");
+    }
+    for (int n : seen)
+        EXPECT_GT(n, 200);
+}
+
+/// The mean of sampled weights is the albedo that `transfer` integrates to, while no weight is so
+/// large that the bound of 4 cuts it (wide lobes seen at a grazing angle).
+TEST(Dielectric, SampleAndTransferAgreeOnTheAlbedo)
+{
+    test::Random random;
+    for (float tilt : {0.2f, 0.9f}) {
+        corvid_Mtl_Dielectric glass;
+        glass.u_roughValue = 0.4f;
+        glass.u_reflectance = 0.3f;
+        ShadeState s = test::plainHit();
+        s.I = {std::sin(tilt), 0, -std::cos(tilt)};
+        test::setAttribute(s, 36, Vec3f(1, 0, 0));
+        for (int part = 0; part < 2; ++part) { // reflected, transmitted
+            std::memset(s.allowReflection, 1, 3);
+            std::memset(s.allowTransmission, 1, 3);
+            double sum = 0, squares = 0, integral = 0;
+            constexpr int kDraws = 60000, kSteps = 400;
+            for (int i = 0; i < kDraws; ++i) {
+                test::ScriptedHost host;
+                host.randoms = {random.in(0, 1), random.in(0, 1), random.in(0, 1)};
+                glass.sample(&host, s);
+                s.beyondIor = 1;
+                bool const counts = s.sampleType && (s.sampleDirection.z < 0) == (part == 1);
+                double const w = counts ? double(s.outBrdf.x) : 0;
+                sum += w;
+                squares += w * w;
+            }
+            test::ScriptedHost host;
+            for (int a = 0; a < kSteps; ++a)
+                for (int b = 0; b < kSteps; ++b) { // midpoints, uniform in z and azimuth
+                    float const z = (float(a) + 0.5f) / kSteps * (part ? -1.0f : 1.0f);
+                    float const phi = 6.2831853f * (float(b) + 0.5f) / kSteps;
+                    float const e = std::sqrt(1 - z * z);
+                    s.sampleDirection = {e * std::cos(phi), e * std::sin(phi), z};
+                    glass.transfer(&host, s);
+                    integral += double(s.outBrdf.x * s.sampleCosine);
+                }
+            integral *= 2 * std::numbers::pi / (kSteps * kSteps);
+            double const mean = sum / kDraws;
+            double const error = std::sqrt((squares / kDraws - mean * mean) / kDraws);
+            // Midpoints of a smooth lobe 0.4 wide are good to 1e-3.
+            EXPECT_NEAR(mean, integral, 4 * error + 2e-3) << tilt << " " << part;
+        }
+    }
+}
+
+TEST(Dielectric, ShadesLightsReflectionAndAbsorbedRefraction)
+{
+    test::Random random;
+    int totals = 0;
+    for (int i = 0; i < 4000; ++i) {
+        corvid_Mtl_Dielectric glass = randomGlass(random);
+        bool const front = i % 2, mapped = i % 5 == 0;
+        glass.u_falloffEnable = i % 3;
+        if (i % 13 == 0)
+            glass.u_refractColor = {0, 0, 0};
+        Vec3f const texel = {random.in(0.2f, 1), random.in(0.2f, 1), random.in(0.2f, 1)};
+        test::FunctionTexture<Vec2f> map([&](Vec2f) { return withAlpha(texel, 1); });
+        glass.u_transmittanceMapEnable = mapped;
+        glass.u_transmittanceMap.texture = &map;
+        glass.u_transmittanceAmount = 0.5f;
+        ShadeState s = test::randomHit(random, front);
+        test::ScriptedHost host;
+        Vec3f const color = random.color(), L = random.unit();
+        host.addLight(L, color, {0.5f, 1, 1}, 0.75f);
+        host.onTrace = [](Vec3f, Vec3f) { return Vec3f(0.5f, 0.25f, 1); };
+        glass.shade(&host, s);
+
+        // The frame keeps the normal as it is: from inside, F is 1 for the lights and then 0.
+        test::DFrame const frame = test::frameOf(s, 1);
+        D3 const v = frame.in(times(s.I, -1)), l = frame.in(L);
+        double const r = double(glass.u_roughValue);
+        double F = test::schlickOf(double(glass.u_reflectance), v.z);
+        Indices const n = indicesOf(glass, s, front);
+        D3 h = test::unitOf(plus(v, l));
+        if (h.z < 0)
+            h = times(h, -1);
+        double const value = F * reflectedOf(r, v, l, h) + (1 - F) * transmittedOf(r, v, l, n);
+        double want = value * 0.75 * test::fadeOf(test::dotOf(L, s.Ng)) * double(color.x * 0.5f);
+        ASSERT_EQ(host.calls[0].service, "getLightSamples");
+        EXPECT_EQ(host.calls[0].vectors[1], s.N);
+        F = front ? F : 0;
+        std::size_t next = 1;
+        if (front) {
+            test::Call const& ray = host.calls[next++];
+            ASSERT_EQ(ray.service, "traceSpecular");
+            EXPECT_EQ(ray.scalars[0], glass.u_roughValue);
+            EXPECT_NEAR(double(ray.scalars[1]), F * double(maxComponent(glass.u_reflectColor)),
+                        1e-6);
+            EXPECT_GT(test::dotOf(ray.vectors[1], s.Ng), 0.0499);
+            want += F * double(glass.u_reflectColor.x) * 0.5;
+        }
+        ASSERT_EQ(host.calls.size(), next + !(glass.u_refractColor == Vec3f(0, 0, 0)));
+        if (host.calls.size() > next) {
+            test::Call const& ray = host.calls[next];
+            ASSERT_EQ(ray.service, "traceRefraction");
+            EXPECT_EQ(ray.scalars[0], glass.u_roughValue);
+            double const weight = (1 - F) * double(glass.u_refractColor.x);
+            // Snell's law: what lies along the surface scales by the ratio of the indices.
+            D3 const I(s.I), N = times(s.N, front ? 1 : -1), got = ray.vectors[1];
+            D3 const across = minus(I, times(N, inner(I, N)));
+            double const sine2 = inner(across, across) * std::pow(n.outer / n.inner, 2);
+            if (sine2 > 1 + 1e-5) {
+                EXPECT_GT(inner(got, times(s.Ng, front ? 1 : -1)), 0.0499) << "back to I's side";
+                ++totals;
+            } else if (sine2 < 1 - 1e-5) {
+                D3 const snell =
+                    minus(times(across, n.outer / n.inner), times(N, std::sqrt(1 - sine2)));
+                EXPECT_LT(test::distance(got, snell), 1e-4);
+            }
+            double sigma = double(glass.u_absorptionCoef.x);
+            if (mapped)
+                sigma = -std::log(0.5 * double(texel.x)) / sigma;
+            bool const absorbs = !front && glass.u_falloffEnable;
+            EXPECT_EQ(map.lookups.size(), absorbs && mapped) << "looked up where it counts only";
+            want += weight * 0.5 * (absorbs ? std::pow(10, -sigma * test::distance(s.P, s.E)) : 1);
+        }
+        EXPECT_NEAR(double(s.Ci.x), want, 2e-4 * want + 1e-6);
+    }
+    EXPECT_GT(totals, 100);
+}
+
+TEST(Dielectric, ShadowRaysAreAbsorbedInsideWhateverTheSwitchSays)
+{
+    test::Random random;
+    test::ScriptedHost host;
+    for (int i = 0; i < 500; ++i) {
+        corvid_Mtl_Dielectric glass = randomGlass(random);
+        glass.u_transmittanceMapEnable = true; // not for shadow rays
+        ShadeState s = test::randomHit(random, i % 2);
+        glass.transmission(&host, s);
+        bool const leaving = i % 2 == 0;
+        double const F =
+            test::schlickOf(double(glass.u_reflectance), std::fabs(test::dotOf(s.N, s.I)));
+        double want = double(glass.u_refractColor.y) * (1 - F);
+        if (leaving)
+            want *= std::pow(10, -double(glass.u_absorptionCoef.y) * test::distance(s.P, s.E));
+        EXPECT_NEAR(double(s.transmissionColor.y), want, 1e-5);
+    }
+}
+
+TEST(Dielectric, BendsItsFrameByTheFirstMapOrTheRippleThenTheSecondMap)
+{
+    struct Case {
+        char const* why;
+        bool first, second;
+        int ripple;
+        std::size_t firstLookups, secondLookups;
+        int noise;
+    };
+    constexpr Case kCases[] = {
+        {"nothing", false, false, 0, 0, 0, 0},
+        {"other ripple modes", false, false, 2, 0, 0, 0},
+        {"ripple", false, false, 1, 0, 0, 6},
+        {"the first map stops the ripple", true, false, 1, 3, 0, 0},
+        {"the second does not", false, true, 1, 0, 3, 6},
+        {"both maps", true, true, 1, 3, 3, 0},
+    };
+    for (Case const& c : kCases) {
+        SCOPED_TRACE(c.why);
+        auto const slope = [](Vec2f p) { return Vec4f(40 * p.x, 0, 0, 1); };
+        test::FunctionTexture<Vec2f> first(slope), second(slope);
+        test::ScriptedHost host;
+        host.onNoise = [](Vec4f p) { return 0.2f * p.y; };
+        corvid_Mtl_Dielectric glass;
+        glass.u_normal0MapEnable = c.first;
+        glass.u_normal1MapEnable = c.second;
+        glass.u_procedureMapEnable = c.ripple;
+        glass.u_normal0Map.texture = &first;
+        glass.u_normal1Map.texture = &second;
+        glass.u_normal0Transform = glass.u_normal1Transform = Mat3f::identity();
+        glass.u_normal0UVScale = 0.5f;
+        glass.u_normal0Amount = glass.u_normal1Amount = 2;
+        glass.u_procedureMapAmount = 0.25f;
+        ShadeState s = test::plainHit();
+        test::setAttribute(s, 36, Vec3f(1, 0, 0));
+        test::setAttribute(s, 48, Vec2f(0.5f, 0.25f));
+        glass.shade(&host, s);
+        EXPECT_EQ(first.lookups.size(), c.firstLookups);
+        EXPECT_EQ(second.lookups.size(), c.secondLookups);
+        EXPECT_EQ(host.noiseCalls, c.noise);
+        EXPECT_TRUE(!c.first || first.lookups[0].x == 0.25f) << "its own scale";
+        EXPECT_TRUE(!c.second || second.lookups[0].x == 0.5f) << "always scale 1";
+        // Downhill is -x for the maps (0.04 x 2 x 3.33), -y for the ripple, which stays
+        // unnormalised.
+        double const ripple = c.noise ? -0.2 * 2 * 1.5 * 0.25 : 0;
+        D3 N(0, ripple, 1);
+        if (c.first)
+            N = test::unitOf({-0.04 * 2 * 3.33, 0, 1});
+        if (c.second) {
+            D3 const T = test::unitOf(minus({1, 0, 0}, times(N, N.x)));
+            N = test::unitOf(plus(N, times(T, -0.04 * 2 * 3.33)));
+        }
+        EXPECT_LT(test::distance(host.calls[0].vectors[1], N), 1e-4);
+    }
+}
+
+} // namespace
+} // namespace zsi

@@ -1,0 +1,124 @@
+/// Formulas of the physical materials in double precision, in the form that their models state.
+#pragma once
+
+#include "support/record.h"
+
+#include <cmath>
+#include <numbers>
+
+namespace zsi::test {
+
+struct D3 {
+    double x, y, z;
+
+    constexpr D3(double x_, double y_, double z_)
+        : x(x_)
+        , y(y_)
+        , z(z_)
+    {
+    }
+    constexpr D3(Vec3f v)
+        : x(double(v.x))
+        , y(double(v.y))
+        , z(double(v.z))
+    {
+    }
+};
+constexpr D3 plus(D3 a, D3 b) { return {a.x + b.x, a.y + b.y, a.z + b.z}; }
+constexpr D3 times(D3 a, double k) { return {a.x * k, a.y * k, a.z * k}; }
+constexpr D3 minus(D3 a, D3 b) { return plus(a, times(b, -1)); }
+constexpr double inner(D3 a, D3 b) { return a.x * b.x + a.y * b.y + a.z * b.z; }
+constexpr D3 outer(D3 a, D3 b)
+{
+    return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
+}
+inline D3 unitOf(D3 a)
+{
+    double const l = std::sqrt(inner(a, a));
+    return l > 0 ? times(a, 1 / l) : a;
+}
+inline double distance(D3 a, D3 b) { return std::sqrt(inner(minus(a, b), minus(a, b))); }
+inline double clampUnit(double t) { return t < 0 ? 0 : t > 1 ? 1 : t; }
+
+/// Tangent frame of a normal; the tangent goes through the 3x3 part as a row vector.
+struct DFrame {
+    D3 t, b, n;
+
+    DFrame(Vec3f tangent, D3 normal, Mat4f const& toWorld)
+        : t(0, 0, 0)
+        , b(0, 0, 0)
+        , n(normal)
+    {
+        D3 w(0, 0, 0);
+        float const in[3] = {tangent.x, tangent.y, tangent.z};
+        for (int row = 0; row < 3; ++row)
+            w = plus(
+                w,
+                times(D3(Vec3f(toWorld.m[4 * row], toWorld.m[4 * row + 1], toWorld.m[4 * row + 2])),
+                      double(in[row])));
+        t = unitOf(minus(w, times(n, inner(w, n))));
+        b = unitOf(outer(n, t));
+    }
+    D3 in(D3 d) const { return {inner(t, d), inner(b, d), inner(n, d)}; }
+    D3 out(D3 d) const { return plus(plus(times(t, d.x), times(b, d.y)), times(n, d.z)); }
+};
+
+inline double schlickOf(double r0, double c)
+{
+    return clampUnit(r0 + std::pow(1 - clampUnit(c), 5) * (1 - r0));
+}
+inline double tan2Of(double c) { return (1 - c * c) / (c * c); }
+inline double smithG1(double a2, D3 w, D3 h)
+{
+    return inner(w, h) * w.z > 0 ? 2 / (1 + std::sqrt(1 + a2 * tan2Of(w.z))) : 0;
+}
+inline double ggxOf(double a2, double c)
+{
+    double const k = tan2Of(c) + a2;
+    return c > 0 ? a2 / (std::pow(c, 4) * std::numbers::pi * k * k) : 0;
+}
+/// Fade of lights over the horizon: nothing up to 0.05, all from 0.25 on.
+inline double fadeOf(double cosine)
+{
+    double const x = clampUnit((cosine - 0.05) / 0.2);
+    return x * x * (3 - 2 * x);
+}
+inline double reflectedOf(double a2, D3 v, D3 l, D3 h)
+{
+    return smithG1(a2, v, h) * smithG1(a2, l, h) * ggxOf(a2, h.z) / (4 * std::fabs(v.z * l.z));
+}
+
+/// A hit with everything at random: P and E, normals that lean apart a little, tangent and uv at
+/// the offsets of the physical materials, media, an object transform that turns and scales.
+inline ShadeState randomHit(Random& random, bool front)
+{
+    ShadeState s = plainHit();
+    s.P = {random.in(-2, 2), random.in(-2, 2), random.in(-2, 2)};
+    s.E = {random.in(-2, 2), random.in(-2, 2), random.in(-2, 2)};
+    do {
+        s.I = random.unit();
+        s.Ng = random.unit();
+        s.N = normalize(s.Ng + random.unit() * 0.3f);
+    } while ((dot(s.I, s.Ng) < 0) != front || std::fabs(dot(s.I, s.Ng)) < 0.05f
+             || dot(s.I, s.N) * dot(s.I, s.Ng) < 0.01f);
+    s.incomingIor = random.in(1, 1.2f);
+    s.beyondIor = random.in(1, 2.2f);
+    for (float& m : s.objectToWorld.m)
+        m = random.in(-2, 2);
+    setAttribute(s, 36, random.unit());
+    setAttribute(s, 48, Vec2f(random.in(0, 1), random.in(0, 1)));
+    return s;
+}
+inline Vec3f tangentOf(ShadeState const& s)
+{
+    Vec3f t;
+    std::memcpy(&t, s.attributes + 36, sizeof t);
+    return t;
+}
+/// The shading frame of a hit whose normal, times `side`, nothing bends.
+inline DFrame frameOf(ShadeState const& s, double side)
+{
+    return {tangentOf(s), times(D3(s.N), side), s.objectToWorld};
+}
+
+} // namespace zsi::test
