@@ -8,6 +8,7 @@
 #include "lights/voSpotLight.h"
 #include "materials/physical/corvid_Mtl_Dielectric.h"
 #include "materials/physical/corvid_Mtl_Glazing.h"
+#include "materials/physical/corvid_Mtl_Metal.h"
 #include "materials/utility/corvid_Mtl_AmbientOnly.h"
 #include "materials/utility/corvid_Mtl_Mirror.h"
 #include "materials/utility/corvid_Mtl_NormalsOnly.h"
@@ -48,4 +49,5 @@
     X(corvid_Mtl_Ward_f05db29e) \
     X(corvid_Mtl_Mirror)        \
     X(corvid_Mtl_Dielectric)    \
-    X(corvid_Mtl_Glazing)
+    X(corvid_Mtl_Glazing)       \
+    X(corvid_Mtl_Metal)

@@ -28,6 +28,20 @@ inline void reorthogonalize(SLArray<Vec3f>& frame) { frame = orthonormalFrame(fr
     return orthonormalFrame(transformDirection(toWorld, tangent), N);
 }
 
+/// Gives a frame of a unit normal whose tangent vanished (a mesh without one) any tangent: Duff et
+/// al. 2017, "Building an Orthonormal Basis, Revisited". Other frames stay as they are.
+inline void orthonormalTangent(SLArray<Vec3f>& frame)
+{
+    if (dot(frame[0], frame[0]) > 0.0f) [[likely]]
+        return;
+    Vec3f const N = frame[2];
+    float const s = std::copysign(1.0f, N.z);
+    float const a = -1.0f / (s + N.z);
+    float const b = N.x * N.y * a;
+    frame[0] = {1.0f + s * N.x * N.x * a, s * b, -s * N.x};
+    frame[1] = {b, s + N.y * N.y * a, -N.y};
+}
+
 /// World direction in local coordinates.
 inline Vec3f toLocal(SLArray<Vec3f> const& frame, Vec3f const& d)
 {

@@ -1,0 +1,213 @@
+#include "materials/physical/corvid_Mtl_Metal.h"
+
+#include "materials/physical/gradientRamp.h"
+#include "materials/physical/lightFade.h"
+#include "materials/physical/metalLobe.h"
+#include "materials/physical/shadingFrame.h"
+#include "materials/physical/textureChannel.h"
+#include "materials/utility/straightThrough.h"
+#include "runtime/builtins.h"
+
+namespace zsi {
+namespace {
+
+constexpr Vec3f kBlack(0.0f, 0.0f, 0.0f);
+
+/// Narrowest lobe: a highlight of a twentieth of a degree, which still has a finite density, so
+/// polished metal needs no case of its own.
+constexpr float kLeastWidth = 0.001f;
+
+float greyOf(Vec4f c) { return (c.x + c.y + c.z) * 0.3333333f; }
+
+} // namespace
+
+/// Pyramids: the slope of a box-shaped ramp over each unit of the scaled coordinate.
+void corvid_Mtl_Metal::bendByFacets(IShaderAPI* api, ShadeState const& state,
+                                    SLArray<Vec3f>& frame) const
+{
+    constexpr SLArray<RampKey> kRamp{{{0.0f, {0.0f, 0.0f, 0.0f, 0.0f}},
+                                      {0.5f, {0.5f, 0.5f, 0.5f, 0.5f}},
+                                      {1.0f, {1.0f, 1.0f, 1.0f, 1.0f}}}};
+    Vec2f const s = attribute_uv(state) * u_uvScale * 0.5f;
+    auto const height = [&](float x, float y) {
+        return greyOf(f_elm_rtpb_gradient_ramp_color(api, state, kRamp, {fract(x), fract(y)}));
+    };
+    float const h = height(s.x, s.y);
+    float const du = (height(s.x + kBumpStep, s.y) - h) / kBumpStep * 0.5f * u_patternAmount;
+    float const dv = (height(s.x, s.y + kBumpStep) - h) / kBumpStep * 0.5f * u_patternAmount;
+    frame[2] = frame[2] + du * frame[0] + dv * frame[1];
+    reorthogonalize(frame);
+}
+
+[[gnu::noinline]] void corvid_Mtl_Metal::bendFrame(IShaderAPI* api, ShadeState const& state,
+                                                   SLArray<Vec3f>& frame) const
+{
+    if (u_patternEnable) {
+        f_rtBumpPerturb(api, state, frame, attribute_uv(state), u_patternMap, u_patternTransform,
+                        u_patternAmount, 1.0f);
+        normalizeAndReorthogonalize(frame);
+    }
+    if (u_bumpSwitcher == 1)
+        bendByFacets(api, state, frame);
+}
+
+void corvid_Mtl_Metal::f_computeShadingFrameNative(IShaderAPI* api, ShadeState const& state,
+                                                          Vec3f const&, Vec3f const& N,
+                                                          Mat3f const& toWorld,
+                                                          SLArray<Vec3f>& frame) const
+{
+    frame = computeBaseFrame(attribute_tangent(state), N, toWorld);
+    if (u_patternEnable || u_bumpSwitcher == 1) [[unlikely]]
+        bendFrame(api, state, frame);
+}
+
+/// Orthonormal frame of the lobe, tangent along the brush marks.
+inline SLArray<Vec3f> corvid_Mtl_Metal::lobeFrame(IShaderAPI* api, ShadeState const& state,
+                                                  Vec3f const& Nf) const
+{
+    SLArray<Vec3f> frame;
+    f_computeShadingFrameNative(api, state, state.P, Nf, Mat3f(state.objectToWorld), frame);
+    if (u_bumpSwitcher == 1) [[unlikely]]
+        normalizeAndReorthogonalize(frame);
+    orthonormalTangent(frame);
+    f_anisoRotateFrame(api, state, frame, 0.0f);
+    return frame;
+}
+
+inline AnisotropicGgx corvid_Mtl_Metal::facets(ShadeState const& state) const
+{
+    float const r = u_roughMapEnable
+        ? mappedValue(u_roughMap, u_roughTransform, u_roughAmount, attribute_uv(state))
+        : u_roughValue;
+    float const k = u_anisotropyMapEnable ? mappedValue(u_anisotropyMap, u_anisotropyTransform,
+                                                        u_anisotropyAmount, attribute_uv(state))
+                                          : u_anisotropyValue;
+    // In this form NaN becomes the narrowest lobe.
+    float const ax = minOf(maxOf(r, kLeastWidth), 1.0f);
+    float const ay = minOf(maxOf(ax * k, kLeastWidth), 1.0f);
+    return {maxOf(ax, ay * FacetLoss::kLeastRatio), maxOf(ay, ax * FacetLoss::kLeastRatio)};
+}
+
+/// Share of the surface that the cut-out keeps, 0..1.
+inline float corvid_Mtl_Metal::kept(ShadeState const& state) const
+{
+    if (u_cutoutMapEnable) [[unlikely]]
+        return clamp01(
+            mappedValue(u_cutoutMap, u_cutoutTransform, u_cutoutAmount, attribute_uv(state)));
+    return 1.0f;
+}
+
+inline MetalLobe corvid_Mtl_Metal::lobe(ShadeState const& state, Vec3f const& v) const
+{
+    Vec3f const r0 = u_reflectMapEnable
+        ? mappedColor(u_reflectMap, u_reflectTransform, u_reflectAmount, attribute_uv(state))
+        : u_reflectColor;
+    Vec3f const edge = u_edgeMapEnable
+        ? mappedColor(u_edgeMap, u_edgeTransform, u_edgeAmount, attribute_uv(state))
+        : u_edgeColor;
+    return {facets(state), ConductorFresnel(clamp01(r0), clamp01(edge)), v};
+}
+
+void corvid_Mtl_Metal::f_calculateColors(IShaderAPI* api, ShadeState const& state,
+                                         PhysicalColors& out) const
+{
+    float const keep = kept(state);
+    if (keep != 1.0f) {
+        out.refraction = rgb(api->traceThrough(&state.P, &state.I, 1.0f - keep)) * (1.0f - keep);
+        out.transmissionWeight = grey(1.0f - keep);
+        if (keep == 0.0f)
+            return;
+    }
+    float const side = -facingSign(state.I, state.Ng);
+    Vec3f const Ngf = state.Ng * side;
+    SLArray<Vec3f> const frame = lobeFrame(api, state, state.N * side);
+    Vec3f const& N = frame[2];
+    Vec3f v = toLocal(frame, -state.I);
+    bool const seen = v.z > 0.0f;
+    if (!seen)
+        v.z = 0.0f; // a bump that faces away still mirrors, at grazing incidence
+    MetalLobe const metal = lobe(state, v);
+
+    if (seen)
+        for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
+             light = light->next) {
+            float const fade = lightFade(dot(light->L, Ngf));
+            Vec3f const l = toLocal(frame, light->L);
+            if (fade == 0.0f || !(l.z > 0.0f))
+                continue;
+            out.lit +=
+                light->color * light->shadow * metal.value(l) * (light->weight * fade * keep);
+        }
+
+    out.reflectionWeight = metal.albedo() * keep;
+    if (out.reflectionWeight == kBlack)
+        return;
+    Vec3f const R = f_safe_reflect(api, state, state.I, Ngf, N);
+    out.reflection =
+        api->traceSpecular(&state.P, &R, metal.spread(), maxComponent(out.reflectionWeight))
+        * out.reflectionWeight;
+}
+
+void corvid_Mtl_Metal::shade(IShaderAPI* api, ShadeState& state) const
+{
+    shadePhysical(api, state);
+}
+
+void corvid_Mtl_Metal::transmission(IShaderAPI*, ShadeState& state) const
+{
+    state.transmissionColor = grey(1.0f - kept(state));
+}
+
+void corvid_Mtl_Metal::transfer(IShaderAPI* api, ShadeState& state) const
+{
+    Vec3f const Nf = -state.N * facingSign(state.I, state.Ng);
+    SLArray<Vec3f> const frame = lobeFrame(api, state, Nf);
+    Vec3f const v = toLocal(frame, -state.I);
+    Vec3f const l = toLocal(frame, state.sampleDirection);
+    if (!(v.z > 0.0f && l.z > 0.0f && dot(Nf, state.sampleDirection) > 0.0f)) {
+        state.outBrdf = kBlack;
+        state.sampleCosine = 0.0f;
+        return;
+    }
+    state.outBrdf = lobe(state, v).value(l) * kept(state);
+    state.sampleCosine = l.z;
+}
+
+void corvid_Mtl_Metal::sample(IShaderAPI* api, ShadeState& state) const
+{
+    bool const mayReflect = anySwitch(state.allowReflection);
+    float const keep = kept(state);
+    float chance = 1.0f; // that the metal is taken, not a hole
+    if (keep < 1.0f && anySwitch(state.allowTransmission)) {
+        if (!mayReflect || api->random() >= keep) {
+            sampleStraightThrough(state);
+            if (!mayReflect)
+                state.outBrdf = grey(1.0f - keep);
+            return;
+        }
+        chance = keep;
+    }
+    state.sampleType = kSampleNone;
+    if (!mayReflect || keep == 0.0f)
+        return;
+    Vec3f const Nf = -state.N * facingSign(state.I, state.Ng);
+    SLArray<Vec3f> const frame = lobeFrame(api, state, Nf);
+    Vec3f const v = toLocal(frame, -state.I);
+    if (!(v.z > 0.0f))
+        return;
+    float const pick = api->random();
+    MetalLobe::Sample const s = lobe(state, v).sample(pick, api->random2D());
+    if (!(s.pdf > 0.0f))
+        return;
+    Vec3f const direction = toWorld(frame, s.l);
+    if (!(dot(Nf, direction) > 0.0f)) // below the surface that is not bent
+        return;
+    state.sampleDirection = direction;
+    state.outBrdf = s.value * keep;
+    state.sampleCosine = s.l.z;
+    state.sampleInvPdf = 1.0f / (s.pdf * chance);
+    state.sampleType =
+        state.allowReflection[0] | state.allowReflection[1] ? kSampleMixture : kSampleStraight;
+}
+
+} // namespace zsi

@@ -1,0 +1,96 @@
+/// What light loses by leaving the facets after one bounce, and what further bounces give back.
+#pragma once
+
+#include "materials/physical/anisotropicGgx.h"
+#include "materials/physical/facetLossTable.h"
+
+namespace zsi {
+
+/// Position of x, 0 up, between the nodes of a table: node below and share of the one above.
+/// NaN is taken as 0.
+template <int Nodes>
+struct TablePosition {
+    int node;
+    float share;
+
+    explicit TablePosition(float x)
+    {
+        float const last = static_cast<float>(Nodes - 2);
+        node = static_cast<int>(x > 0.0f ? minOf(x, last) : 0.0f);
+        share = x > 0.0f ? minOf(x - static_cast<float>(node), 1.0f) : 0.0f;
+    }
+};
+
+/// Multiple scattering between facets of two widths as a broad, reciprocal lobe,
+///   loss(v) loss(l) / (pi mean) x colour:
+/// Kulla and Conty 2017, "Revisiting Physically Based Shading at Imageworks". The loss depends on
+/// the azimuth where the widths differ.
+class FacetLoss {
+public:
+    /// The table reaches to this ratio of the widths.
+    static constexpr float kLeastRatio = 0.1f;
+
+    /// Widths in (0, 1], at most 1 : 10.
+    explicit FacetLoss(AnisotropicGgx facets)
+        : wide_(maxOf(facets.ax, facets.ay))
+        , rootWide_(std::sqrt(wide_))
+        , alongX_(facets.ax >= facets.ay)
+        , isotropic_(facets.ax == facets.ay)
+        , width_(rootWide_ * (kWidths - 1))
+        , ratio_(isotropic_ ? kRatios - 1.0f
+                            : (minOf(facets.ax, facets.ay) / wide_ - kLeastRatio)
+                         * ((kRatios - 1) / (1.0f - kLeastRatio)))
+    {
+    }
+
+    /// Mean of the loss over the hemisphere, weighted with the cosine.
+    float mean() const
+    {
+        auto const along = [this](float const(&row)[kRatios]) {
+            return lerp(row[ratio_.node], row[ratio_.node + 1], ratio_.share);
+        };
+        TablePosition<kMeanWidths> const width(rootWide_ * (kMeanWidths - 1));
+        return wide_
+            * lerp(along(kMeanFacetLoss[width.node]), along(kMeanFacetLoss[width.node + 1]),
+                   width.share);
+    }
+
+    /// Share of the light along w that single bounces on perfect mirrors do not send out.
+    float operator()(Vec3f w) const
+    {
+        TablePosition<kCosines> const cosine(w.z * (1.0f + wide_) / (w.z + wide_) * (kCosines - 1));
+        if (isotropic_) { // the same at every azimuth
+            auto const along = [&](int width) {
+                auto const& row = kFacetLoss[width][kRatios - 1];
+                return lerp(row[cosine.node][0], row[cosine.node + 1][0], cosine.share);
+            };
+            return lerp(along(width_.node), along(width_.node + 1), width_.share);
+        }
+        float const side = std::sqrt(w.x * w.x + w.y * w.y);
+        TablePosition<kAzimuths> const azimuth(std::fabs(alongX_ ? w.x : w.y) / side
+                                               * (kAzimuths - 1));
+        auto const across = [&](float const(&row)[kCosines][kAzimuths]) {
+            auto const around = [&](float const(&cell)[kAzimuths]) {
+                return lerp(cell[azimuth.node], cell[azimuth.node + 1], azimuth.share);
+            };
+            return lerp(around(row[cosine.node]), around(row[cosine.node + 1]), cosine.share);
+        };
+        auto const along = [&](int width) {
+            auto const& plane = kFacetLoss[width];
+            return lerp(across(plane[ratio_.node]), across(plane[ratio_.node + 1]), ratio_.share);
+        };
+        return lerp(along(width_.node), along(width_.node + 1), width_.share);
+    }
+
+private:
+    static constexpr int kWidths = 7, kMeanWidths = 13, kRatios = 4, kCosines = 9, kAzimuths = 5;
+
+    static float lerp(float a, float b, float t) { return a + t * (b - a); }
+
+    float wide_, rootWide_;
+    bool alongX_, isotropic_;
+    TablePosition<kWidths> width_;
+    TablePosition<kRatios> ratio_;
+};
+
+} // namespace zsi
