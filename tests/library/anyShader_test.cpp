@@ -121,7 +121,7 @@ void forEveryEntryPoint(unsigned rounds, bool hostile, Check const& check)
 
 TEST(AnyShader, WritesItsOwnResultsOnly)
 {
-    forEveryEntryPoint(40, false, [](Subject const& s, auto const& e, auto& supply, unsigned seed) {
+    forEveryEntryPoint(25, false, [](Subject const& s, auto const& e, auto& supply, unsigned seed) {
         for (int i = 0; i < 10; ++i) {
             ShadeState const before = test::fillRecord(supply);
             ASSERT_EQ(s.strayWrite(e.bit, before, s.run(e, before, seed, false)), "");
@@ -131,7 +131,7 @@ TEST(AnyShader, WritesItsOwnResultsOnly)
 
 TEST(AnyShader, StandsHostileInput)
 {
-    forEveryEntryPoint(60, true, [](Subject const& s, auto const& e, auto& supply, unsigned seed) {
+    forEveryEntryPoint(40, true, [](Subject const& s, auto const& e, auto& supply, unsigned seed) {
         for (int i = 0; i < 10; ++i) {
             ShadeState const before = test::fillRecord(supply);
             ASSERT_EQ(s.strayWrite(e.bit, before, s.run(e, before, seed, true)), "");

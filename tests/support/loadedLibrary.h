@@ -20,7 +20,7 @@ struct ElfFile {
     std::set<std::string> defined; ///< dynamic symbols that the file offers
     std::set<std::string> needed; ///< libraries that it asks for
     std::size_t initialisers = 0; ///< entries of .init_array
-    std::size_t variables = 0; ///< bytes of .data and .bss
+    std::set<std::string> variables; ///< in .data and .bss, but for the compiler's own
 
     explicit ElfFile(std::string const& path)
     {
@@ -34,18 +34,29 @@ struct ElfFile {
             Elf64_Shdr const& s = sections[i];
             char const* data = file.data() + s.sh_offset;
             char const* names = file.data() + sections[s.sh_link].sh_offset;
-            std::string const section =
-                file.data() + sections[header->e_shstrndx].sh_offset + s.sh_name;
-            if (section == ".data" || section == ".bss")
-                variables += s.sh_size;
             if (s.sh_type == SHT_INIT_ARRAY)
                 initialisers = s.sh_size / sizeof(void*);
+            bool const dynamic = s.sh_type == SHT_DYNSYM;
             for (auto const* symbol = reinterpret_cast<Elf64_Sym const*>(data);
-                 s.sh_type == SHT_DYNSYM
+                 (dynamic || s.sh_type == SHT_SYMTAB)
                  && reinterpret_cast<char const*>(symbol) < data + s.sh_size;
-                 ++symbol)
-                if (symbol->st_shndx != SHN_UNDEF)
-                    defined.insert(names + symbol->st_name);
+                 ++symbol) {
+                std::string const name = names + symbol->st_name;
+                if (symbol->st_shndx == SHN_UNDEF)
+                    continue;
+                if (dynamic)
+                    defined.insert(name);
+                if (dynamic || symbol->st_shndx >= header->e_shnum)
+                    continue;
+                std::string const section = file.data() + sections[header->e_shstrndx].sh_offset
+                    + sections[symbol->st_shndx].sh_name;
+                bool const variable = section == ".data" || section == ".bss" || section == ".tbss";
+                bool const compilers = ELF64_ST_TYPE(symbol->st_info) == STT_SECTION
+                    || name.starts_with("__") || name.starts_with("completed.")
+                    || name.starts_with("DW.ref.");
+                if (variable && !compilers)
+                    variables.insert(name);
+            }
             for (auto const* entry = reinterpret_cast<Elf64_Dyn const*>(data);
                  s.sh_type == SHT_DYNAMIC
                  && reinterpret_cast<char const*>(entry) < data + s.sh_size;
