@@ -1,0 +1,204 @@
+#include "materials/legacy/XRite.h"
+
+#include "environments/iblGrading.h"
+#include "materials/legacy/curveFresnel.h"
+#include "materials/physical/ggx.h"
+#include "materials/physical/safeReflect.h"
+#include "materials/physical/shadingFrame.h"
+#include "materials/utility/facedNormal.h"
+
+#include <bit>
+
+namespace zsi {
+namespace {
+
+constexpr float kPi = 3.14159265f;
+
+/// Squared width of the coat's highlights: lights are points, and a coat is never quite flat.
+constexpr float kCoatAlpha2 = 0.0016f;
+
+/// Frame about a normal. Duff et al. 2017, "Building an Orthonormal Basis, Revisited". Flakes lie
+/// at random, so it does not matter how it turns about the normal.
+SLArray<Vec3f> frameAbout(Vec3f n)
+{
+    float const s = std::copysign(1.0f, n.z);
+    float const a = -1.0f / (s + n.z);
+    float const b = n.x * n.y * a;
+    return {{{1.0f + s * n.x * n.x * a, s * b, -s * n.x}, {b, s + n.y * n.y * a, -n.y}, n}};
+}
+
+float srgbCurve(float x, float power)
+{
+    return x > 0.0031308f ? 1.055f * power - 0.055f : 12.92f * x;
+}
+
+} // namespace
+
+Vec3f XRite::f_getFlakeNormal(IShaderAPI*, ShadeState const&, Vec2f uv) const
+{
+    Vec4f const t = flakeNormalTexture.lookup(uv);
+    return {2.0f * t.x - 1.0f, 2.0f * t.y - 1.0f, t.z};
+}
+
+float XRite::f_fast_fresnel(IShaderAPI*, ShadeState const&, Vec3f v, Vec4f curve) const
+{
+    return curveFresnel(v.z, curve);
+}
+
+Vec3f XRite::f_r709tosRGB(IShaderAPI*, ShadeState const&, Vec3f c) const
+{
+    // One unit in the last place above the float nearest to 1/2.4.
+    constexpr float kExponent = std::bit_cast<float>(0x3ED55556u);
+    Vec3f const p(std::pow(c.x, kExponent), std::pow(c.y, kExponent), std::pow(c.z, kExponent));
+    return {srgbCurve(c.x, p.x), srgbCurve(c.y, p.y), srgbCurve(c.z, p.z)};
+}
+
+/// Slope of the flake of a cell: a draw from the normals that the texture holds, so that flakes
+/// are of flakeSize whatever the pattern of the texture.
+Vec2f XRite::flakeSlope(IShaderAPI* api, ShadeState const& state, Vec3i cell) const
+{
+    if (!flakeNormalTexture.texture)
+        return {0.0f, 0.0f};
+    // Far from the jitter of the centres, which the plain hash of the cell gives.
+    Vec3f const at = cellHash(cell.y ^ 0x2545F491, cell.x);
+    Vec3f const n = f_getFlakeNormal(api, state, {at.x, at.y});
+    constexpr float kLeastHeight = 0.1f; // no flake stands upright
+    return Vec2f(n.x, n.y) * (coarseness / maxOf(n.z, kLeastHeight));
+}
+
+FlakeLayer XRite::flakes(IShaderAPI* api, ShadeState const& state) const
+{
+    FlakeLayer layer;
+    layer.spread = kFlakeSlope * coarseness * coarseness;
+    float const density = flakeFactor / flakeSize; // flakes per unit of uv
+    Vec2f const p = attribute_uv(state) * density;
+    // Beyond this, cells have no integer number. Negated, so that NaN leaves too.
+    constexpr float kMostCells = 1e9f;
+    if (!(std::fabs(p.x) < kMostCells && std::fabs(p.y) < kMostCells && density > 0.0f))
+        return layer;
+
+    // The record has no ray differentials: a pixel is taken as 1/1000 rad from the ray's origin,
+    // and a unit of uv as a unit of length.
+    constexpr float kPixelAngle = 0.001f;
+    float const footprint = length(state.P - state.E) * kPixelAngle * density; // in flakes
+    float const underneath = maxOf(1.0f, footprint * footprint);
+    float const told = minOf(minOf(maxFlakes, underneath), static_cast<float>(FlakeLayer::kMost));
+    if (!(told > 0.0f) || !(footprint < kMostCells))
+        return layer;
+
+    // The contrast of a crowd falls with the root of its number; `told` of it are averaged here.
+    layer.resolved = underneath > told ? std::sqrt(told / underneath) : 1.0f;
+    // Alone, a flake has its shape; of many, only cells are drawn.
+    bool const alone = underneath <= 1.0f;
+    for (int i = 0; static_cast<float>(i) < told; ++i) {
+        Vec3i cell;
+        if (alone) {
+            cell = flakeAt(p);
+        } else {
+            // R2 sequence: Roberts 2018, "The Unreasonable Effectiveness of Quasirandom Sequences".
+            float const k = static_cast<float>(i);
+            float const x = p.x + footprint * (fract(0.5f + k * 0.7548777f) - 0.5f);
+            float const y = p.y + footprint * (fract(0.5f + k * 0.5698403f) - 0.5f);
+            cell = {static_cast<std::int32_t>(std::floor(x)),
+                    static_cast<std::int32_t>(std::floor(y)), 0};
+        }
+        float const weight = minOf(1.0f, told - static_cast<float>(i)) / told;
+        layer.flake[layer.count++] = {flakeSlope(api, state, cell), weight};
+    }
+    return layer;
+}
+
+Vec3f XRite::paint(IShaderAPI* api, ShadeState const& state) const
+{
+    Vec3f const occlusion = f_calcAmbientOcclusion(api, state, 1.0f);
+    if (showAmbientOnly)
+        return grey(minComponent(occlusion));
+
+    Vec3f const n = facedNormal(state, reverseNormal, faceForward);
+    SLArray<Vec3f> const frame = frameAbout(n);
+    Vec3f const v = toLocal(frame, -state.I);
+    bool const inside = v.z < 0.0f; // seen from behind, with a normal that is not turned
+    Vec3f const upper = inside ? -n : n;
+    Vec3f const ng = dot(state.I, state.Ng) > 0.0f ? -state.Ng : state.Ng;
+
+    // The measured colours are told in the curve of a display.
+    Vec3f const base = f_r709tosRGB(api, state, xriteDiffuse) * diffIntensity;
+    float const flakeScale = xriteIsSolid ? 0.0f : contributionFactor * specIntensity;
+    bool const flaky = flakeScale != 0.0f;
+    Vec3f color(0.0f, 0.0f, 0.0f), color2(0.0f, 0.0f, 0.0f);
+    FlakeLayer layer;
+    if (flaky) {
+        color = f_r709tosRGB(api, state, flakeColor);
+        color2 = f_r709tosRGB(api, state, flakeColor2);
+        layer = flakes(api, state);
+    }
+
+    // Lights. Every term is what a light of irradiance pi sends to the viewer: a white base that
+    // faces a light of colour 1 shows 1.
+    Vec3f diffuse(0.0f, 0.0f, 0.0f), glints(0.0f, 0.0f, 0.0f), highlight(0.0f, 0.0f, 0.0f);
+    for (LightSample const* s = api->getLightSamples(-2, &state.P, &n); s; s = s->next) {
+        Vec3f const light = s->color * s->shadow * s->weight;
+        if (light == Vec3f(0.0f, 0.0f, 0.0f))
+            continue;
+        diffuse += light;
+        Vec3f const l = toLocal(frame, s->L);
+        if (l.z <= 0.0f || v.z <= 0.0f)
+            continue;
+        Vec3f const h = normalize(v + l);
+        float const f = f_fast_fresnel(api, state, {0.0f, 0.0f, dot(v, h)}, fresnel);
+        highlight += light * (f * kPi * Ggx{kCoatAlpha2}.reflection(v, l, h));
+        if (flaky)
+            glints += light * layer.glint(v, l, h, color, color2);
+    }
+
+    // Surroundings: a cube where one is bound, the host's rays otherwise.
+    float const coat = f_fast_fresnel(api, state, {0.0f, 0.0f, std::fabs(v.z)}, fresnel);
+    float const under = maxOf(0.0f, 1.0f - coat);
+    diffuse += occlusion
+        * (diffuseCube.texture ? rgb(diffuseCube.lookup(cubeCoordinate(n)))
+                               : api->indirectDiffuse(&state.P, &n, under * maxComponent(base)));
+    Vec3f const mirror = f_safe_reflect(api, state, state.I, ng, upper);
+    if (flaky) {
+        // About the mean of the flakes that are told apart, as wide as what they leave.
+        Vec3f mean(0.0f, 0.0f, 0.0f), average(0.0f, 0.0f, 0.0f);
+        for (int i = 0; i < layer.count; ++i) {
+            FlakeLayer::Flake const& f = layer.flake[i];
+            mean += Vec3f(f.slope.x, f.slope.y, 0.0f) * f.weight;
+            average += mix(color, color2, layer.flop(f.slope)) * f.weight;
+        }
+        average = mix(mix(color, color2, 0.5f), average, layer.resolved);
+        mean *= layer.resolved;
+        mean.z = 1.0f;
+        Vec3f const m = normalize(toWorld(frame, mean));
+        Vec3f const r =
+            layer.count > 0 ? f_safe_reflect(api, state, state.I, ng, inside ? -m : m) : mirror;
+        float const left = layer.spread * (1.0f - layer.resolved * layer.resolved);
+        glints += average * occlusion
+            * (specularCube.texture
+                   ? rgb(specularCube.lookup(cubeCoordinate(r)))
+                   : api->traceSpecular(&state.P, &r, std::sqrt(kFlakeGloss + left),
+                                        under * std::fabs(flakeScale) * maxComponent(average)));
+    }
+    float const mirrored = coat * specIntensity;
+    Vec3f reflection(0.0f, 0.0f, 0.0f);
+    if (reflectCube.texture)
+        reflection = rgb(reflectCube.lookup(cubeCoordinate(mirror))) * occlusion;
+    else if (mirrored != 0.0f)
+        reflection = api->traceReflection(&state.P, &mirror, mirrored);
+
+    return under * (base * diffuse + glints * flakeScale) + reflection * mirrored
+        + highlight * specIntensity;
+}
+
+void XRite::shade(IShaderAPI* api, ShadeState& state) const
+{
+    shadeMasked(*this, api, state, [&] { return paint(api, state); });
+}
+
+void XRite::transmission(IShaderAPI* api, ShadeState& state) const
+{
+    state.transmissionColor =
+        f_calcMasking(api, state, attribute_uv(state), state.Pref, state.Nref);
+}
+
+} // namespace zsi

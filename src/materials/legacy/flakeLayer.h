@@ -1,0 +1,117 @@
+/// Flakes in a paint: which of them a view ray meets, and what they mirror.
+///
+/// A flake is a facet of slope s (the tangent-plane part of its normal over the upright part) with
+/// a gloss of its own. Slopes of many flakes are taken as Gaussian, so that a crowd of flakes
+/// mirrors like one wider lobe whose variance is that of the gloss plus that of the slopes; what a
+/// footprint no longer resolves moves from flakes into that lobe. Olano and Baker 2010, "LEAN
+/// Mapping". Local directions: z along the normal.
+#pragma once
+
+#include <cmath>
+#include <cstdint>
+#include <zsi/vecmath.h>
+
+namespace zsi {
+
+/// Squared width of the lobe of one flake: glints of some 6 degrees.
+inline constexpr float kFlakeGloss = 0.01f;
+/// Mean squared slope of the flakes that a flake-normal texture holds, at coarseness 1.
+inline constexpr float kFlakeSlope = 0.1f;
+
+/// Three numbers in [0, 1) of a cell.
+/// Jarzynski and Olano 2020, "Hash Functions for GPU Rendering" (pcg3d).
+inline Vec3f cellHash(std::int32_t ix, std::int32_t iy)
+{
+    auto const mix = [](std::uint32_t v) { return v * 1664525u + 1013904223u; };
+    std::uint32_t x = mix(static_cast<std::uint32_t>(ix));
+    std::uint32_t y = mix(static_cast<std::uint32_t>(iy));
+    std::uint32_t z = mix(0u);
+    for (int round = 0; round < 2; ++round) {
+        x += y * z;
+        y += z * x;
+        z += x * y;
+        if (round == 0) {
+            x ^= x >> 16u;
+            y ^= y >> 16u;
+            z ^= z >> 16u;
+        }
+    }
+    auto const unit = [](std::uint32_t v) { return static_cast<float>(v >> 8u) * 0x1p-24f; };
+    return {unit(x), unit(y), unit(z)};
+}
+
+/// The cell whose flake covers p: each cell holds the centre of one flake, and the nearest wins.
+inline Vec3i flakeAt(Vec2f p)
+{
+    auto const x0 = static_cast<std::int32_t>(std::floor(p.x));
+    auto const y0 = static_cast<std::int32_t>(std::floor(p.y));
+    Vec3i nearest(x0, y0, 0);
+    float best = 9.0f;
+    for (std::int32_t y = y0 - 1; y <= y0 + 1; ++y)
+        for (std::int32_t x = x0 - 1; x <= x0 + 1; ++x) {
+            Vec3f const h = cellHash(x, y);
+            float const dx = static_cast<float>(x) + h.x - p.x;
+            float const dy = static_cast<float>(y) + h.y - p.y;
+            float const d = dx * dx + dy * dy;
+            if (d < best) {
+                best = d;
+                nearest = {x, y, 0};
+            }
+        }
+    return nearest;
+}
+
+/// Density of facet normals h around the slope s, times pi, 1/sr: Beckmann facets of squared width
+/// alpha2 about a tilted mean.
+inline float facetsAbout(Vec3f h, Vec2f s, float alpha2)
+{
+    if (h.z <= 0.0f)
+        return 0.0f;
+    float const dx = h.x / h.z - s.x, dy = h.y / h.z - s.y, z2 = h.z * h.z;
+    return std::exp(-(dx * dx + dy * dy) / alpha2) / (alpha2 * z2 * z2);
+}
+
+/// What a view ray meets of the layer.
+struct FlakeLayer {
+    /// More flakes than these look no different from the crowd.
+    static constexpr int kMost = 16;
+
+    struct Flake {
+        Vec2f slope;
+        float weight; ///< of the sum over the flakes, 1 in total
+    };
+    Flake flake[kMost];
+    int count = 0;
+    float resolved = 0.0f; ///< share of the layer that shows as flakes and not as the crowd, 0..1
+    float spread = kFlakeSlope; ///< mean squared slope of the crowd
+
+    /// Share of the second flake colour at a slope: flakes that lie flat show the first colour,
+    /// those that lean more than most the second.
+    float flop(Vec2f s) const
+    {
+        float const tilt = s.x * s.x + s.y * s.y;
+        return tilt > 0.0f ? tilt / (tilt + spread) : 0.0f;
+    }
+
+    /// Colour that flakes mirror from l to v, for a light of irradiance pi. h: unit.
+    Vec3f glint(Vec3f v, Vec3f l, Vec3f h, Vec3f const& color, Vec3f const& color2) const
+    {
+        float const alpha2 = kFlakeGloss + spread;
+        // Smith shadowing of the crowd for every flake: they lie in the same layer.
+        auto const shadowing = [alpha2](float c) {
+            return c + std::sqrt(c * c + alpha2 * (1.0f - c * c));
+        };
+        float const visible = 1.0f / (shadowing(v.z) * shadowing(l.z));
+        Vec3f sum(0.0f, 0.0f, 0.0f);
+        if (resolved < 1.0f) {
+            float const t = h.z > 0.0f ? flop({h.x / h.z, h.y / h.z}) : 0.0f;
+            sum = mix(color, color2, t) * ((1.0f - resolved) * facetsAbout(h, {0, 0}, alpha2));
+        }
+        for (int i = 0; i < count; ++i)
+            sum += mix(color, color2, flop(flake[i].slope))
+                * (resolved * flake[i].weight * facetsAbout(h, flake[i].slope, kFlakeGloss));
+        return sum * visible;
+    }
+};
+
+} // namespace zsi
