@@ -53,8 +53,6 @@ struct WardFrameFunctions {
     {
         constexpr float kMaxAngle = 1.553343f; // 89 degrees
         constexpr float kSmallTilt = 0.08f; // below: sin(a)/sin(b) loses digits
-        if (bumped == plain)
-            return normalize(bumped);
         Vec3f const v = normalize(viewer);
         Vec3f const n = normalize(plain);
         Vec3f const m = normalize(bumped);

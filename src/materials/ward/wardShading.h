@@ -70,8 +70,10 @@ struct WardShadingFunctions {
         Vec3f const Nf = state.N * -side;
         SLArray<Vec3f> frame;
         s.f_computeShadingFrame(api, state, state.P, Nf, Mat3f(state.objectToWorld), frame);
-        frame[2] = s.f_adjustBumpNormal(api, state, -state.I, Nf, frame[2]);
-        s.f_basisOrthonormalize(api, state, frame);
+        if (!(frame[2] == Nf)) [[unlikely]] { // an unbent frame is square and visible already
+            frame[2] = s.f_adjustBumpNormal(api, state, -state.I, Nf, frame[2]);
+            s.f_basisOrthonormalize(api, state, frame);
+        }
         Vec3f const v = toLocal(frame, state.I);
         WardLobe lobe;
         s.f_computeWardRoughness(api, state, lobe.ax, lobe.ay);
@@ -85,9 +87,9 @@ struct WardShadingFunctions {
         Vec3f glossyLit = kBlack;
         for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
              light = light->next) {
-            if (light->color == kBlack)
-                continue;
             float const w = light->weight * lightFade(dot(light->L, N));
+            if (w == 0.0f || light->color == kBlack)
+                continue;
             Vec3f const arriving = light->color * light->shadow * w;
             diffuseLit += diffuse * arriving;
             if (!glossy || !(v.z < 0.0f))
