@@ -50,6 +50,7 @@ struct PhysicalColors {
     Vec3f indirect{0.0f, 0.0f, 0.0f};
     Vec3f additional{0.0f, 0.0f, 0.0f};
     Vec3f reflectionWeight{0.0f, 0.0f, 0.0f}; ///< no contribution of its own
+    Vec3f indirectWeight{0.0f, 0.0f, 0.0f}; ///< diffuse colours in it; no contribution of its own
     Vec3f transmissionWeight{0.0f, 0.0f, 0.0f}; ///< where it is 1, occlusion counts nothing
 };
 

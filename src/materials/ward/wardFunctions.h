@@ -18,8 +18,7 @@ namespace zsi {
 
 /// Empty: a class holds its vtable link and its parameters, nothing else.
 template <class Shader>
-struct WardFunctions : AmbientOcclusionFunctions<Shader>,
-                       MaskingFunctions<Shader>,
+struct WardFunctions : PhysicalShading<Shader>,
                        SafeReflectFunctions,
                        IndirectDiffuseFunctions,
                        AnisoRotationFunctions<Shader>,

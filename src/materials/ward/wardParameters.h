@@ -1,16 +1,9 @@
 /// Parameter rows of the Ward family, in blocks that a class puts in its own order.
 #pragma once
 
-#include "materials/physical/ambientOcclusion.h"
-#include "materials/physical/masking.h"
+#include "materials/physical/materialSkeleton.h"
 
 namespace zsi {
-
-/// Attributes that the surface channels and the shading frame read.
-#define WARD_ATTRIBUTES(P, U, A) \
-    A(Vec3f, bitangent)          \
-    A(Vec3f, tangent)            \
-    A(Vec2f, uv)
 
 /// The channels, 90 rows. A scalar map is read in its red channel; where a map is on, it times its
 /// amount replaces the plain value. Transforms take the uv attribute to map coordinates.

@@ -3,64 +3,29 @@
 
 #include "materials/physical/indirectDiffuse.h"
 #include "materials/physical/lightFade.h"
+#include "materials/physical/materialSkeleton.h"
 #include "materials/physical/safeReflect.h"
 #include "materials/ward/wardFrame.h"
 #include "materials/ward/wardLobes.h"
 
 namespace zsi {
 
-/// What a Ward surface sends to the viewer, before occlusion and mask.
-struct WardColors {
-    Vec4f diffuseLit; ///< lights through the diffuse layer; the only term that occlusion darkens
-    Vec4f glossyLit; ///< highlights of lights
-    Vec4f reflection;
-    Vec4f refraction; ///< and what shows through the holes of the cut-out
-    Vec4f indirect;
-    Vec4f additional;
-    Vec3f indirectWeight; ///< sum of the diffuse colours that weigh the indirect light
-    Vec3f transparency; ///< weight of what lies behind
-};
-
 /// Shading members of a Ward class.
 template <class Shader>
 struct WardShadingFunctions {
-    void shadeWard(IShaderAPI* api, ShadeState& state) const
-    {
-        auto const& s = self();
-        Vec3f const mask =
-            s.f_calcMasking(api, state, Shader::attribute_uv(state), state.Pref, state.Nref);
-        if (mask == Vec3f(1.0f, 1.0f, 1.0f)) {
-            state.discardHit = 1;
-            return;
-        }
-        WardColors c;
-        s.f_calculateColors(api, state, c);
-        Vec3f const open =
-            s.f_calcAmbientOcclusion(api, state, 1.0f - maxComponent(c.transparency));
-        Vec3f const total = rgb(c.diffuseLit) * open + rgb(c.glossyLit) + rgb(c.reflection)
-            + rgb(c.refraction) + rgb(c.indirect) + rgb(c.additional);
-        if (mask == Vec3f(0.0f, 0.0f, 0.0f)) {
-            state.Ci = withAlpha(total, 1.0f);
-            return;
-        }
-        Vec4f const behind = api->traceThrough(&state.P, &state.I, 1.0f);
-        // Alpha takes the mask's fourth weight, which is 1: that of what lies behind.
-        state.Ci = withAlpha(mix(total, rgb(behind), mask), behind.w);
-    }
+    void shadeWard(IShaderAPI* api, ShadeState& state) const { self().shadePhysical(api, state); }
 
-    void f_calculateColors(IShaderAPI* api, ShadeState const& state, WardColors& out) const
+    void f_calculateColors(IShaderAPI* api, ShadeState const& state, PhysicalColors& out) const
     {
         auto const& s = self();
         constexpr Vec3f kBlack(0.0f, 0.0f, 0.0f);
-        out = {kOpaque, kOpaque, kOpaque, kOpaque, kOpaque, kOpaque, kBlack, kBlack};
-
         float const c = s.cutout(api, state);
         Vec3f seen = kBlack;
         if (c != 1.0f) [[unlikely]] {
             seen = rgb(api->traceThrough(&state.P, &state.I, 1.0f - c));
             if (c == 0.0f) {
-                out.refraction = withAlpha(seen, 1.0f);
-                out.transparency = {1.0f, 1.0f, 1.0f};
+                out.refraction = seen;
+                out.transmissionWeight = {1.0f, 1.0f, 1.0f};
                 return;
             }
         }
@@ -83,21 +48,8 @@ struct WardShadingFunctions {
         Vec3f const N = s.u_normal1AsShadingNormal ? frame[2] : Nf;
         bool const glossy = maxComponent(specular) > kSpecularThreshold;
 
-        Vec3f diffuseLit = kBlack;
-        Vec3f glossyLit = kBlack;
-        for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
-             light = light->next) {
-            float const w = light->weight * lightFade(dot(light->L, N));
-            if (w == 0.0f || light->color == kBlack)
-                continue;
-            Vec3f const arriving = light->color * light->shadow * w;
-            diffuseLit += diffuse * arriving;
-            if (!glossy || !(v.z < 0.0f))
-                continue;
-            Vec3f const l = toLocal(frame, light->L);
-            if (l.z > 0.0f)
-                glossyLit += specular * lobe.value(v, l) * arriving;
-        }
+        WardLobe const* const shine = glossy && v.z < 0.0f ? &lobe : nullptr;
+        addLights(api, state, N, frame, v, diffuse, specular, shine, out);
 
         Vec3f translucent = kBlack;
         if (far) {
@@ -106,51 +58,69 @@ struct WardShadingFunctions {
                                       transmit, filter, state.Pref);
             translucent *= filter;
             if (!(translucent == kBlack))
-                diffuseLit += translucent * lightBehind(api, state, -N);
+                out.lit += translucent * lightBehind(api, state, -N);
         }
-        out.diffuseLit = withAlpha(diffuseLit, 1.0f);
-        out.glossyLit = withAlpha(glossyLit, 1.0f);
-        out.transparency = transmit;
+        out.transmissionWeight = transmit;
 
         Vec3f const NgFaced = state.Ng * -side;
         if (side < 0.0f && glossy && !s.u_reflectionHighlightOnly) {
             Vec3f const R = s.f_safe_reflect(api, state, state.I, NgFaced, frame[2]);
             Vec3f const traced =
                 api->traceSpecular(&state.P, &R, s.u_reflectGlossyValue, maxComponent(specular));
-            out.reflection = withAlpha(traced * specular, 1.0f);
+            out.reflectionWeight = specular;
+            out.reflection = traced * specular;
         }
         if (s.u_transparency && !(transmit == kBlack)) {
             float const eta = far ? s.u_ior / state.beyondIor : state.incomingIor / s.u_ior;
             Vec3f T = sl_lib_refract(state.I, N, eta);
-            if (T == kBlack)
+            if (T == kBlack) // total reflection
                 T = s.f_safe_reflect(api, state, state.I, NgFaced, N);
-            Vec3f const traced =
-                api->traceRefraction(&state.P, &T, refractionSpread(state), maxComponent(transmit));
-            out.refraction = withAlpha(traced * transmit, 1.0f);
+            out.refraction = transmit
+                * api->traceRefraction(&state.P, &T, refractionSpread(state),
+                                       maxComponent(transmit));
         }
 
-        Vec3f const indirect = s.f_rtIndirectDiffuse(api, state, diffuse, state.P, N)
+        out.indirect = s.f_rtIndirectDiffuse(api, state, diffuse, state.P, N)
             + s.f_rtIndirectDiffuse(api, state, translucent, state.P, -N);
-        out.indirect = withAlpha(indirect, 1.0f);
         out.indirectWeight = diffuse + translucent;
 
-        Vec3f additional = s.u_additionalColor;
+        out.additional = s.u_additionalColor;
         if (s.u_additionalMapEnable) [[unlikely]]
-            additional = additional
-                * clamp01(rgb(Shader::texel(state, s.u_additionalMap, s.u_additionalMapTransform)))
-                * s.u_additionalAmount;
-        out.additional = withAlpha(additional, 1.0f);
+            out.additional *= s.u_additionalAmount
+                * clamp01(rgb(Shader::texel(state, s.u_additionalMap, s.u_additionalMapTransform)));
 
         if (s.u_cutoutMapEnable) [[unlikely]]
             cutOut(out, seen, c);
     }
 
 private:
-    static constexpr Vec4f kOpaque{0.0f, 0.0f, 0.0f, 1.0f};
     /// Highlights below this are not worth their exponential.
     static constexpr float kSpecularThreshold = 1e-5f;
 
     Shader const& self() const { return static_cast<Shader const&>(*this); }
+
+    /// Lights on the viewer's side. shine: the glossy lobe, null where it does not count.
+    static void addLights(IShaderAPI* api, ShadeState const& state, Vec3f N,
+                          SLArray<Vec3f> const& frame, Vec3f v, Vec3f diffuse, Vec3f specular,
+                          WardLobe const* shine, PhysicalColors& out)
+    {
+        Vec3f lit(0.0f, 0.0f, 0.0f), highlight(0.0f, 0.0f, 0.0f);
+        for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
+             light = light->next) {
+            float const w = light->weight * lightFade(dot(light->L, N));
+            if (w == 0.0f || light->color == Vec3f(0.0f, 0.0f, 0.0f))
+                continue;
+            Vec3f const arriving = light->color * light->shadow * w;
+            lit += diffuse * arriving;
+            if (!shine)
+                continue;
+            Vec3f const l = toLocal(frame, light->L);
+            if (l.z > 0.0f)
+                highlight += specular * shine->value(v, l) * arriving;
+        }
+        out.lit = lit;
+        out.highlight = highlight;
+    }
 
     /// Light that arrives on the side of `N`, with the horizon fade.
     Vec3f lightBehind(IShaderAPI* api, ShadeState const& state, Vec3f N) const
@@ -173,14 +143,16 @@ private:
     }
 
     /// Blends every term with what is seen through the holes. c: 0 hole .. 1 surface.
-    static void cutOut(WardColors& out, Vec3f seen, float c)
+    static void cutOut(PhysicalColors& out, Vec3f seen, float c)
     {
-        Vec4f* const terms[] = {&out.diffuseLit, &out.glossyLit, &out.reflection,
-                                &out.refraction, &out.indirect,  &out.additional};
-        for (Vec4f* term : terms)
-            *term = withAlpha(rgb(*term) * c, 1.0f);
-        out.refraction = withAlpha(seen * (1.0f - c) + rgb(out.refraction), 1.0f);
-        out.transparency = out.transparency * c + grey(1.0f - c);
+        using Colors = PhysicalColors;
+        constexpr Vec3f Colors::*kTerms[] = {&Colors::lit,        &Colors::highlight,
+                                             &Colors::reflection, &Colors::refraction,
+                                             &Colors::indirect,   &Colors::additional};
+        for (auto const term : kTerms)
+            out.*term *= c;
+        out.refraction += seen * (1.0f - c);
+        out.transmissionWeight = out.transmissionWeight * c + grey(1.0f - c);
     }
 };
 

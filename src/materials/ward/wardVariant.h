@@ -8,7 +8,7 @@
 namespace zsi {
 
 #define WARD_VARIANT_FRONT(P, U, A) \
-    WARD_ATTRIBUTES(P, U, A)        \
+    TANGENT_ATTRIBUTES(P, U, A)     \
     WARD_CHANNELS(P, U, A)
 #define WARD_VARIANT_BACK(P, U, A) \
     AMBIENT_OCCLUSION(P, U, A)     \
