@@ -8,8 +8,9 @@
 
 namespace zsi {
 
-/// Turns tangent and bitangent by `angle` radians, tangent towards bitangent. No renormalisation.
-inline void rotateAboutNormal(SLArray<Vec3f>& frame, float angle)
+/// The frame with tangent and bitangent turned by `angle` radians, tangent towards bitangent. No
+/// renormalisation.
+inline SLArray<Vec3f> rotatedAboutNormal(SLArray<Vec3f> frame, float angle)
 {
     float const c = std::cos(angle);
     float const s = std::sin(angle);
@@ -17,6 +18,7 @@ inline void rotateAboutNormal(SLArray<Vec3f>& frame, float angle)
     Vec3f const B = frame[1];
     frame[0] = T * c + B * s;
     frame[1] = T * -s + B * c;
+    return frame;
 }
 
 /// `f_anisoRotateFrame` for a class that has the channel `u_anisoRotation*`. The amount that
@@ -38,9 +40,8 @@ struct AnisoRotationFunctions {
                     angle *= s.u_anisoRotationAmount;
             }
         }
-        if (angle == 0.0f)
-            return;
-        rotateAboutNormal(frame, angle);
+        if (angle != 0.0f)
+            frame = rotatedAboutNormal(frame, angle);
     }
 };
 

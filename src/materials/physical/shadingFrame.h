@@ -19,7 +19,10 @@ namespace zsi {
 }
 
 /// Tangent and bitangent made unit and perpendicular to the normal.
-inline void reorthogonalize(SLArray<Vec3f>& frame) { frame = orthonormalFrame(frame[0], frame[2]); }
+[[gnu::always_inline]] inline void reorthogonalize(SLArray<Vec3f>& frame)
+{
+    frame = orthonormalFrame(frame[0], frame[2]);
+}
 
 /// Frame of the "tangent" attribute (object space) and a world-space normal, not normalised here.
 [[gnu::always_inline]] inline SLArray<Vec3f> computeBaseFrame(Vec3f const& tangent, Vec3f const& N,

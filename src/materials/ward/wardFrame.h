@@ -34,7 +34,7 @@ struct WardFrameFunctions {
         frame = computeBaseFrame(Shader::attribute_tangent(state), N, toWorld);
         if (s.u_normal0MapEnable || s.u_procedureMapEnable != kProcedureNone
             || s.u_normal1MapEnable) [[unlikely]]
-            bendFrame(api, state, P, toWorld, frame);
+            frame = bentFrame(api, state, P, toWorld, frame);
         s.f_anisoRotateFrame(api, state, frame, 0.0f);
     }
 
@@ -75,8 +75,10 @@ struct WardFrameFunctions {
 private:
     Shader const& self() const { return static_cast<Shader const&>(*this); }
 
-    [[gnu::noinline]] void bendFrame(IShaderAPI* api, ShadeState const& state, Vec3f P,
-                                     Mat3f const& toWorld, SLArray<Vec3f>& frame) const
+    /// By value, here and below: a frame whose address is never taken stays in registers where
+    /// nothing bends it.
+    [[gnu::noinline]] SLArray<Vec3f> bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f P,
+                                               Mat3f toWorld, SLArray<Vec3f> frame) const
     {
         auto const& s = self();
         Vec2f const uv = Shader::attribute_uv(state);
@@ -90,6 +92,7 @@ private:
         }
         if (s.u_normal1MapEnable)
             bend(frame, bumpHeights(s.u_normal1Map, s.u_normal1Transform, uv), s.u_normal1Amount);
+        return frame;
     }
 
     static void bend(SLArray<Vec3f>& frame, SLArray<float> const& heights, float amount)

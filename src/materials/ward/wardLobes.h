@@ -93,10 +93,12 @@ struct WardLobeFunctions {
         float F = 0.0f;
         if (frontSide || withFresnel)
             F = reflectivity(state, cosTheta);
-        diffuse = s.u_diffuseColor;
         specular = s.u_specularColor;
-        if (s.u_specularMapEnable || s.u_diffuseMapEnable || s.u_imageFadeEnable > 1) [[unlikely]]
-            mapColors(api, state, position, diffuse, specular);
+        if (s.u_specularMapEnable) [[unlikely]]
+            specular = specularMap(state);
+        diffuse = s.u_diffuseColor;
+        if (s.u_diffuseMapEnable || s.u_imageFadeEnable > 1) [[unlikely]]
+            diffuse = fadedDiffuse(api, state, position);
         if (s.u_isMetal) {
             float const Y = dot(Vec3f(0.212671f, 0.71516f, 0.072169f), specular);
             specular *= diffuse;
@@ -106,10 +108,14 @@ struct WardLobeFunctions {
         diffuse *= 1.0f - F;
         transmit = {0.0f, 0.0f, 0.0f};
         filter = {1.0f, 1.0f, 1.0f};
-        if (s.u_transparency)
-            layTransparency(state, frontSide, F, diffuse, transmit, filter);
-        else if (!frontSide)
+        if (s.u_transparency) [[unlikely]] {
+            Layers const layers = layTransparency(state, frontSide, F);
+            diffuse *= layers.diffuse;
+            transmit = layers.transmit;
+            filter = layers.filter;
+        } else if (!frontSide) {
             diffuse = {0.0f, 0.0f, 0.0f};
+        }
     }
 
     Vec3f f_rtMix2Color(IShaderAPI*, ShadeState const&, Vec3f a, Vec3f b, float t) const
@@ -155,25 +161,35 @@ private:
         return clamp01(r0 + curve * (r90 - r0)) * s.u_reflectivity;
     }
 
-    /// The colours where maps or the image fade give them.
-    [[gnu::noinline]] void mapColors(IShaderAPI* api, ShadeState const& state, Vec3f position,
-                                     Vec3f& diffuse, Vec3f& specular) const
+    [[gnu::noinline]] Vec3f specularMap(ShadeState const& state) const
     {
         auto const& s = self();
-        if (s.u_specularMapEnable)
-            specular = clamp01(rgb(texel(state, s.u_specularMap, s.u_specularTransform))
-                               * s.u_specularAmount);
+        return clamp01(rgb(texel(state, s.u_specularMap, s.u_specularTransform))
+                       * s.u_specularAmount);
+    }
+
+    /// The diffuse colour where a map or the image fade gives it.
+    [[gnu::noinline]] Vec3f fadedDiffuse(IShaderAPI* api, ShadeState const& state,
+                                         Vec3f position) const
+    {
+        auto const& s = self();
+        Vec3f diffuse = s.u_diffuseColor;
         if (s.u_diffuseMapEnable) {
             Vec4f const c = s.diffuseMap(api, state, Shader::attribute_uv(state), position);
             diffuse = s.u_imageFadeEnable == 1 ? mix(diffuse, rgb(c), c.w * s.u_imageFade) : rgb(c);
         }
         if (s.u_imageFadeEnable > 1)
             diffuse = s.f_rtMix2Color(api, state, diffuse, fadeColor(state), s.u_imageFade);
+        return diffuse;
     }
 
-    /// Takes light from the diffuse layer for transmission, straight and diffused.
-    [[gnu::noinline]] void layTransparency(ShadeState const& state, bool frontSide, float F,
-                                           Vec3f& diffuse, Vec3f& transmit, Vec3f& filter) const
+    struct Layers {
+        float diffuse; ///< what transparency leaves of the diffuse layer
+        Vec3f transmit, filter;
+    };
+
+    /// What transmission takes from the diffuse layer, straight and diffused.
+    [[gnu::noinline]] Layers layTransparency(ShadeState const& state, bool frontSide, float F) const
     {
         auto const& s = self();
         float tr = s.u_transparencyValue;
@@ -182,17 +198,14 @@ private:
             tr = tr * (1.0f - s.u_transparencyFade)
                 + s.u_transparencyAmount * t * s.u_transparencyFade;
         }
-        filter = s.u_diffuseColor * (1.0f - tr) + grey(tr); // the plain colour, never the map
-        if (frontSide) {
-            diffuse *= 1.0f - tr;
-            transmit = filter * ((1.0f - F) * tr);
-            return;
-        }
+        // The plain colour, never the map.
+        Vec3f const filter = s.u_diffuseColor * (1.0f - tr) + grey(tr);
+        if (frontSide)
+            return {1.0f - tr, filter * ((1.0f - F) * tr), filter};
         float const tl =
             scalar(state, s.u_translucencyMapEnable, s.u_translucencyMap, s.u_translucencyTransform,
                    s.u_translucencyAmount, s.u_translucencyValue);
-        diffuse *= tl * tr;
-        transmit = filter * ((1.0f - F) * (1.0f - tl) * tr);
+        return {tl * tr, filter * ((1.0f - F) * (1.0f - tl) * tr), filter};
     }
 
     Vec3f fadeColor(ShadeState const& state) const

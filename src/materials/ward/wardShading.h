@@ -80,9 +80,12 @@ struct WardShadingFunctions {
                                        maxComponent(transmit));
         }
 
-        out.indirect = s.f_rtIndirectDiffuse(api, state, diffuse, state.P, N)
-            + s.f_rtIndirectDiffuse(api, state, translucent, state.P, -N);
-        out.indirectWeight = diffuse + translucent;
+        out.indirect = s.f_rtIndirectDiffuse(api, state, diffuse, state.P, N);
+        out.indirectWeight = diffuse;
+        if (far) {
+            out.indirect += s.f_rtIndirectDiffuse(api, state, translucent, state.P, -N);
+            out.indirectWeight += translucent;
+        }
 
         out.additional = s.u_additionalColor;
         if (s.u_additionalMapEnable) [[unlikely]]
@@ -90,7 +93,7 @@ struct WardShadingFunctions {
                 * clamp01(rgb(Shader::texel(state, s.u_additionalMap, s.u_additionalMapTransform)));
 
         if (s.u_cutoutMapEnable) [[unlikely]]
-            cutOut(out, seen, c);
+            out = cutOut(out, seen, c);
     }
 
 private:
@@ -100,9 +103,10 @@ private:
     Shader const& self() const { return static_cast<Shader const&>(*this); }
 
     /// Lights on the viewer's side. shine: the glossy lobe, null where it does not count.
-    static void addLights(IShaderAPI* api, ShadeState const& state, Vec3f N,
-                          SLArray<Vec3f> const& frame, Vec3f v, Vec3f diffuse, Vec3f specular,
-                          WardLobe const* shine, PhysicalColors& out)
+    [[gnu::always_inline]] static void addLights(IShaderAPI* api, ShadeState const& state, Vec3f N,
+                                                 SLArray<Vec3f> const& frame, Vec3f v,
+                                                 Vec3f diffuse, Vec3f specular,
+                                                 WardLobe const* shine, PhysicalColors& out)
     {
         Vec3f lit(0.0f, 0.0f, 0.0f), highlight(0.0f, 0.0f, 0.0f);
         for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
@@ -143,16 +147,16 @@ private:
     }
 
     /// Blends every term with what is seen through the holes. c: 0 hole .. 1 surface.
-    static void cutOut(PhysicalColors& out, Vec3f seen, float c)
+    static PhysicalColors cutOut(PhysicalColors out, Vec3f seen, float c)
     {
-        using Colors = PhysicalColors;
-        constexpr Vec3f Colors::*kTerms[] = {&Colors::lit,        &Colors::highlight,
-                                             &Colors::reflection, &Colors::refraction,
-                                             &Colors::indirect,   &Colors::additional};
-        for (auto const term : kTerms)
-            out.*term *= c;
-        out.refraction += seen * (1.0f - c);
+        out.lit *= c;
+        out.highlight *= c;
+        out.reflection *= c;
+        out.indirect *= c;
+        out.additional *= c;
+        out.refraction = seen * (1.0f - c) + out.refraction * c;
         out.transmissionWeight = out.transmissionWeight * c + grey(1.0f - c);
+        return out;
     }
 };
 
