@@ -5,7 +5,7 @@
 set -euo pipefail
 cd "$(dirname "$0")/.."
 . scripts/lib/packages.sh
-install_missing "${packages_build[@]}" openimageio-tools
+install_missing "${packages_build[@]}"
 
 cmake --preset release -DZSI_BUILD_TESTS=OFF -DZSI_BUILD_BENCH=OFF >/dev/null
 cmake --build --preset release
