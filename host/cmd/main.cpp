@@ -1,1 +1,101 @@
-int main() { return 0; }
+#include "base/error.h"
+#include "cmd/command.h"
+
+#include <CLI/CLI.hpp>
+#include <cstdio>
+#include <fmt/format.h>
+#include <new>
+
+namespace zsi::cmd {
+namespace {
+
+constexpr int kBadInput = 1;
+constexpr int kBadUsage = 2;
+
+/// The parser's complaint in the words of the other errors, with what may have been meant.
+std::string explain(CLI::App const& app, CLI::ParseError const& error)
+{
+    auto const* extras = dynamic_cast<CLI::ExtrasError const*>(&error);
+    std::vector<std::string> const unknown = app.remaining(true);
+    if (!extras || unknown.empty())
+        return error.what();
+
+    std::string const& word = unknown.front();
+    auto const chosen = app.get_subcommands();
+    std::vector<std::string> known;
+    if (word.starts_with("-")) {
+        std::vector<CLI::App const*> levels{&app};
+        levels.insert(levels.end(), chosen.begin(), chosen.end());
+        for (CLI::App const* level : levels)
+            for (CLI::Option const* option : level->get_options())
+                for (std::string const& name : option->get_lnames())
+                    known.push_back("--" + name);
+        std::string const name = word.substr(0, word.find('='));
+        return fmt::format("{}: unknown option{}", host::printable(name),
+                           host::suggestion(name, known));
+    }
+    if (!chosen.empty())
+        return fmt::format("{}: unexpected argument (zsi {} --help)", host::printable(word),
+                           chosen.front()->get_name());
+    for (CLI::App const* subcommand : app.get_subcommands({}))
+        known.push_back(subcommand->get_name());
+    return fmt::format("{}: unknown subcommand{}", host::printable(word),
+                       host::suggestion(word, known));
+}
+
+int run(int argc, char** argv)
+{
+    CLI::App app{"Lists shaders and renders scenes with them."};
+    app.name("zsi");
+    app.fallthrough();
+    app.set_version_flag("--version",
+                         fmt::format("zsi {}, shader interface {}", ZSI_VERSION, kApiVersion));
+    std::string shaderPath;
+    app.add_option("--shader-path", shaderPath,
+                   "Folders with shader libraries, separated by colons. Without it: "
+                   "ZSI_SHADER_PATH, else the folder `shaders` beside this program")
+        ->type_name("FOLDER[:FOLDER]");
+    Subcommand const subcommands[] = {addInfo(app, shaderPath)};
+    app.footer("Exit status: 0 done, 1 bad input, 2 bad command line, 130 interrupted.");
+
+    try {
+        app.parse(argc, argv);
+    } catch (CLI::ParseError const& error) {
+        if (error.get_exit_code() == 0) // --help, --version
+            return app.exit(error);
+        throw UsageError(explain(app, error));
+    }
+    for (Subcommand const& subcommand : subcommands)
+        if (subcommand.app->parsed())
+            return subcommand.run();
+    throw UsageError("a subcommand is missing: info (zsi --help)");
+}
+
+} // namespace
+
+host::ShaderLibraries loadLibraries(std::string const& shaderPath)
+{
+    host::ShaderLibraries libraries;
+    for (std::filesystem::path const& folder : host::shaderDirectories(shaderPath))
+        for (std::string const& leftOut : libraries.loadDirectory(folder))
+            warn(leftOut);
+    return libraries;
+}
+
+void warn(std::string const& message) { fmt::print(stderr, "zsi: warning: {}\n", message); }
+
+} // namespace zsi::cmd
+
+int main(int argc, char** argv)
+try {
+    return zsi::cmd::run(argc, argv);
+} catch (zsi::cmd::UsageError const& error) {
+    fmt::print(stderr, "zsi: {}\n", error.what());
+    return zsi::cmd::kBadUsage;
+} catch (std::bad_alloc const&) {
+    std::fputs("zsi: out of memory\n", stderr);
+    return zsi::cmd::kBadInput;
+} catch (std::exception const& error) {
+    fmt::print(stderr, "zsi: {}\n", error.what());
+    return zsi::cmd::kBadInput;
+}

@@ -5,7 +5,10 @@
 #include <OpenImageIO/imageio.h>
 #include <algorithm>
 #include <cctype>
+#include <cerrno>
 #include <cmath>
+#include <cstring>
+#include <fcntl.h>
 #include <fmt/format.h>
 #include <unistd.h>
 #include <zsi/vecmath.h>
@@ -53,26 +56,49 @@ Encoding encodingOf(std::filesystem::path const& file)
                      + ": unknown kind of picture; expected .exr, .hdr, .png, .jpg or .jpeg");
 }
 
-/// Removes the file on the way out unless it was handed over.
-struct TemporaryFile {
-    std::filesystem::path path;
+[[noreturn]] void fail(std::filesystem::path const& file, std::string const& why)
+{
+    throw InputError(file.string() + ": cannot be written: " + why);
+}
+
+/// A file beside the one that it may become, removed on the way out otherwise. The extension stays
+/// last: it tells the format.
+class TemporaryFile {
+public:
+    explicit TemporaryFile(std::filesystem::path const& goal)
+        : path(goal.parent_path()
+               / fmt::format(".{}.{}{}", goal.stem().string(), getpid(), goal.extension().string()))
+        , goal_(goal)
+    {
+    }
+    TemporaryFile(TemporaryFile const&) = delete;
+    TemporaryFile& operator=(TemporaryFile const&) = delete;
     ~TemporaryFile()
     {
         std::error_code ignored;
-        if (!path.empty())
-            std::filesystem::remove(path, ignored);
+        std::filesystem::remove(path, ignored);
     }
+    void becomeGoal() const
+    {
+        std::error_code error;
+        std::filesystem::rename(path, goal_, error);
+        if (error)
+            fail(goal_, error.message());
+    }
+
+    std::filesystem::path const path;
+
+private:
+    std::filesystem::path const& goal_;
 };
 
-void writeTo(std::filesystem::path const& file, Picture const& picture, float exposure,
-             Encoding encoding)
+/// `goal` is the name for messages.
+void writeTo(std::filesystem::path const& file, std::filesystem::path const& goal,
+             Picture const& picture, float exposure, Encoding encoding)
 {
-    auto const fail = [&](std::string const& why) {
-        throw InputError(file.string() + ": cannot be written: " + why);
-    };
     auto const output = OIIO::ImageOutput::create(file.string());
     if (!output)
-        fail(OIIO::geterror());
+        fail(goal, OIIO::geterror());
     OIIO::ImageSpec spec(picture.width, picture.height, encoding.channels, encoding.type);
     bool const encoded = encoding.type == OIIO::TypeDesc::UINT8;
     spec.attribute("oiio:ColorSpace", encoded ? "sRGB" : "Linear");
@@ -83,7 +109,7 @@ void writeTo(std::filesystem::path const& file, Picture const& picture, float ex
         spec.attribute("compression", "zip");
     spec.attribute("CompressionQuality", 95);
     if (!output->open(file.string(), spec))
-        fail(output->geterror());
+        fail(goal, output->geterror());
 
     auto const pixels =
         static_cast<std::size_t>(picture.width) * static_cast<std::size_t>(picture.height);
@@ -104,26 +130,34 @@ void writeTo(std::filesystem::path const& file, Picture const& picture, float ex
     }
     bool const closed = output->close();
     if (!written || !closed)
-        fail(output->geterror());
+        fail(goal, output->geterror());
 }
 
 } // namespace
+
+void checkPictureFile(std::filesystem::path const& file)
+{
+    encodingOf(file);
+    std::error_code ignored;
+    if (std::filesystem::is_directory(file, ignored))
+        fail(file, "it is a folder");
+    if (std::filesystem::exists(file, ignored) && access(file.c_str(), W_OK) != 0)
+        fail(file, std::strerror(errno));
+    TemporaryFile const temporary(file);
+    int const descriptor = open(temporary.path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0600);
+    if (descriptor < 0)
+        fail(file, std::strerror(errno));
+    close(descriptor);
+}
 
 void writePicture(std::filesystem::path const& file, Picture const& picture, float exposure)
 {
     Encoding const encoding = encodingOf(file);
     if (picture.width <= 0 || picture.height <= 0)
         throw InputError(file.string() + ": the picture is empty");
-    // The extension stays last: it tells the format.
-    TemporaryFile temporary{
-        file.parent_path()
-        / fmt::format(".{}.{}{}", file.stem().string(), getpid(), file.extension().string())};
-    writeTo(temporary.path, picture, exposure, encoding);
-    std::error_code error;
-    std::filesystem::rename(temporary.path, file, error);
-    if (error)
-        throw InputError(file.string() + ": cannot be written: " + error.message());
-    temporary.path.clear();
+    TemporaryFile const temporary(file);
+    writeTo(temporary.path, file, picture, exposure, encoding);
+    temporary.becomeGoal();
 }
 
 } // namespace zsi::host
