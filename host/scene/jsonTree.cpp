@@ -1,0 +1,256 @@
+#include "scene/jsonTree.h"
+
+#include "base/error.h"
+#include "base/names.h"
+
+#include <algorithm>
+#include <fmt/format.h>
+#include <fstream>
+#include <iterator>
+#include <nlohmann/json.hpp>
+
+namespace zsi::host {
+
+namespace {
+
+// Deeper than any scene; keeps the recursion over a hostile file's tree short.
+constexpr std::size_t kMaxDepth = 64;
+
+struct Place {
+    int line = 1;
+    int column = 1;
+};
+
+Place placeOf(std::string_view text, std::size_t offset)
+{
+    std::string_view const before = text.substr(0, offset);
+    std::size_t const lastBreak = before.rfind('\n');
+    Place place;
+    place.line += static_cast<int>(std::count(before.begin(), before.end(), '\n'));
+    place.column +=
+        static_cast<int>(lastBreak == std::string_view::npos ? offset : offset - lastBreak - 1);
+    return place;
+}
+
+/// Gives the parser its characters and tells how many it has taken.
+class CountingIterator {
+public:
+    using iterator_category = std::input_iterator_tag;
+    using value_type = char;
+    using difference_type = std::ptrdiff_t;
+    using pointer = char const*;
+    using reference = char const&;
+
+    CountingIterator(char const* at, std::size_t* taken)
+        : at_(at)
+        , taken_(taken)
+    {
+    }
+    char const& operator*() const { return *at_; }
+    CountingIterator& operator++()
+    {
+        ++at_;
+        ++*taken_;
+        return *this;
+    }
+    CountingIterator operator++(int)
+    {
+        CountingIterator const before = *this;
+        ++*this;
+        return before;
+    }
+    bool operator==(CountingIterator const& other) const { return at_ == other.at_; }
+    bool operator!=(CountingIterator const& other) const { return at_ != other.at_; }
+
+private:
+    char const* at_;
+    std::size_t* taken_;
+};
+
+/// Builds the tree from the parser's events.
+class TreeBuilder final : public nlohmann::json_sax<nlohmann::json> {
+public:
+    TreeBuilder(std::filesystem::path const& file, std::string_view text, std::size_t const& taken)
+        : file_(std::make_shared<std::filesystem::path>(file))
+        , text_(text)
+        , taken_(taken)
+    {
+    }
+
+    JsonValue take() { return std::move(root_); }
+
+    bool null() override { return add(made(JsonValue::Kind::Null)); }
+    bool boolean(bool value) override
+    {
+        JsonValue v = made(JsonValue::Kind::Bool);
+        v.boolean = value;
+        return add(std::move(v));
+    }
+    bool number_integer(number_integer_t value) override
+    {
+        return number(JsonValue::Kind::Integer, static_cast<double>(value));
+    }
+    bool number_unsigned(number_unsigned_t value) override
+    {
+        return number(JsonValue::Kind::Integer, static_cast<double>(value));
+    }
+    bool number_float(number_float_t value, string_t const&) override
+    {
+        return number(JsonValue::Kind::Float, value);
+    }
+    bool string(string_t& value) override
+    {
+        JsonValue v = made(JsonValue::Kind::String);
+        v.text = std::move(value);
+        return add(std::move(v));
+    }
+    bool binary(binary_t&) override { return false; } // not in text
+    bool start_object(std::size_t) override { return open(JsonValue::Kind::Object); }
+    bool start_array(std::size_t) override { return open(JsonValue::Kind::Array); }
+    bool end_object() override { return close(); }
+    bool end_array() override { return close(); }
+
+    bool key(string_t& name) override
+    {
+        if (open_.back()->find(name))
+            fail(taken_,
+                 fmt::format("the key \"{}\" stands twice in this object", printable(name)));
+        key_ = std::move(name);
+        return true;
+    }
+
+    bool parse_error(std::size_t, std::string const&,
+                     nlohmann::json::exception const& error) override
+    {
+        // Ours is the place; theirs what is wrong with it, behind their own two prefixes.
+        std::string_view why = error.what();
+        for (std::string_view const prefix : {"] ", "syntax error while "})
+            if (std::size_t const at = why.find(prefix); at != std::string_view::npos)
+                why.remove_prefix(at + prefix.size());
+        fail(taken_, "no valid JSON: " + printable(why));
+    }
+
+private:
+    [[noreturn]] void fail(std::size_t offset, std::string const& why) const
+    {
+        // The last character taken is the first that is too many.
+        Place const place = placeOf(text_, offset > 0 ? offset - 1 : 0);
+        throw InputError(
+            fmt::format("{}:{}:{}: {}", file_->string(), place.line, place.column, why));
+    }
+
+    JsonValue made(JsonValue::Kind kind) const
+    {
+        JsonValue v;
+        v.kind = kind;
+        v.file = file_;
+        // One character behind a number is taken to see its end.
+        std::size_t const ahead =
+            kind == JsonValue::Kind::Integer || kind == JsonValue::Kind::Float ? 1 : 0;
+        v.line = placeOf(text_, taken_ > ahead ? taken_ - ahead : 0).line;
+        return v;
+    }
+
+    bool number(JsonValue::Kind kind, double value)
+    {
+        JsonValue v = made(kind);
+        v.number = value;
+        return add(std::move(v));
+    }
+
+    JsonValue* insert(JsonValue value)
+    {
+        if (open_.empty()) {
+            root_ = std::move(value);
+            return &root_;
+        }
+        JsonValue& parent = *open_.back();
+        if (parent.kind == JsonValue::Kind::Array)
+            return &parent.items.emplace_back(std::move(value));
+        return &parent.members.emplace_back(std::move(key_), std::move(value)).second;
+    }
+    bool add(JsonValue value)
+    {
+        insert(std::move(value));
+        return true;
+    }
+    bool open(JsonValue::Kind kind)
+    {
+        if (open_.size() == kMaxDepth)
+            fail(taken_, fmt::format("nested deeper than {} levels", kMaxDepth));
+        open_.push_back(insert(made(kind)));
+        return true;
+    }
+    bool close()
+    {
+        open_.pop_back();
+        return true;
+    }
+
+    std::shared_ptr<std::filesystem::path const> file_;
+    std::string_view text_;
+    std::size_t const& taken_;
+    JsonValue root_;
+    std::vector<JsonValue*> open_; ///< from the root to where values are added now
+    std::string key_;
+};
+
+std::string readText(std::filesystem::path const& file)
+{
+    std::error_code failed;
+    if (!std::filesystem::exists(file, failed))
+        throw InputError(file.string() + ": no such file");
+    std::ifstream in(file, std::ios::binary);
+    std::string text{std::istreambuf_iterator<char>(in), {}};
+    if (!in || std::filesystem::is_directory(file, failed))
+        throw InputError(file.string() + ": cannot be read");
+    return text;
+}
+
+} // namespace
+
+JsonValue const* JsonValue::find(std::string_view name) const
+{
+    for (auto const& [key, value] : members)
+        if (key == name)
+            return &value;
+    return nullptr;
+}
+
+JsonValue* JsonValue::find(std::string_view name)
+{
+    return const_cast<JsonValue*>(std::as_const(*this).find(name));
+}
+
+char const* kindName(JsonValue::Kind kind)
+{
+    switch (kind) {
+    case JsonValue::Kind::Null:
+        return "null";
+    case JsonValue::Kind::Bool:
+        return "true or false";
+    case JsonValue::Kind::Integer:
+    case JsonValue::Kind::Float:
+        return "a number";
+    case JsonValue::Kind::String:
+        return "a string";
+    case JsonValue::Kind::Array:
+        return "an array";
+    case JsonValue::Kind::Object:
+        return "an object";
+    }
+    return "nothing";
+}
+
+JsonValue readJson(std::filesystem::path const& file)
+{
+    std::string const text = readText(file);
+    std::size_t taken = 0;
+    TreeBuilder builder(file, text, taken);
+    nlohmann::json::sax_parse(CountingIterator(text.data(), &taken),
+                              CountingIterator(text.data() + text.size(), &taken), &builder,
+                              nlohmann::json::input_format_t::json, true, true);
+    return builder.take();
+}
+
+} // namespace zsi::host

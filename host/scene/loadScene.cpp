@@ -1,0 +1,331 @@
+#include "scene/loadScene.h"
+
+#include "base/error.h"
+#include "base/names.h"
+#include "scene/jsonReader.h"
+#include "scene/meshCompletion.h"
+#include "scene/meshFile.h"
+#include "scene/meshShapes.h"
+#include "scene/parameterValues.h"
+#include "scene/sceneFile.h"
+#include "scene/transforms.h"
+#include "scene/unwrittenParameters.h"
+#include "texture/textureStore.h"
+
+#include <algorithm>
+#include <cmath>
+#include <fmt/format.h>
+
+namespace zsi::host {
+
+namespace {
+
+constexpr int kLargestFilm = 32768; // pixels a side
+constexpr int kMostSamples = 1 << 20;
+constexpr int kMostSegments = 4096;
+
+Camera readCamera(JsonReader const& reader)
+{
+    reader.expectKeys({"position", "target", "up", "fov", "lensRadius", "focusDistance"});
+    Camera camera;
+    if (auto const v = reader.find("position"))
+        camera.position = v->toVec3f();
+    if (auto const v = reader.find("target"))
+        camera.target = v->toVec3f();
+    if (auto const v = reader.find("up"))
+        camera.up = v->toVec3f();
+    if (auto const v = reader.find("fov")) {
+        camera.verticalFov = v->toPositive();
+        if (camera.verticalFov >= 180.0f)
+            v->failExpected("degrees below 180");
+    }
+    if (auto const v = reader.find("lensRadius"))
+        camera.lensRadius = v->toFloat(0);
+    if (auto const v = reader.find("focusDistance"))
+        camera.focusDistance = v->toFloat(0);
+    Vec3f const view = camera.target - camera.position;
+    if (!(length(view) > 0.0f) || !std::isfinite(length(view)))
+        reader.fail("the target has no direction from the position");
+    if (!(length(cross(normalize(view), normalize(camera.up))) > 1e-5f))
+        reader.fail("up must point across the view, not along it");
+    return camera;
+}
+
+Film readFilm(JsonReader const& reader)
+{
+    reader.expectKeys({"width", "height", "exposure", "crop"});
+    Film film;
+    if (auto const v = reader.find("width"))
+        film.width = v->toInt(1, kLargestFilm);
+    if (auto const v = reader.find("height"))
+        film.height = v->toInt(1, kLargestFilm);
+    if (auto const v = reader.find("exposure"))
+        film.exposure = v->toFloat(-64, 64);
+    if (auto const v = reader.find("crop")) {
+        std::vector<JsonReader> const items = v->items();
+        if (items.size() != 4)
+            v->failExpected("[x0, y0, x1, y1] in pixels, the end exclusive");
+        int const x0 = items[0].toInt(0, film.width - 1), y0 = items[1].toInt(0, film.height - 1);
+        int const x1 = items[2].toInt(x0 + 1, film.width);
+        int const y1 = items[3].toInt(y0 + 1, film.height);
+        film.crop = {x0, y0, x1, y1};
+    }
+    return film;
+}
+
+Settings readSettings(JsonReader const& reader)
+{
+    reader.expectKeys({"samples", "maxDepth", "occlusionSamples", "indirectSamples",
+                       "occlusionDistance", "ambient", "sampleClamp", "seed", "integrator"});
+    Settings settings;
+    if (auto const v = reader.find("samples"))
+        settings.samples = v->toInt(1, kMostSamples);
+    if (auto const v = reader.find("maxDepth"))
+        settings.maxDepth = v->toInt(0, 1000);
+    if (auto const v = reader.find("occlusionSamples"))
+        settings.occlusionSamples = v->toInt(1, 4096);
+    if (auto const v = reader.find("indirectSamples"))
+        settings.indirectSamples = v->toInt(1, 4096);
+    if (auto const v = reader.find("occlusionDistance"))
+        settings.occlusionDistance = v->toFloat(0);
+    if (auto const v = reader.find("ambient"))
+        settings.ambient = v->toVec3f();
+    if (auto const v = reader.find("sampleClamp"))
+        settings.sampleClamp = v->toFloat(0);
+    if (auto const v = reader.find("seed"))
+        settings.seed = v->toUint32();
+    if (auto const v = reader.find("integrator")) {
+        std::vector<std::string> const names{"shade", "path"};
+        settings.integrator = names[v->toChoice(names)];
+    }
+    return settings;
+}
+
+/// A positive number for all axes or one for each.
+std::vector<float> readSize(JsonReader const& reader, std::size_t axes)
+{
+    if (reader.kind() != JsonValue::Kind::Array)
+        return std::vector<float>(axes, reader.toPositive());
+    if (reader.value().items.size() != axes)
+        reader.failExpected(fmt::format("a number or an array of {}", axes));
+    std::vector<float> size;
+    for (JsonReader const& item : reader.items())
+        size.push_back(item.toPositive());
+    return size;
+}
+
+Mesh readMeshFromFile(JsonReader const& reader, std::vector<std::string>& warnings)
+{
+    reader.expectKeys({"file", "up", "normals"});
+    JsonReader const name = reader.at("file");
+    std::filesystem::path const file = name.toFile();
+    Mesh mesh;
+    try {
+        mesh = readMeshFile(file);
+    } catch (InputError const& error) {
+        name.fail(error.what());
+    }
+    auto const up = reader.find("up");
+    if (up ? up->toChoice({"y", "z"}) == 0 : isYUp(file))
+        turnYUp(mesh);
+    NormalSource source = NormalSource::File;
+    if (auto const normals = reader.find("normals")) {
+        constexpr NormalSource kSources[] = {NormalSource::File, NormalSource::Smooth,
+                                             NormalSource::Flat};
+        source = kSources[normals->toChoice({"file", "smooth", "flat"})];
+    }
+    std::vector<std::string> repairs;
+    completeMesh(mesh, source, repairs);
+    for (std::string const& repair : repairs)
+        warnings.push_back(fmt::format("{}: {}: {}", name.place(), file.string(), repair));
+    if (mesh.triangles.empty())
+        name.fail(file.string() + ": has no triangles that can be seen");
+    return mesh;
+}
+
+Mesh readMesh(JsonReader const& reader, std::vector<std::string>& warnings)
+{
+    std::vector<std::string> const kinds{"file", "sphere", "box", "plane"};
+    if (!reader.isObject())
+        reader.failExpected("an object");
+    if (reader.find("file") && !reader.find("sphere") && !reader.find("box")
+        && !reader.find("plane"))
+        return readMeshFromFile(reader, warnings);
+    reader.expectKeys({"sphere", "box", "plane", "file"});
+    JsonReader const shape = reader.onlyOf(kinds);
+    if (reader.find("sphere")) {
+        shape.expectKeys({"radius", "segments"});
+        auto const radius = shape.find("radius"), segments = shape.find("segments");
+        return sphereMesh(radius ? radius->toPositive() : 1.0f,
+                          segments ? segments->toInt(3, kMostSegments) : 64);
+    }
+    shape.expectKeys({"size"});
+    auto const size = shape.find("size");
+    if (reader.find("box")) {
+        std::vector<float> const s = size ? readSize(*size, 3) : std::vector<float>(3, 1.0f);
+        return boxMesh({s[0], s[1], s[2]});
+    }
+    std::vector<float> const s = size ? readSize(*size, 2) : std::vector<float>(2, 1.0f);
+    return planeMesh({s[0], s[1]});
+}
+
+/// Reads the parts of one scene in order; later ones refer to earlier ones by name.
+class Loader {
+public:
+    Loader(Scene& scene, ShaderLibraries const& libraries)
+        : scene_(scene)
+        , libraries_(libraries)
+    {
+    }
+
+    void read(JsonReader const& root)
+    {
+        root.expectKeys({"include", "camera", "film", "settings", "meshes", "materials",
+                         "instances", "lights", "environment"});
+        if (auto const v = root.find("camera"))
+            scene_.camera = readCamera(*v);
+        if (auto const v = root.find("film"))
+            scene_.film = readFilm(*v);
+        if (auto const v = root.find("settings"))
+            scene_.settings = readSettings(*v);
+        if (auto const v = root.find("meshes"))
+            for (auto const& [name, mesh] : v->members()) {
+                scene_.meshes.push_back(readMesh(mesh, scene_.warnings));
+                scene_.meshes.back().name = name;
+                meshNames_.push_back(name);
+            }
+        if (auto const v = root.find("materials"))
+            for (auto const& [name, material] : v->members()) {
+                material.expectKeys({"class", "parameters"});
+                scene_.materials.push_back(readShader(material, kMaterial));
+                scene_.materialNames.push_back(name);
+            }
+        if (auto const v = root.find("instances"))
+            for (auto const& [name, instance] : v->members())
+                scene_.instances.push_back(readInstance(instance));
+        if (auto const v = root.find("lights"))
+            for (auto const& [name, light] : v->members())
+                scene_.lights.push_back(readLight(light));
+        if (auto const v = root.find("environment")) {
+            v->expectKeys({"class", "parameters"});
+            scene_.environment = readShader(*v, kEnvironment);
+        }
+    }
+
+private:
+    Shader readShader(JsonReader const& reader, ShaderKind wanted)
+    {
+        JsonReader const className = reader.at("class");
+        Shader shader = createShader(className);
+        if (shader.kind() != wanted) {
+            constexpr char const* kKinds[] = {"a material", "a light", "an environment"};
+            className.fail(fmt::format("{} is {}, expected {}", shader.className(),
+                                       kKinds[shader.kind()], kKinds[wanted]));
+        }
+        std::set<std::string> written;
+        if (auto const parameters = reader.find("parameters"))
+            for (auto const& [name, value] : parameters->members()) {
+                Parameter const* const parameter = shader.find(name);
+                if (!parameter)
+                    value.fail(fmt::format("unknown parameter of {}{}", shader.className(),
+                                           suggestion(name, shader.parameterNames())));
+                shader.set(name, readParameterValue(value, parameter->type, *scene_.textures));
+                written.insert(name);
+            }
+        warnAboutUnwritten(reader, shader, written);
+        return shader;
+    }
+
+    Shader createShader(JsonReader const& className) const
+    {
+        std::string const& name = className.toString();
+        if (!libraries_.has(name))
+            className.fail(fmt::format("{}: unknown shader class{}", printable(name),
+                                       suggestion(name, libraries_.classNames())));
+        try {
+            return libraries_.create(name);
+        } catch (InputError const& error) {
+            className.fail(error.what());
+        }
+    }
+
+    void warnAboutUnwritten(JsonReader const& reader, Shader const& shader,
+                            std::set<std::string> const& written)
+    {
+        std::vector<std::string> const names = unwrittenParameters(shader, written);
+        if (names.empty())
+            return;
+        scene_.warnings.push_back(
+            fmt::format("{}: {} reads {}, which {} no default and {} not written here (0 is used)",
+                        reader.place(), shader.className(), fmt::join(names, ", "),
+                        names.size() == 1 ? "has" : "have", names.size() == 1 ? "is" : "are"));
+    }
+
+    static int indexOf(JsonReader const& reader, std::vector<std::string> const& names,
+                       char const* what)
+    {
+        std::string const& name = reader.toString();
+        auto const found = std::find(names.begin(), names.end(), name);
+        if (found == names.end())
+            reader.fail(
+                fmt::format("unknown {} \"{}\"{}", what, printable(name), suggestion(name, names)));
+        return static_cast<int>(found - names.begin());
+    }
+
+    Instance readInstance(JsonReader const& reader) const
+    {
+        reader.expectKeys({"mesh", "material", "transform"});
+        Instance instance{indexOf(reader.at("mesh"), meshNames_, "mesh"),
+                          indexOf(reader.at("material"), scene_.materialNames, "material"),
+                          Mat4f::identity()};
+        auto const transform = reader.find("transform");
+        if (!transform)
+            return instance;
+        Mat4f const m = readTransform(*transform);
+        if (m.m[3] != 0.0f || m.m[7] != 0.0f || m.m[11] != 0.0f || m.m[15] != 1.0f)
+            transform->fail("the last column must be 0, 0, 0, 1 (points are row vectors)");
+        Vec3f const x{m.m[0], m.m[1], m.m[2]}, y{m.m[4], m.m[5], m.m[6]};
+        float const volume = dot(cross(x, y), {m.m[8], m.m[9], m.m[10]});
+        if (volume == 0.0f || !std::isfinite(volume))
+            transform->fail("flattens the mesh: it has no inverse");
+        instance.objectToWorld = m;
+        return instance;
+    }
+
+    Light readLight(JsonReader const& reader)
+    {
+        reader.expectKeys({"class", "position", "target", "axis", "radius", "parameters"});
+        Light light{readShader(reader, kLight), reader.at("position").toVec3f()};
+        if (auto const v = reader.find("radius"))
+            light.radius = v->toFloat(0);
+        if (!reader.find("target") && !reader.find("axis"))
+            return light;
+        JsonReader const aim = reader.onlyOf({"target", "axis"});
+        Vec3f axis = aim.toVec3f();
+        if (reader.find("target"))
+            axis = axis - light.position;
+        if (!(length(axis) > 0.0f) || !std::isfinite(length(axis)))
+            aim.fail(reader.find("target") ? "the light stands on its target"
+                                           : "expected a direction that is not 0");
+        light.axis = normalize(axis);
+        return light;
+    }
+
+    Scene& scene_;
+    ShaderLibraries const& libraries_;
+    std::vector<std::string> meshNames_;
+};
+
+} // namespace
+
+Scene loadScene(std::filesystem::path const& file, ShaderLibraries const& libraries)
+{
+    JsonValue const tree = readSceneFile(file);
+    Scene scene;
+    scene.file = file.string();
+    scene.textures = std::make_shared<TextureStore>();
+    Loader(scene, libraries).read(JsonReader(tree));
+    return scene;
+}
+
+} // namespace zsi::host

@@ -1,0 +1,155 @@
+#include "scene/meshFile.h"
+
+#include "base/error.h"
+#include "scene/meshCompletion.h"
+
+#include <algorithm>
+#include <assimp/Importer.hpp>
+#include <assimp/config.h>
+#include <assimp/postprocess.h>
+#include <assimp/scene.h>
+#include <cctype>
+#include <fmt/format.h>
+#include <set>
+
+namespace zsi::host {
+
+namespace {
+
+std::string extensionOf(std::filesystem::path const& file)
+{
+    std::string extension = file.extension().string();
+    for (char& c : extension)
+        c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
+    return extension;
+}
+
+Vec3f toVec3f(aiVector3D const& v) { return {v.x, v.y, v.z}; }
+
+std::vector<Vec3f> toVec3fs(aiVector3D const* values, unsigned count)
+{
+    std::vector<Vec3f> result;
+    for (unsigned i = 0; values && i < count; ++i)
+        result.push_back(toVec3f(values[i]));
+    return result;
+}
+
+std::vector<Vec2f> toUv(aiVector3D const* values, unsigned count)
+{
+    std::vector<Vec2f> result;
+    for (unsigned i = 0; values && i < count; ++i)
+        result.emplace_back(values[i].x, values[i].y);
+    return result;
+}
+
+Mesh toMesh(aiMesh const& part)
+{
+    Mesh mesh;
+    mesh.positions = toVec3fs(part.mVertices, part.mNumVertices);
+    mesh.normals = toVec3fs(part.mNormals, part.mNumVertices);
+    mesh.tangents = toVec3fs(part.mTangents, part.mNumVertices);
+    mesh.bitangents = toVec3fs(part.mBitangents, part.mNumVertices);
+    mesh.uv = toUv(part.mTextureCoords[0], part.mNumVertices);
+    mesh.uv1 = toUv(part.mTextureCoords[1], part.mNumVertices);
+    if (aiColor4D const* const colors = part.mColors[0])
+        for (unsigned i = 0; i < part.mNumVertices; ++i)
+            mesh.colors.emplace_back(colors[i].r, colors[i].g, colors[i].b, colors[i].a);
+    for (unsigned i = 0; i < part.mNumFaces; ++i)
+        if (aiFace const& face = part.mFaces[i]; face.mNumIndices == 3)
+            mesh.triangles.push_back({face.mIndices[0], face.mIndices[1], face.mIndices[2]});
+    return mesh;
+}
+
+template <class Value>
+void append(std::vector<Value>& to, std::vector<Value> const& from, std::size_t vertices)
+{
+    // A hole is zero: for a normal or a tangent that means missing.
+    to.resize(vertices, Value{});
+    to.insert(to.end(), from.begin(), from.end());
+}
+
+/// All parts as one mesh.
+Mesh joined(std::vector<Mesh>& parts)
+{
+    auto const any = [&](auto Mesh::*array) {
+        return std::any_of(parts.begin(), parts.end(),
+                           [&](Mesh const& part) { return !(part.*array).empty(); });
+    };
+    bool const hasUv = any(&Mesh::uv), hasUv1 = any(&Mesh::uv1), hasColors = any(&Mesh::colors);
+    bool const hasNormals = any(&Mesh::normals);
+    bool const hasTangents = any(&Mesh::tangents) && any(&Mesh::bitangents);
+    Mesh mesh;
+    for (Mesh& part : parts) {
+        if (hasUv && part.uv.empty())
+            projectUv(part);
+        if (hasUv1 && part.uv1.empty())
+            part.uv1 = part.uv;
+        if (hasColors && part.colors.empty())
+            part.colors.assign(part.positions.size(), Vec4f(1, 1, 1, 1));
+        std::size_t const before = mesh.positions.size();
+        std::size_t const after = before + part.positions.size();
+        append(mesh.positions, part.positions, before);
+        if (hasUv)
+            append(mesh.uv, part.uv, before);
+        if (hasUv1)
+            append(mesh.uv1, part.uv1, before);
+        if (hasColors)
+            append(mesh.colors, part.colors, before);
+        if (hasNormals) {
+            append(mesh.normals, part.normals, before);
+            mesh.normals.resize(after, Vec3f{});
+        }
+        // Tangents of some parts only are made anew for all.
+        if (hasTangents && parts.size() == 1) {
+            mesh.tangents = part.tangents;
+            mesh.bitangents = part.bitangents;
+        }
+        for (auto const& t : part.triangles) {
+            auto const shift = static_cast<std::uint32_t>(before);
+            mesh.triangles.push_back({t[0] + shift, t[1] + shift, t[2] + shift});
+        }
+    }
+    return mesh;
+}
+
+} // namespace
+
+Mesh readMeshFile(std::filesystem::path const& file)
+{
+    static std::set<std::string> const kKnown{".obj", ".ply", ".stl", ".gltf", ".glb"};
+    std::error_code failed;
+    if (!std::filesystem::is_regular_file(file, failed))
+        throw InputError(file.string() + ": no such file");
+    if (!kKnown.contains(extensionOf(file)))
+        throw InputError(file.string()
+                         + ": expected a mesh file (.obj, .ply, .stl, .gltf or .glb)");
+    Assimp::Importer importer;
+    importer.SetPropertyInteger(AI_CONFIG_PP_SBP_REMOVE,
+                                aiPrimitiveType_POINT | aiPrimitiveType_LINE);
+    aiScene const* const scene = importer.ReadFile(
+        file.string(),
+        aiProcess_ValidateDataStructure | aiProcess_Triangulate | aiProcess_SortByPType
+            | aiProcess_PreTransformVertices | aiProcess_JoinIdenticalVertices);
+    if (!scene)
+        throw InputError(fmt::format("{}: cannot be read as a mesh: {}", file.string(),
+                                     importer.GetErrorString()));
+    std::vector<Mesh> parts;
+    for (unsigned i = 0; i < scene->mNumMeshes; ++i)
+        if (Mesh part = toMesh(*scene->mMeshes[i]); !part.triangles.empty())
+            parts.push_back(std::move(part));
+    return joined(parts);
+}
+
+bool isYUp(std::filesystem::path const& file)
+{
+    return extensionOf(file) == ".gltf" || extensionOf(file) == ".glb";
+}
+
+void turnYUp(Mesh& mesh)
+{
+    for (auto* const array : {&mesh.positions, &mesh.normals, &mesh.tangents, &mesh.bitangents})
+        for (Vec3f& v : *array)
+            v = {v.x, -v.z, v.y};
+}
+
+} // namespace zsi::host

@@ -1,0 +1,90 @@
+#include "scene/meshShapes.h"
+
+#include <cmath>
+
+namespace zsi::host {
+
+namespace {
+
+std::uint32_t addVertex(Mesh& mesh, Vec3f position, Vec3f normal, Vec3f tangent, Vec2f uv)
+{
+    mesh.positions.push_back(position);
+    mesh.normals.push_back(normal);
+    mesh.tangents.push_back(tangent);
+    mesh.bitangents.push_back(cross(normal, tangent));
+    mesh.uv.push_back(uv);
+    return static_cast<std::uint32_t>(mesh.positions.size() - 1);
+}
+
+/// right x up points out of the face; all three are half edges of the box.
+void addFace(Mesh& mesh, Vec3f out, Vec3f right, Vec3f up)
+{
+    auto const corner = [&](float x, float y) {
+        return addVertex(mesh, out + right * x + up * y, normalize(cross(right, up)),
+                         normalize(right), {0.5f + 0.5f * x, 0.5f + 0.5f * y});
+    };
+    std::uint32_t const a = corner(-1, -1), b = corner(1, -1), c = corner(1, 1), d = corner(-1, 1);
+    mesh.triangles.push_back({a, b, c});
+    mesh.triangles.push_back({a, c, d});
+}
+
+} // namespace
+
+Mesh sphereMesh(float radius, int segments)
+{
+    constexpr double kPi = 3.14159265358979323846;
+    int const rings = segments / 2 < 2 ? 2 : segments / 2;
+    Mesh mesh;
+    // A row of vertices for each circle of latitude; the date line and the poles have several, for
+    // uv and tangents.
+    for (int ring = 0; ring <= rings; ++ring) {
+        bool const pole = ring == 0 || ring == rings;
+        double const latitude = (static_cast<double>(ring) / rings - 0.5) * kPi;
+        double const z = pole ? (ring == 0 ? -1.0 : 1.0) : std::sin(latitude);
+        double const across = pole ? 0.0 : std::cos(latitude);
+        for (int i = 0; i <= segments; ++i) {
+            // At a pole, half a segment on: in the middle of the one triangle that uses it.
+            double const turn = (i + (pole ? 0.5 : 0.0)) / segments;
+            double const longitude = i == segments && !pole ? 0.0 : turn * 2 * kPi;
+            auto const c = static_cast<float>(std::cos(longitude));
+            auto const s = static_cast<float>(std::sin(longitude));
+            auto const r = static_cast<float>(across);
+            Vec3f const normal{c * r, s * r, static_cast<float>(z)};
+            addVertex(
+                mesh, normal * radius, normal, {-s, c, 0},
+                {static_cast<float>(turn), static_cast<float>(ring) / static_cast<float>(rings)});
+        }
+    }
+    auto const row = static_cast<std::uint32_t>(segments + 1);
+    for (int ring = 0; ring < rings; ++ring)
+        for (std::uint32_t i = 0; i + 1 < row; ++i) {
+            std::uint32_t const a = static_cast<std::uint32_t>(ring) * row + i;
+            if (ring > 0)
+                mesh.triangles.push_back({a, a + 1, a + row});
+            if (ring + 1 < rings)
+                mesh.triangles.push_back({a + 1, a + row + 1, a + row});
+        }
+    return mesh;
+}
+
+Mesh boxMesh(Vec3f size)
+{
+    Vec3f const x{0.5f * size.x, 0, 0}, y{0, 0.5f * size.y, 0}, z{0, 0, 0.5f * size.z};
+    Mesh mesh;
+    addFace(mesh, x, y, z);
+    addFace(mesh, -x, -y, z);
+    addFace(mesh, y, -x, z);
+    addFace(mesh, -y, x, z);
+    addFace(mesh, z, x, y);
+    addFace(mesh, -z, -x, y);
+    return mesh;
+}
+
+Mesh planeMesh(Vec2f size)
+{
+    Mesh mesh;
+    addFace(mesh, {0, 0, 0}, {0.5f * size.x, 0, 0}, {0, 0.5f * size.y, 0});
+    return mesh;
+}
+
+} // namespace zsi::host

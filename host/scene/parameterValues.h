@@ -1,0 +1,17 @@
+/// From JSON to what a shader's parameters take.
+#pragma once
+
+#include "plugin/shaderLibrary.h"
+#include "scene/jsonReader.h"
+
+namespace zsi::host {
+
+class TextureStore;
+
+/// The value of a parameter of `type`. Pictures are loaded into `textures`, which owns them.
+/// Throws InputError with the place when the value is of another type or out of range, or a
+/// picture cannot be read.
+ParameterValue readParameterValue(JsonReader const& reader, ParameterType type,
+                                  TextureStore& textures);
+
+} // namespace zsi::host

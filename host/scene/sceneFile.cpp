@@ -1,0 +1,125 @@
+#include "scene/sceneFile.h"
+
+#include "base/error.h"
+#include "base/names.h"
+#include "scene/jsonReader.h"
+
+#include <algorithm>
+
+namespace zsi::host {
+
+namespace {
+
+namespace fs = std::filesystem;
+
+/// What lies at a level of a scene file, as far as files are put together there.
+enum class Level {
+    Scene, ///< of sections
+    Named, ///< meshes, materials, instances, lights: things by name
+    Shader, ///< material, light, environment: keys, with parameters
+    Keys, ///< camera, film, settings, instance, parameters: keys with values
+    Value, ///< replaced as a whole
+};
+
+Level below(Level level, std::string_view section, std::string_view key)
+{
+    switch (level) {
+    case Level::Scene:
+        if (key == "camera" || key == "film" || key == "settings")
+            return Level::Keys;
+        return key == "environment" ? Level::Shader : Level::Named;
+    case Level::Named:
+        // A mesh is of one kind; mixing the keys of two makes no sense.
+        if (section == "meshes")
+            return Level::Value;
+        return section == "instances" ? Level::Keys : Level::Shader;
+    case Level::Shader:
+        return key == "parameters" ? Level::Keys : Level::Value;
+    default:
+        return Level::Value;
+    }
+}
+
+std::vector<std::string> keysOf(JsonValue const& object)
+{
+    std::vector<std::string> keys;
+    for (auto const& [key, value] : object.members)
+        keys.push_back(key);
+    return keys;
+}
+
+/// Parameters of another class mean nothing to this one.
+bool changesClass(JsonValue const& base, JsonValue const& over)
+{
+    JsonValue const* const before = base.find("class");
+    JsonValue const* const after = over.find("class");
+    return before && after && before->text != after->text;
+}
+
+void merge(JsonValue& base, JsonReader const& over, Level level, std::string_view section)
+{
+    if (level == Level::Value || base.kind != JsonValue::Kind::Object || !over.isObject()) {
+        base = over.value();
+        return;
+    }
+    if (level == Level::Shader && changesClass(base, over.value()))
+        std::erase_if(base.members, [](auto const& m) { return m.first == "parameters"; });
+    for (auto const& [key, value] : over.members()) {
+        JsonValue* const old = base.find(key);
+        if (value.kind() == JsonValue::Kind::Null) {
+            if (!old)
+                value.fail("null takes out what an included file has, which is nothing here"
+                           + suggestion(key, keysOf(base)));
+            std::erase_if(base.members, [&name = key](auto const& m) { return m.first == name; });
+        } else if (old) {
+            merge(*old, value, below(level, section, key), level == Level::Scene ? key : section);
+        } else {
+            base.members.emplace_back(key, value.value());
+        }
+    }
+    // Messages about the object as a whole lead to where it was last changed.
+    base.file = over.value().file;
+    base.line = over.value().line;
+}
+
+void refuseNull(JsonReader const& reader)
+{
+    if (reader.kind() == JsonValue::Kind::Null)
+        reader.fail("null takes out what an included file has; here is nothing to take out");
+    if (reader.isObject())
+        for (auto const& [key, member] : reader.members())
+            refuseNull(member);
+}
+
+JsonValue readWithIncludes(fs::path const& file, std::vector<fs::path>& open)
+{
+    JsonValue scene = readJson(file);
+    JsonReader const reader(scene);
+    if (!reader.isObject())
+        reader.failExpected("an object");
+    std::optional<JsonReader> const include = reader.find("include");
+    if (!include)
+        return scene;
+    fs::path const included = include->toFile();
+    open.push_back(fs::weakly_canonical(file));
+    if (std::find(open.begin(), open.end(), fs::weakly_canonical(included)) != open.end())
+        include->fail(included.string() + " includes itself");
+    if (!fs::exists(included))
+        include->fail(included.string() + ": no such file");
+    JsonValue merged = readWithIncludes(included, open);
+    std::erase_if(scene.members, [](auto const& m) { return m.first == "include"; });
+    merge(merged, JsonReader(scene), Level::Scene, {});
+    return merged;
+}
+
+} // namespace
+
+JsonValue readSceneFile(fs::path const& file)
+{
+    std::vector<fs::path> open;
+    JsonValue scene = readWithIncludes(file, open);
+    refuseNull(JsonReader(scene));
+    return scene;
+}
+
+} // namespace zsi::host

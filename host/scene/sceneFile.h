@@ -1,0 +1,14 @@
+/// Scene files put together: one file, and what it includes.
+#pragma once
+
+#include "scene/jsonTree.h"
+
+namespace zsi::host {
+
+/// Reads the scene file and, where it has the key "include", puts it over the file that it names:
+/// values of the file replace those of the included one, name by name and key by key; null takes
+/// a value out. The result has neither "include" nor null. Every value keeps the file that it came
+/// from. Throws InputError for files that are no JSON, cycles, and null where there is nothing.
+JsonValue readSceneFile(std::filesystem::path const& file);
+
+} // namespace zsi::host
