@@ -1,8 +1,10 @@
 // What holds for every entry point of every class, whatever it shades.
+#include "support/parameterWalk.h"
 #include "support/steadyHost.h"
 
 #include <cstddef>
 #include <gtest/gtest.h>
+#include <map>
 #include <thread>
 
 namespace zsi {
@@ -182,6 +184,134 @@ TEST(AnyShader, ThreadsThatShareAnObjectGetTheSameBits)
         for (std::size_t const d : different)
             ASSERT_EQ(d, 0u);
     });
+}
+
+/// Networks of the Ward variants, by the beginning of their parameters' names and the flag that
+/// switches their channel on.
+constexpr std::pair<char const*, char const*> kNetworks[] = {
+    {"_ward_diffuse_color_", "u_diffuseMapEnable"},
+    {"_ward_normal0_map_", "u_normal0MapEnable"},
+    {"_ward_cutout_map_", "u_cutoutMapEnable"},
+};
+
+/// What the name of a parameter says must be set for it to matter. A channel is a group of
+/// parameters whose names begin alike.
+void setUpFor(std::string const& name, test::RecordingManager const& registered)
+{
+    auto const put = [&](std::string const& other, auto value) {
+        for (test::Registered const& row : registered.rows)
+            if (row.name == other && row.name != name)
+                std::memcpy(row.field, &value, sizeof value);
+    };
+    auto const channel = [&](std::string const& ending) {
+        return name.ends_with(ending) ? name.substr(0, name.size() - ending.size()) : "-";
+    };
+    for (char const* ending : {"Map", "MapTransform", "Transform", "Amount"})
+        put(channel(ending) + "MapEnable", true);
+    for (char const* ending : {"Value", "Color", "Reflectivity"})
+        put(channel(ending) + "MapEnable", false);
+    put(channel("Color") + "Mode", 0);
+    for (char const* ending : {"Texture", "UVMatrix"})
+        put(channel(ending) + "Mode", 1);
+    put(channel("TextureMatrix") + "Mode", 2);
+    for (char const* ending : {"AngularRepeat", "TextureMatrixInverse"})
+        put(channel(ending) + "Mode", 4);
+    // A node of a network: its channel is on, and a wall has some whole bricks.
+    for (auto const& [network, flag] : kNetworks)
+        if (name.starts_with(network))
+            put(flag, true);
+    if (std::size_t const tile = name.find("_Tile_"); tile != std::string::npos) {
+        std::string const node = name.substr(0, tile + 6);
+        put(node + "xform", Mat4f::identity());
+        for (char const* parameter : {"useColumnEdit", "useRowEdit", "repeatX", "repeatY"})
+            put(node + parameter, true);
+        for (char const* parameter : {"perColumn", "perRow", "holes"})
+            put(node + parameter, 1);
+        for (char const* parameter : {"brickHeight", "brickWidth", "changeColumn", "changeRow"})
+            put(node + parameter, 0.7f);
+        for (char const* parameter : {"horizontalCount", "verticalCount", "edgeRoughness"})
+            put(node + parameter, 3.0f);
+        for (char const* parameter : {"horizontalGap", "verticalGap"})
+            put(node + parameter, 0.2f);
+    }
+}
+
+/// Parameters that nothing reads: registered for the sake of other materials' scenes, or replaced
+/// by a network.
+std::set<std::string> unread(std::string const& name, test::RecordingManager const& registered)
+{
+    static std::map<std::string, std::set<std::string>> const kClasses{
+        {"corvid_Mtl_Solid", {"reverseNormal", "faceForward"}},
+        {"corvid_Mtl_Mirror",
+         {"ambientOcclusionTexture", "ambientOcclusionMode", "ambientOcclusionFactor",
+          "ambientOcclusionColor", "usePrecalcAO", "showAmbientOnly", "usingRaytracedAO"}},
+        {"corvid_Mtl_AmbientOnly",
+         {"maskingColor", "maskingMode", "maskingTexture", "maskingTextureMatrix",
+          "maskingInvertTexture", "maskingAngularRepeat", "maskingUVMatrix", "maskingFromAlpha"}},
+        {"corvid_Mtl_Dielectric", {"u_glossyValue", "showAmbientOnly"}},
+        {"MarlowLegacy", {}},
+        {"XRite", {}},
+    };
+    if (auto const found = kClasses.find(name); found != kClasses.end())
+        return found->second;
+    std::set<std::string> names{"showAmbientOnly"};
+    for (test::Registered const& row : registered.rows) {
+        if (row.name.starts_with("_ward_diffuse_color_"))
+            names.insert({"u_diffuseMap", "u_diffuseAmount", "u_diffuseTransform"});
+        else if (row.name.starts_with("_ward_normal0_map_"))
+            names.insert("u_normal0Map");
+        else if (row.name.starts_with("_ward_cutout_map_"))
+            names.insert("u_cutoutMap");
+        if (row.name.starts_with("_ward_normal0_map_Noise_xform") && name.ends_with("5ba0bfff"))
+            names.insert("u_normal0Transform"); // noise of the position has no coordinate
+    }
+    return names;
+}
+
+/// Whether changing the parameter changes a result of any entry point, in the set-up that its name
+/// tells, with everything else at random.
+bool matters(std::string const& className, std::size_t row, unsigned tries)
+{
+    for (unsigned seed = 0; seed < tries; ++seed) {
+        auto const one = library().create(className), two = library().create(className);
+        test::RecordingManager const registered(*one), changed(*two);
+        test::Supply supply(seed, false);
+        test::fillParameters(registered, supply, false);
+        setUpFor(registered.rows[row].name, registered);
+        two->copy(one.get());
+        test::changeParameter(changed.rows[row]);
+        ShadeState const before = test::fillRecord(supply);
+        for (test::EntryPointCall const& e : test::kEntryPoints) {
+            if (e.kind != one->getType())
+                continue;
+            auto const run = [&](IShaderBase const& shader) {
+                test::SteadyHost host(seed, false);
+                ShadeState state = before;
+                e.call(shader, &host, state);
+                return bytes(state);
+            };
+            if (run(*one) != run(*two))
+                return true;
+        }
+    }
+    return false;
+}
+
+TEST(AnyShader, EveryParameterMatters)
+{
+    for (std::string const& name : library().classes) {
+        auto const shader = library().create(name);
+        test::RecordingManager const registered(*shader);
+        auto const& rows = registered.rows;
+        std::set<std::string> const dead = unread(name, registered);
+        for (std::size_t i = 0; i < rows.size(); ++i) {
+            if (rows[i].type == "attribute")
+                continue;
+            bool const live = !dead.contains(rows[i].name);
+            // Rough edges of bricks are a thousandth wide and take many tries.
+            EXPECT_EQ(matters(name, i, live ? 5000 : 100), live) << name << " " << rows[i].name;
+        }
+    }
 }
 
 } // namespace

@@ -1,5 +1,4 @@
 #include "environments/BackgroundGeometry.h"
-#include "support/parameterWalk.h"
 #include "support/record.h"
 #include "support/scriptedHost.h"
 
@@ -260,62 +259,6 @@ TEST(BackgroundGeometry, GradesContrastThenGainThenSaturation)
         EXPECT_LT(length(got - Vec3f(maxOf(c.want.x, 0), maxOf(c.want.y, 0), c.want.z)), 2e-6f)
             << c.why;
     }
-}
-
-TEST(BackgroundGeometry, NoParameterIsDead)
-{
-    Picture picture([](Vec2f at) {
-        return Vec4f(0.3f + 0.1f * std::sin(at.x), 0.4f + 0.1f * std::sin(at.y), 0.8f, 1);
-    });
-    Cube cube([](Vec3f d) {
-        return Vec4f(0.5f + 0.3f * std::sin(d.x), 0.6f + 0.3f * std::sin(d.y), 0.9f, 1);
-    });
-    auto const setUp = [&](BackgroundGeometry& s, std::string const& name) {
-        bool const uv = name.ends_with("UVMatrix") || name.ends_with("Texture");
-        bool const angular = name.ends_with("AngularRepeat") || name.ends_with("Inverse");
-        int const mode = uv ? 1 : angular ? 4 : 2;
-        Mat4f const m(0.9f, 0.2f, 0.1f, 0, -0.2f, 1.1f, 0, 0, 0, 0.3f, 1, 0, 0.1f, 0.2f, 0.3f, 1);
-        for (TextureSampler2D* t : {&s.diffuseTexture, &s.specularTexture, &s.bumpTexture})
-            t->texture = &picture;
-        for (TextureSamplerCube* t : {&s.diffuseCube, &s.specularCube, &s.reflectCube})
-            t->texture = &cube;
-        s.diffuseTextureMatrix = s.specularTextureMatrix = s.bumpTextureMatrix =
-            s.bumpTextureMatrixInverse = m;
-        s.diffuseUVMatrix = s.specularUVMatrix = s.bumpUVMatrix = s.globalIBLMatrix = Mat3f(m);
-        s.diffuseMode = s.specularMode = s.bumpMode = mode;
-        if (name == "diffuseColor" || name == "specularColor")
-            s.diffuseMode = s.specularMode = 0;
-        for (Vec3f* gain : {&s.diffuseIBLGainColor, &s.specularIBLGainColor, &s.globalIBLGainColor,
-                            &s.diffuseTextureGainColor, &s.reflectIBLChannelGainColor})
-            *gain = {0.9f, 0.7f, 0.5f};
-        for (int* source :
-             {&s.diffuseIBLGainSource, &s.specularIBLGainSource, &s.diffuseTextureGainSource,
-              &s.globalIBLGainSource, &s.reflectIBLChannelGainSource})
-            *source = 1;
-        if (name.ends_with("Pivot"))
-            s.diffuseIBLContrastValue = s.specularIBLContrastValue = s.globalIBLContrastValue =
-                0.5f;
-    };
-    auto const run = [](BackgroundGeometry const& s) {
-        std::vector<float> results;
-        for (std::uint32_t rayType : {1u, 2u}) {
-            test::ScriptedHost host;
-            host.addLight(normalize(Vec3f(1, 1, 1)), {1, 0.9f, 0.8f}, {0.2f, 0.3f, 0.4f}, 0.6f);
-            host.onOcclusion = [](Vec3f, Vec3f) { return Vec3f(0.7f, 0.8f, 0.9f); };
-            host.onTrace = [](Vec3f, Vec3f d) { return d + Vec3f(2, 2, 2); };
-            ShadeState state = test::plainHit();
-            state.rayType = rayType;
-            state.I = normalize(Vec3f(3, 1, -1));
-            state.Pref = {0.3f, 0.9f, 0.4f};
-            test::setAttribute(state, 0, Vec2f(0.3f, 0.6f));
-            test::setAttribute(state, 8, Vec3f(1, 0.2f, 0));
-            test::setAttribute(state, 20, Vec3f(0, 1, 0.1f));
-            s.shade(&host, state);
-            results.insert(results.end(), {state.Ci.x, state.Ci.y, state.Ci.z});
-        }
-        return results;
-    };
-    EXPECT_EQ(test::deadParameters<BackgroundGeometry>(setUp, run), std::vector<std::string>{});
 }
 
 TEST(BackgroundGeometry, ShadowRaysStopAtGroundThatFacesUp)

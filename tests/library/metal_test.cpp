@@ -1,6 +1,5 @@
 // Metal: energy, reciprocity, sampling, frame, lights and holes.
 #include "materials/physical/corvid_Mtl_Metal.h"
-#include "support/loadedLibrary.h"
 #include "support/lobeSampling.h"
 #include "support/scriptedHost.h"
 
@@ -11,7 +10,7 @@ namespace {
 
 using test::FunctionTexture;
 using test::Vec3d;
-constexpr long kUv1 = 0, kTangent = 36, kUv = 48;
+constexpr long kTangent = 36, kUv = 48;
 
 Vec3d viewAt(double cosine, double azimuth)
 {
@@ -381,142 +380,6 @@ TEST(Metal, HolesShowLetThroughAndAreSampledInTheirShare)
     EXPECT_EQ(s.sampleType, 4u);
     EXPECT_EQ(s.outBrdf, grey(0.5f));
     EXPECT_EQ(s.sampleDirection, s.I);
-}
-
-TEST(Metal, EveryParameterChangesThePicture)
-{
-    using M = corvid_Mtl_Metal;
-    FunctionTexture<Vec2f> map([](Vec2f at) {
-        return Vec4f(0.3f + 0.2f * std::sin(9 * at.x + 4 * at.y), 0.5f, 0.4f, 0.6f);
-    });
-    TextureSampler2D const bound{{&map, 0}};
-    Mat3f const shift(1, 0, 0, 0, 1, 0, 0.3f, 0.1f, 1);
-    Mat4f const depth(1, 0, 0, 0, 0, 1, 0, 0, 0, 0, 1, 0, 0.2f, 0.1f, 0, 1);
-    struct Row {
-        char const* name;
-        std::function<void(M&)> before, change;
-    };
-    auto const nothing = [](M&) {};
-#define MAPPED(channel)                           \
-    [&](M& m) {                                   \
-        m.channel##MapEnable = true;              \
-        m.channel##Map = bound;                   \
-        m.channel##Transform = Mat3f::identity(); \
-    }
-#define CHANNEL(channel)                                                                    \
-    {#channel "MapEnable",                                                                  \
-     [&](M& x) {                                                                            \
-         MAPPED(channel)(x);                                                                \
-         x.channel##MapEnable = false;                                                      \
-     },                                                                                     \
-     [](M& m) { m.channel##MapEnable = true; }},                                            \
-        {#channel "Map", MAPPED(channel), [](M& m) { m.channel##Map = {}; }},               \
-    {                                                                                       \
-#channel "Transform", MAPPED(channel), [&](M & m) { m.channel##Transform = shift; } \
-    }
-#define AMOUNT(channel)                                                             \
-    {                                                                               \
-#channel "Amount", MAPPED(channel), [](M & m) { m.channel##Amount = 0.5f; } \
-    }
-    auto const pattern = [&](M& m) {
-        m.u_patternEnable = true;
-        m.u_patternMap = bound;
-        m.u_patternTransform = Mat3f::identity();
-        m.u_patternAmount = 2;
-    };
-    auto const pyramids = [](M& m) { m.u_bumpSwitcher = 1, m.u_patternAmount = 0.3f; };
-    auto const baked = [&](M& m) { m.ambientOcclusionMode = 1, m.ambientOcclusionTexture = bound; };
-    auto const masked = [&](M& m) {
-        m.maskingMode = 1, m.maskingTexture = bound, m.maskingUVMatrix = Mat3f::identity();
-    };
-    auto const projected = [&](M& m) {
-        m.maskingMode = 4, m.maskingTexture = bound, m.maskingTextureMatrix = Mat4f::identity();
-    };
-    std::vector<Row> const rows = {
-        {"ambientOcclusionTexture", baked, [](M& m) { m.ambientOcclusionTexture = {}; }},
-        {"ambientOcclusionMode", baked, [](M& m) { m.ambientOcclusionMode = 2; }},
-        {"ambientOcclusionFactor", baked, [](M& m) { m.ambientOcclusionFactor = 0.5f; }},
-        {"ambientOcclusionColor", baked,
-         [](M& m) {
-             m.ambientOcclusionColor = {1, 0, 0};
-         }},
-        {"usePrecalcAO", baked, [](M& m) { m.usePrecalcAO = false; }},
-        {"usingRaytracedAO", nothing, [](M& m) { m.usingRaytracedAO = true; }},
-        {"maskingColor", nothing,
-         [](M& m) {
-             m.maskingColor = {0.5f, 0, 0};
-         }},
-        {"maskingMode", masked, [](M& m) { m.maskingMode = -1; }},
-        {"maskingTexture", masked, [](M& m) { m.maskingTexture = {}; }},
-        {"maskingTextureMatrix", projected, [&](M& m) { m.maskingTextureMatrix = depth; }},
-        {"maskingInvertTexture", masked, [](M& m) { m.maskingInvertTexture = true; }},
-        {"maskingAngularRepeat", projected, [](M& m) { m.maskingAngularRepeat = 3; }},
-        {"maskingUVMatrix", masked, [&](M& m) { m.maskingUVMatrix = shift; }},
-        {"maskingFromAlpha", masked, [](M& m) { m.maskingFromAlpha = true; }},
-        {"u_patternEnable",
-         [&](M& m) {
-             pattern(m);
-             m.u_patternEnable = false;
-         },
-         pattern},
-        {"u_patternMap", pattern, [](M& m) { m.u_patternMap = {}; }},
-        {"u_patternTransform", pattern, [&](M& m) { m.u_patternTransform = shift; }},
-        {"u_patternAmount", pattern, [](M& m) { m.u_patternAmount = 1; }},
-        {"u_bumpSwitcher", [](M& m) { m.u_patternAmount = 0.3f; }, pyramids},
-        {"u_uvScale", pyramids, [](M& m) { m.u_uvScale = 3; }},
-        CHANNEL(u_reflect),
-        AMOUNT(u_reflect),
-        {"u_reflectColor", nothing,
-         [](M& m) {
-             m.u_reflectColor = {1, 0, 0};
-         }},
-        CHANNEL(u_edge),
-        AMOUNT(u_edge),
-        {"u_edgeColor", nothing,
-         [](M& m) {
-             m.u_edgeColor = {1, 0, 0};
-         }},
-        CHANNEL(u_rough),
-        AMOUNT(u_rough),
-        {"u_roughValue", nothing, [](M& m) { m.u_roughValue = 0.4f; }},
-        CHANNEL(u_anisotropy),
-        AMOUNT(u_anisotropy),
-        {"u_anisotropyValue", nothing, [](M& m) { m.u_anisotropyValue = 0.3f; }},
-        CHANNEL(u_anisoRotation),
-        {"u_anisoRotationValue", nothing, [](M& m) { m.u_anisoRotationValue = 1; }},
-        CHANNEL(u_cutout),
-        AMOUNT(u_cutout),
-    };
-#undef MAPPED
-#undef CHANNEL
-#undef AMOUNT
-    test::ScriptedHost host;
-    host.addLight(normalize({0.2f, 0.5f, 0.8f}), {1, 1, 1});
-    host.onTrace = [](Vec3f, Vec3f d) { return Vec3f(0.5f + d.x, 0.4f, 0.5f - 0.3f * d.y); };
-    host.onThrough = [](Vec3f, Vec3f) { return Vec4f(0, 0, 1, 0.5f); };
-    host.onOcclusion = [](Vec3f, Vec3f) { return Vec3f(0.5f, 0.6f, 0.7f); };
-    ShadeState s = hitFrom(viewAt(0.6, 0.9));
-    s.Pref = {0.3f, 0.9f, 0.2f};
-    test::setAttribute(s, kUv1, Vec2f(0.2f, 0.7f));
-    test::setAttribute(s, kUv, Vec2f(0.62f, 0.34f));
-    auto const color = [&](M const& m) {
-        m.shade(&host, s);
-        return s.Ci;
-    };
-    for (Row const& row : rows) {
-        M metal;
-        metal.u_anisotropyValue = 0.5f;
-        row.before(metal);
-        Vec4f const was = color(metal);
-        row.change(metal);
-        Vec4f const is = color(metal);
-        EXPECT_GT(length(rgb(is) - rgb(was)) + std::fabs(is.w - was.w), 1e-4f) << row.name;
-    }
-    M metal;
-    std::size_t parameters = 0;
-    for (test::Registered const& row : test::RecordingManager(metal).rows)
-        parameters += row.type != "attribute";
-    EXPECT_EQ(rows.size() + 1, parameters); // showAmbientOnly is for other materials
 }
 
 TEST(Metal, StaysFiniteAtTheEndsOfEveryRange)

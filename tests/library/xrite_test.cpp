@@ -1,5 +1,4 @@
 #include "materials/legacy/XRite.h"
-#include "support/parameterWalk.h"
 #include "support/record.h"
 #include "support/scriptedHost.h"
 
@@ -191,54 +190,6 @@ TEST(CarPaint, FlakeShapeStaysWithTheSurface)
     // 0.05 units of 2048 flakes are 102 cells; a line crosses about 4/pi edges of a Voronoi
     // pattern of unit density per unit length (Moller 1989).
     EXPECT_NEAR(changes, 130, 30);
-}
-
-TEST(CarPaint, NoParameterIsDead)
-{
-    Texture picture([](Vec2f at) {
-        return Vec4f(0.5f + 0.3f * std::sin(9 * at.x), 0.5f + 0.3f * std::cos(9 * at.y), 0.9f,
-                     0.6f);
-    });
-    Cube cube([](Vec3f v) { return Vec4f(0.5f + 0.3f * v.x, 0.6f + 0.3f * v.y, 0.9f, 1); });
-    auto const setUp = [&](XRite& s, std::string const& name) {
-        s.ambientOcclusionTexture.texture = s.maskingTexture.texture =
-            s.flakeNormalTexture.texture = &picture;
-        if (name.ends_with("Cube"))
-            s.diffuseCube.texture = s.specularCube.texture = s.reflectCube.texture = &cube;
-        s.maskingTextureMatrix = Mat4f::identity();
-        s.maskingUVMatrix = Mat3f::identity();
-        if (name.starts_with("masking"))
-            s.maskingMode = name == "maskingColor" ? 0
-                : name.ends_with("AngularRepeat")  ? 4
-                : name.ends_with("TextureMatrix")  ? 2
-                                                   : 1;
-        if (name.starts_with("ambient") || name == "usePrecalcAO")
-            s.ambientOcclusionMode = 1;
-        s.flakeSize = 0.1f;
-        if (name == "maxFlakes")
-            s.flakeSize = 1.0f / 512; // a crowd
-    };
-    auto const run = [](XRite const& s) {
-        std::vector<float> results;
-        for (bool behind : {false, true}) {
-            test::ScriptedHost host;
-            host.addLight(normalize(Vec3f(1, 1, behind ? -2.0f : 2.0f)), {1, 0.9f, 0.8f});
-            host.onOcclusion = [](Vec3f, Vec3f) { return Vec3f(0.7f, 0.8f, 0.9f); };
-            host.onTrace = [](Vec3f, Vec3f v) { return v + Vec3f(2, 2, 2); };
-            host.onIndirect = [](Vec3f, Vec3f n) { return n + Vec3f(2, 2, 2); };
-            ShadeState state = test::plainHit();
-            state.E = {0, 0, 8};
-            state.I = normalize(Vec3f(0.4f, 0.2f, behind ? 1.0f : -1.0f));
-            state.Pref = {0.3f, 0.9f, 0.4f};
-            test::setAttribute(state, 0, Vec2f(0.2f, 0.7f));
-            test::setAttribute(state, 8, Vec4f(0.9f, 0, 0, 0));
-            test::setAttribute(state, 24, Vec2f(0.33f, 0.61f));
-            s.shade(&host, state);
-            results.insert(results.end(), {state.Ci.x, state.Ci.y, state.Ci.z});
-        }
-        return results;
-    };
-    EXPECT_EQ(test::deadParameters<XRite>(setUp, run), std::vector<std::string>{});
 }
 
 } // namespace

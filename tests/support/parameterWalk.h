@@ -3,6 +3,7 @@
 
 #include "support/loadedLibrary.h"
 
+#include <cstring>
 #include <string>
 #include <vector>
 

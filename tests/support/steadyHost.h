@@ -5,6 +5,7 @@
 #include "support/loadedLibrary.h"
 
 #include <array>
+#include <cmath>
 #include <cstring>
 #include <limits>
 #include <random>
@@ -58,7 +59,21 @@ private:
     bool hostile_;
 };
 
-/// Answers depend on the seed and on how many calls came before; equal hosts give equal answers.
+/// Between 0.75 and 1.25, by every number given: what an answer owes to its question.
+template <class... Numbers>
+float wave(Numbers const&... numbers)
+{
+    float phase = 0.0f, k = 3.0f;
+    ((phase += k * numbers, k += 2.0f), ...);
+    return 1.0f + 0.25f * std::sin(phase);
+}
+inline float waveOf(Vec3f const* a, Vec3f const* b, float s = 0.0f)
+{
+    return wave(a->x, a->y, a->z, b->x, b->y, b->z, s);
+}
+
+/// Answers depend on the seed, on how many calls came before and on the question; equal hosts give
+/// equal answers.
 class SteadyHost final : public IShaderAPI {
 public:
     SteadyHost(unsigned seed, bool hostile)
@@ -79,38 +94,53 @@ public:
     {
         return supply_.chance(4) ? nullptr : lights_.data();
     }
-    Vec3f ambientLight(V, V) override { return supply_.vector(); }
-    Vec3f shadowTransmission(V, V) override { return supply_.vector(); }
-    Vec3f traceContinue(int, V, V, float) override { return supply_.vector(); }
-    Vec3f traceReflection(V, V, float) override { return supply_.vector(); }
-    Vec4f traceThrough(V, V, float) override
+    Vec3f ambientLight(V p, V n) override { return color(waveOf(p, n)); }
+    Vec3f shadowTransmission(V from, V to) override { return color(waveOf(from, to)); }
+    Vec3f traceContinue(int, V o, V d, float) override { return color(waveOf(o, d)); }
+    Vec3f traceReflection(V o, V d, float) override { return color(waveOf(o, d)); }
+    Vec4f traceThrough(V o, V d, float) override
     {
-        Vec3f const c = supply_.vector();
+        Vec3f const c = color(waveOf(o, d));
         return {c.x, c.y, c.z, supply_.value()};
     }
-    Vec3f traceSpecular(V, V, float, float) override { return supply_.vector(); }
-    Vec3f traceRefraction(V, V, float, float) override { return supply_.vector(); }
-    Vec3f occlusion(V, V, float) override { return supply_.vector(); }
-    Vec3f indirectDiffuse(V, V, float) override { return supply_.vector(); }
+    Vec3f traceSpecular(V o, V d, float spread, float) override
+    {
+        return color(waveOf(o, d, spread));
+    }
+    Vec3f traceRefraction(V o, V d, float spread, float) override
+    {
+        return color(waveOf(o, d, spread));
+    }
+    Vec3f occlusion(V p, V n, float) override { return color(waveOf(p, n)); }
+    Vec3f indirectDiffuse(V p, V n, float) override { return color(waveOf(p, n)); }
     float random() override { return supply_.uniform(); }
     Vec2f random2D() override
     {
         float const a = supply_.uniform();
         return {a, supply_.uniform()};
     }
-    float cellNoise1D(float) override { return supply_.uniform(); }
-    float noise2D(Vec2f const*) override { return supply_.value(); }
-    float noise3DPoint(V) override { return supply_.value(); }
-    float noise3D(Vec4f const*) override { return supply_.value(); }
-    float noise3DRecord(V) override { return supply_.value(); }
-    Vec3f cellNoise3D(V) override { return supply_.vector(); }
+    float cellNoise1D(float x) override { return 0.8f * supply_.uniform() * wave(x); }
+    float noise2D(Vec2f const* p) override { return supply_.value() * wave(p->x, p->y); }
+    float noise3DPoint(V p) override { return supply_.value() * waveOf(p, p); }
+    float noise3D(Vec4f const* p) override
+    {
+        return supply_.value() * wave(p->x, p->y, p->z, p->w);
+    }
+    float noise3DRecord(V p) override { return supply_.value() * waveOf(p, p); }
+    Vec3f cellNoise3D(V p) override { return color(waveOf(p, p)); }
 
 private:
+    Vec3f color(float brightness)
+    {
+        Vec3f const c = supply_.vector();
+        return {c.x * brightness, c.y * brightness, c.z * brightness};
+    }
+
     Supply supply_;
     std::array<LightSample, 3> lights_;
 };
 
-/// A texture without state: ordinary colours, NaN, or nothing written at all.
+/// A texture without state: colours by the coordinate, NaN, or nothing written at all.
 template <class Coordinate>
 class SteadyTexture final : public HostTexture<Coordinate> {
 public:
@@ -120,10 +150,13 @@ public:
     }
     void reserved0() override { }
     void reserved1() override { }
-    void lookup(Vec4f* result, Coordinate const*) const override
+    void lookup(Vec4f* result, Coordinate const* coordinate) const override
     {
+        float c[3] = {};
+        std::memcpy(c, coordinate, sizeof *coordinate);
+        float const w = wave(c[0], c[1], c[2]);
         if (mood_ == 0)
-            *result = {0.4f, 0.5f, 0.6f, 0.7f};
+            *result = {0.4f * w, 0.5f * w, 0.7f - 0.2f * w, 0.5f * w};
         else if (mood_ == 1)
             result->x = result->w = std::numeric_limits<float>::quiet_NaN();
     }
