@@ -8,6 +8,7 @@ namespace zsi {
 namespace {
 
 using test::D3;
+using test::seenAlong;
 using test::WardOracle;
 
 /// Single precision meets double: the exponent of the lobe reaches about 20 where it still
@@ -137,9 +138,6 @@ TEST(WardOracle, TransmissionIsHoleOrTransparency)
     });
 }
 
-/// Services that answer by position and direction, so that a wrong argument shows.
-Vec3f seenAlong(Vec3f d) { return {0.5f + 0.4f * d.x, 0.5f + 0.4f * d.y, 0.5f + 0.4f * d.z}; }
-
 /// The mirror direction of I about N; where it dips below 0.05 above Ng, the unit vector of that
 /// height between it and N.
 D3 mirrorAbove(D3 I, D3 Ng, D3 N)
@@ -213,9 +211,7 @@ TEST(WardOracle, ShadeSumsLightsRaysAndIndirectLight)
         test::ScriptedHost host;
         for (int i = 0; i < 4; ++i)
             host.addLight(random.unit(), random.color(), random.color(), random.in(0, 1));
-        host.onTrace = [](Vec3f, Vec3f d) { return seenAlong(d); };
-        host.onAmbient = host.onIndirect =
-            host.onOcclusion = [](Vec3f, Vec3f n) { return seenAlong(n); };
+        test::answerByDirection(host);
         D3 const want = shadeOracle(m, s, host);
         m.shade(&host, s);
         expectNear(rgb(s.Ci), want, "colour");

@@ -105,4 +105,12 @@ inline ShadeState plainWardHit()
     return s;
 }
 
+/// Makes the host answer rays and queries by direction, so that a wrong argument shows.
+inline Vec3f seenAlong(Vec3f d) { return grey(0.5f) + d * 0.4f; }
+inline void answerByDirection(ScriptedHost& host)
+{
+    host.onTrace = host.onAmbient = host.onIndirect =
+        host.onOcclusion = [](Vec3f, Vec3f d) { return seenAlong(d); };
+}
+
 } // namespace zsi::test

@@ -16,8 +16,9 @@ struct IndirectDiffuseFunctions {
         Vec3f const kBlack(0.0f, 0.0f, 0.0f);
         if (weight == kBlack)
             return weight;
-        Vec3f const arriving =
-            api->ambientLight(&P, &N) + api->indirectDiffuse(&P, &N, maxComponent(weight));
+        // Two statements: as operands of one sum they would be asked in any order.
+        Vec3f const ambient = api->ambientLight(&P, &N);
+        Vec3f const arriving = ambient + api->indirectDiffuse(&P, &N, maxComponent(weight));
         if (arriving == kBlack)
             return arriving;
         Vec3f const lit = weight * arriving;

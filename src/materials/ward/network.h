@@ -164,10 +164,12 @@ struct Noise {
                           Site const& at)
     {
         auto const& f = part<Noise::template Fields>(shader);
-        return NoiseFunctions().f_Noise(
-            api, state, at.uv, at.position, Color1::evaluate(api, state, shader, at),
-            Color2::evaluate(api, state, shader, at), f.thresholdLow, f.thresholdHigh, f.xform,
-            f.size, f.levels, f.phase, f.type);
+        // Inputs in their order, here and in Tile: as arguments they would come in any.
+        Vec4f const color1 = Color1::evaluate(api, state, shader, at);
+        Vec4f const color2 = Color2::evaluate(api, state, shader, at);
+        return NoiseFunctions().f_Noise(api, state, at.uv, at.position, color1, color2,
+                                        f.thresholdLow, f.thresholdHigh, f.xform, f.size, f.levels,
+                                        f.phase, f.type);
     }
 };
 
@@ -196,9 +198,9 @@ struct Tile {
     {
         Vec2f const footprint =
             uvFootprint(state, shader.attribute_tangent(state), shader.attribute_bitangent(state));
-        return TileFunctions().f_Tile(api, state, at.uv, at.position,
-                                      BrickColor::evaluate(api, state, shader, at),
-                                      MortarColor::evaluate(api, state, shader, at),
+        Vec4f const brick = BrickColor::evaluate(api, state, shader, at);
+        Vec4f const mortar = MortarColor::evaluate(api, state, shader, at);
+        return TileFunctions().f_Tile(api, state, at.uv, at.position, brick, mortar,
                                       part<Tile::template Fields>(shader).tile, footprint);
     }
 };

@@ -32,8 +32,8 @@ struct WardFrameFunctions {
     {
         auto const& s = self();
         frame = computeBaseFrame(Shader::attribute_tangent(state), N, toWorld);
-        if (s.u_normal0MapEnable || s.u_procedureMapEnable != kProcedureNone
-            || s.u_normal1MapEnable) [[unlikely]]
+        if (s.u_normal0MapEnable || isProcedure(s.u_procedureMapEnable) || s.u_normal1MapEnable)
+            [[unlikely]]
             frame = bentFrame(api, state, P, toWorld, frame);
         s.f_anisoRotateFrame(api, state, frame, 0.0f);
     }
@@ -87,7 +87,7 @@ private:
                 * Shader::scalar(state, s.u_normal0AmountMapEnable, s.u_normal0AmountMap,
                                  s.u_normal0AmountTransform, 1.0f, 1.0f);
             bend(frame, s.normal0Heights(api, state, frame, uv, state.Pref), amount);
-        } else if (s.u_procedureMapEnable != kProcedureNone) {
+        } else if (isProcedure(s.u_procedureMapEnable)) {
             perturbByPattern(api, state, P, toWorld, frame);
         }
         if (s.u_normal1MapEnable)
@@ -108,21 +108,22 @@ private:
     {
         auto const& s = self();
         int const kind = s.u_procedureMapEnable;
-        auto const pattern = [&](Vec3f at) {
-            return f_elm_rtpb_XYZGenerator(api, state, kPatternObject, at, toWorld,
-                                           Vec4f(0.0f, 0.0f, 0.0f, 0.0f), s.u_procedureMapTiling,
-                                           Vec3f(-0.6f, -0.6f, 0.5f), 0.0f, 0.0f);
-        };
-        Vec3f const p = pattern(P);
         Vec3f offset(0.0f, 0.0f, 0.0f);
         if (kind == kProcedureNoise) {
-            offset = rippleOffset(api, state, p, frame);
+            offset = castRippleOffset(api, state, P, toWorld, s.u_procedureMapTiling, frame);
         } else {
-            // Slopes in pattern units, so that the tiling changes the size and not the depth.
-            constexpr float kStep = 0.01f;
+            auto const pattern = [&](Vec3f at) {
+                return f_elm_rtpb_XYZGenerator(
+                    api, state, kPatternObject, at, toWorld, Vec4f(0.0f, 0.0f, 0.0f, 0.0f),
+                    s.u_procedureMapTiling, Vec3f(-0.6f, -0.6f, 0.5f), 0.0f, 0.0f);
+            };
+            // Slopes per cell of the pattern: neither its tiling nor its kind changes the depth.
+            constexpr float kStep = 0.1f; // cells
+            float const step = kStep / s.patternFrequency(kind);
+            Vec3f const p = pattern(P);
             float const here = s.patternHeight(api, state, kind, p);
             auto const slope = [&](Vec3f along) {
-                Vec3f const q = p + normalize(pattern(P + along) - p) * kStep;
+                Vec3f const q = p + normalize(pattern(P + along) - p) * step;
                 return (here - s.patternHeight(api, state, kind, q)) / kStep;
             };
             offset.x = slope(frame[0]);

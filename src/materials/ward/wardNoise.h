@@ -14,6 +14,8 @@ enum ProcedureMap : int {
     kProcedureSmoke = 3,
     kProcedureCells = 4,
 };
+/// Whether this value is a pattern; others bend nothing.
+constexpr bool isProcedure(int kind) { return kind >= kProcedureNoise && kind <= kProcedureCells; }
 
 /// Pattern members of a Ward class. Each takes a point in pattern space and gives a height in
 /// 0..1, to be differentiated into a bump.
@@ -26,7 +28,8 @@ struct WardNoiseFunctions {
         Vec3f const q = p * frequency;
         Vec4f const coarse = withAlpha(q, 0.0f);
         Vec4f const fine = withAlpha(q * 2.0f, 0.5f);
-        return (2.0f * api->noise3D(&coarse) + api->noise3D(&fine)) / 3.0f;
+        float const wide = api->noise3D(&coarse);
+        return (2.0f * wide + api->noise3D(&fine)) / 3.0f;
     }
 
     /// Smoke: turbulence, a sum of absolute signed noise (Perlin 1985, "An Image Synthesizer"),
@@ -65,20 +68,26 @@ struct WardNoiseFunctions {
         return std::sqrt(nearest2);
     }
 
-    /// Height of pattern `kind` at `p`; 0 for kinds that are no height pattern.
+    /// Height of a height pattern at `p`.
     float patternHeight(IShaderAPI* api, ShadeState const& state, int kind, Vec3f p) const
     {
         switch (kind) {
         case kProcedureBrush:
-            return f_rtBrushNoise(api, state, p, {0.5f, 40.0f, 40.0f});
+            return f_rtBrushNoise(api, state, p, {0.5f, kBrushFrequency, kBrushFrequency});
         case kProcedureSmoke:
             return f_rtSmokeNoise(api, state, p, {1.0f, 1.0f, 1.0f});
-        case kProcedureCells:
-            return f_rtCellular(api, state, p, {0.9f, 0.9f, 0.9f});
         default:
-            return 0.0f;
+            return f_rtCellular(api, state, p, {0.9f, 0.9f, 0.9f});
         }
     }
+    /// Cells of a height pattern per unit of pattern space, across its features.
+    static constexpr float patternFrequency(int kind)
+    {
+        return kind == kProcedureBrush ? kBrushFrequency : 1.0f;
+    }
+
+private:
+    static constexpr float kBrushFrequency = 40.0f; // streaks 80 times as long as wide
 };
 
 } // namespace zsi

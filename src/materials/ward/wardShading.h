@@ -57,8 +57,7 @@ struct WardShadingFunctions {
             s.f_computeWardLobeColors(api, state, false, false, -v.z, translucent, ignored,
                                       transmit, filter, state.Pref);
             translucent *= filter;
-            if (!(translucent == kBlack))
-                out.lit += translucent * lightBehind(api, state, -N);
+            out.lit += translucent * lightBehind(api, state, -N);
         }
         out.transmissionWeight = transmit;
 
@@ -132,7 +131,8 @@ private:
         Vec3f sum(0.0f, 0.0f, 0.0f);
         for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
              light = light->next)
-            sum += light->color * light->shadow * (light->weight * lightFade(dot(light->L, N)));
+            if (!(light->color == Vec3f(0.0f, 0.0f, 0.0f)))
+                sum += light->color * light->shadow * (light->weight * lightFade(dot(light->L, N)));
         return sum;
     }
 
