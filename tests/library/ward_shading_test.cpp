@@ -1,6 +1,5 @@
-// What the Ward material asks of its host, that all its parameters count, and its bent frames.
+// What the Ward material asks of its host, and its bent frames.
 #include "support/networkOracle.h"
-#include "support/parameterWalk.h"
 #include "support/wardSetup.h"
 
 #include <gtest/gtest.h>
@@ -8,7 +7,7 @@
 namespace zsi {
 namespace {
 
-/// Seen from 45 degrees along x; behind: from the far side.
+/// Seen along x at 53 degrees of height; behind: from the far side.
 ShadeState slantedHit(bool behind)
 {
     ShadeState s = test::plainWardHit();
@@ -75,68 +74,6 @@ TEST(WardShading, AsksTheHostInOrderAndTellsTheWeights)
                 EXPECT_NEAR(got.scalars[k], want[i].scalars[k], 1e-5f);
         }
     }
-}
-
-TEST(WardShading, NoParameterIsDead)
-{
-    test::WardTextures textures;
-    test::FunctionTexture<float> ramp([](float t) { return Vec4f(t * t, 0, 0, 1); });
-    std::string channel;
-    auto const setUp = [&](corvid_Mtl_Ward& s, std::string const& name) {
-        test::Random random;
-        test::randomize(s, random, textures);
-        // Every map is on but for the channel whose plain value is asked.
-        std::string plain = name;
-        for (char const* end : {"Value", "Color", "ivity"})
-            if (name.ends_with(end))
-                plain.resize(name.size() - std::strlen(end));
-        for (test::Registered const& row : test::RecordingManager(s).rows)
-            if (row.name.ends_with("MapEnable") && row.type == "bool")
-                *row.field = row.name != plain + "MapEnable" || name == plain;
-        s.u_transparency = true;
-        s.u_cosineUsesBump = s.u_isMetal = s.u_reflectionHighlightOnly = false;
-        s.u_normal0Amount = s.u_normal1Amount = 20;
-        s.u_imageFadeEnable = name == "u_imageFadeColor" ? 3 : 2;
-        s.u_smokeMap.texture = &ramp;
-        if (name.starts_with("u_procedure") || name == "u_smokeMap") {
-            s.u_normal0MapEnable = false;
-            s.u_procedureMapEnable = kProcedureSmoke;
-        }
-        s.usePrecalcAO = name != "usingRaytracedAO";
-        s.ambientOcclusionMode = 1;
-        if (name.starts_with("masking"))
-            s.maskingMode = name == "maskingColor" ? 0
-                : name.ends_with("AngularRepeat")  ? 4
-                : name.ends_with("TextureMatrix")  ? 2
-                                                   : 1;
-    };
-    auto const run = [](corvid_Mtl_Ward const& m) {
-        std::vector<float> results;
-        for (bool const behind : {false, true}) {
-            test::ScriptedHost host;
-            test::giveNoise(host);
-            test::answerByDirection(host);
-            for (float const z : {0.5f, -0.5f})
-                host.addLight(normalize(Vec3f(0.5f, 0.1f, z)), {1, 0.9f, 0.8f});
-            ShadeState s = slantedHit(behind);
-            test::setAttribute(s, 0, Vec2f(0.3f, 0.8f));
-            test::setAttribute(s, 48, Vec2f(0.7f, 0.4f));
-            s.P = s.Pref = {0.4f, 0.3f, 0.2f};
-            m.shade(&host, s);
-            m.transmission(&host, s);
-            s.sampleDirection = normalize(Vec3f(0.5f, 0.2f, -s.I.z));
-            m.transfer(&host, s);
-            for (Vec3f const v : {rgb(s.Ci), s.transmissionColor, s.outBrdf})
-                results.insert(results.end(), {v.x, v.y, v.z});
-            results.push_back(s.sampleCosine);
-            for (test::Call const& call : host.calls)
-                results.insert(results.end(), call.scalars.begin(), call.scalars.end());
-        }
-        return results;
-    };
-    // The occlusion alone is a display of the host's.
-    EXPECT_EQ(test::deadParameters<corvid_Mtl_Ward>(setUp, run),
-              std::vector<std::string>{"showAmbientOnly"});
 }
 
 TEST(WardShading, AdjustedNormalsAreVisibleOnTheArcOfTheirTilt)
