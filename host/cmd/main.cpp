@@ -24,13 +24,18 @@ std::string explain(CLI::App const& app, CLI::ParseError const& error)
     auto const chosen = app.get_subcommands();
     std::vector<std::string> known;
     if (word.starts_with("-")) {
+        std::string const name = word.substr(0, word.find('='));
         std::vector<CLI::App const*> levels{&app};
         levels.insert(levels.end(), chosen.begin(), chosen.end());
         for (CLI::App const* level : levels)
-            for (CLI::Option const* option : level->get_options())
-                for (std::string const& name : option->get_lnames())
-                    known.push_back("--" + name);
-        std::string const name = word.substr(0, word.find('='));
+            for (CLI::Option const* option : level->get_options()) {
+                if (level != &app && option->check_name(name))
+                    return fmt::format("{}: goes behind the subcommand, zsi {} {}",
+                                       host::printable(name), level->get_name(), name);
+                for (std::string const& longName : option->get_lnames())
+                    if (level == &app || longName != "help")
+                        known.push_back("--" + longName);
+            }
         return fmt::format("{}: unknown option{}", host::printable(name),
                            host::suggestion(name, known));
     }
@@ -48,6 +53,7 @@ int run(int argc, char** argv)
     CLI::App app{"Lists shaders and renders scenes with them."};
     app.name("zsi");
     app.fallthrough();
+    app.option_defaults()->take_last();
     app.set_version_flag("--version",
                          fmt::format("zsi {}, shader interface {}", ZSI_VERSION, kApiVersion));
     std::string shaderPath;
@@ -55,7 +61,7 @@ int run(int argc, char** argv)
                    "Folders with shader libraries, separated by colons. Without it: "
                    "ZSI_SHADER_PATH, else the folder `shaders` beside this program")
         ->type_name("FOLDER[:FOLDER]");
-    Subcommand const subcommands[] = {addInfo(app, shaderPath)};
+    Subcommand const subcommands[] = {addInfo(app, shaderPath), addRender(app, shaderPath)};
     app.footer("Exit status: 0 done, 1 bad input, 2 bad command line, 130 interrupted.");
 
     try {
@@ -68,7 +74,7 @@ int run(int argc, char** argv)
     for (Subcommand const& subcommand : subcommands)
         if (subcommand.app->parsed())
             return subcommand.run();
-    throw UsageError("a subcommand is missing: info (zsi --help)");
+    throw UsageError("a subcommand is missing: info or render (zsi --help)");
 }
 
 } // namespace

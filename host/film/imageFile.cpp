@@ -103,6 +103,7 @@ void writeTo(std::filesystem::path const& file, std::filesystem::path const& goa
     bool const encoded = encoding.type == OIIO::TypeDesc::UINT8;
     spec.attribute("oiio:ColorSpace", encoded ? "sRGB" : "Linear");
     spec.attribute("Software", "zsi");
+    spec.attribute("DateTime", ""); // the same picture is the same file
     if (encoded)
         spec.attribute("oiio:UnassociatedAlpha", 1); // colours go out as they are
     if (file.extension() == ".exr")

@@ -5,10 +5,13 @@
 #include "integrate/tracer.h"
 
 #include <algorithm>
+#include <array>
 #include <chrono>
 #include <mutex>
+#include <optional>
 #include <tbb/blocked_range.h>
 #include <tbb/enumerable_thread_specific.h>
+#include <tbb/global_control.h>
 #include <tbb/parallel_for.h>
 #include <tbb/task_arena.h>
 
@@ -44,7 +47,8 @@ public:
     Vec4f operator()(Tracer& tracer, int x, int y) const
     {
         Sampler sampler(settings_.seed, x, y);
-        Vec4f sum{0, 0, 0, 0};
+        // Double: finite samples never add up to an infinite pixel.
+        std::array<double, 4> sum{};
         int count = 0;
         for (int i = 0; i < settings_.samples; ++i) {
             sampler.start(static_cast<std::uint32_t>(i));
@@ -56,10 +60,15 @@ public:
             Vec4f sample;
             if (!tracer.cameraSample(origin, direction, rasterX, rasterY, sampler, sample))
                 continue;
-            sum = sum + limited(sample);
+            sample = limited(sample);
+            sum[0] += static_cast<double>(sample.x);
+            sum[1] += static_cast<double>(sample.y);
+            sum[2] += static_cast<double>(sample.z);
+            sum[3] += static_cast<double>(sample.w);
             ++count;
         }
-        return count ? sum * (1.0f / static_cast<float>(count)) : sum;
+        auto const mean = [&](double s) { return static_cast<float>(s / std::max(count, 1)); };
+        return {mean(sum[0]), mean(sum[1]), mean(sum[2]), mean(sum[3])};
     }
 
 private:
@@ -95,6 +104,7 @@ Picture render(Scene const& scene, RenderOptions const& options, RenderReport* r
     tbb::enumerable_thread_specific<Tracer> tracers([&] { return Tracer(prepared); });
     std::mutex progressMutex;
     int done = 0;
+    auto const cancelled = [&] { return options.cancel && *options.cancel; };
 
     // Every pixel depends on its own position and the seed alone, never on the order of tiles.
     auto const renderTile = [&](int tile) {
@@ -102,6 +112,8 @@ Picture render(Scene const& scene, RenderOptions const& options, RenderReport* r
         int const left = tile % tilesX * kTile, top = tile / tilesX * kTile;
         for (int y = top; y < std::min(top + kTile, picture.height); ++y)
             for (int x = left; x < std::min(left + kTile, picture.width); ++x) {
+                if (cancelled())
+                    return;
                 Vec4f const c = pixel(tracer, w.x0 + x, w.y0 + y);
                 float* const out =
                     &picture
@@ -117,12 +129,16 @@ Picture render(Scene const& scene, RenderOptions const& options, RenderReport* r
             options.progress(static_cast<double>(++done) / tiles);
         }
     };
+    // Without it an arena gets no more threads than there are processors.
+    std::optional<tbb::global_control> control;
+    if (options.threads > 0)
+        control.emplace(tbb::global_control::max_allowed_parallelism,
+                        static_cast<std::size_t>(options.threads));
     tbb::task_arena arena(options.threads > 0 ? options.threads : tbb::task_arena::automatic);
     arena.execute([&] {
         tbb::parallel_for(tbb::blocked_range<int>(0, tiles, 1), [&](auto const& range) {
             for (int tile = range.begin(); tile != range.end(); ++tile)
-                if (!(options.cancel && *options.cancel))
-                    renderTile(tile);
+                renderTile(tile);
         });
     });
 

@@ -62,9 +62,9 @@ bool Tracer::scatter(PathRay& ray, SurfacePoint const& surface, Path& path)
         next.direction = normalize(state.sampleDirection);
         next.E = surface.P;
         next.origin = start(surface.P, next.direction);
-        bool const front = dot(ray.direction, surface.Ng) <= 0.0f;
-        bool const inwards = dot(next.direction, surface.Ng) < 0.0f;
-        if (state.sampleDirection == ray.direction) { // straight on, as if nothing were there
+        // Straight on, as if nothing were there; a medium's boundary bends even what it hardly
+        // bends.
+        if (state.sampleDirection == ray.direction && !material.ior) {
             next.passes += 1;
             next.type = ray.type == kRayCamera ? std::uint32_t(kRayTransmission) : ray.type;
         } else {
@@ -72,10 +72,7 @@ bool Tracer::scatter(PathRay& ray, SurfacePoint const& surface, Path& path)
             next.type = kRayReflection;
             path.straight = false;
         }
-        if (front && inwards && material.ior)
-            next.media.enter(surface.instance, state.beyondIor);
-        else if (!front && !inwards)
-            next.media.leave(surface.instance);
+        changeMedia(next, ray.direction, surface, material.ior ? &state.beyondIor : nullptr);
     }
     ray = next;
     return survives(ray, path);

@@ -79,6 +79,9 @@ Vec3f Tracer::transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMax)
     ray.direction = direction;
     ray.E = E;
     ray.origin = origin;
+    if (call_ && E == call_->surface.P)
+        changeMedia(ray, call_->ray.direction, call_->surface,
+                    scene_.materialOf(call_->surface).ior);
     Vec3f passed{1, 1, 1};
     for (int i = 0; i < kMaxShadowSurfaces; ++i) {
         Hit hit;
@@ -93,15 +96,12 @@ Vec3f Tracer::transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMax)
         }
         if (passed == Vec3f(0, 0, 0))
             return passed;
-        bool const leaves = dot(direction, surface.Ng) > 0.0f;
-        if (leaves)
-            ray.media.leave(surface.instance);
-        else if (material.ior)
-            ray.media.enter(surface.instance, *material.ior);
+        changeMedia(ray, direction, surface, material.ior);
         // Each stretch between two surfaces is a ray of its own: where the next surface absorbs
         // over the distance from `E`, that is the way inside the medium.
         ray.E = surface.P;
-        ray.origin = offsetPoint(surface.P, leaves ? surface.Ng : -surface.Ng);
+        ray.origin =
+            offsetPoint(surface.P, dot(direction, surface.Ng) > 0.0f ? surface.Ng : -surface.Ng);
         tMax -= hit.t;
         if (!(tMax > 0.0f))
             return passed;
@@ -131,14 +131,7 @@ bool Tracer::child(Vec3f const* origin, Vec3f const* direction, float importance
         ray.importance = kFullImportance;
     }
 
-    SurfacePoint const& s = call_->surface;
-    bool const front = dot(call_->ray.direction, s.Ng) <= 0.0f;
-    bool const inwards = dot(ray.direction, s.Ng) < 0.0f;
-    PreparedMaterial const& material = scene_.materialOf(s);
-    if (front && inwards && material.ior)
-        ray.media.enter(s.instance, *material.ior);
-    else if (!front && !inwards)
-        ray.media.leave(s.instance);
+    changeMedia(ray, call_->ray.direction, call_->surface, scene_.materialOf(call_->surface).ior);
     return true;
 }
 

@@ -141,6 +141,16 @@ void Tracer::fillSurface(PathRay const& ray, SurfacePoint const& s, ShadeState& 
     scene_.fillAttributes(s, state);
 }
 
+void Tracer::changeMedia(PathRay& next, Vec3f arrived, SurfacePoint const& s, float const* ior)
+{
+    bool const front = isFront(arrived, s.Ng);
+    bool const inwards = dot(next.direction, s.Ng) < 0.0f;
+    if (front && inwards && ior)
+        next.media.enter(s.instance, *ior);
+    else if (!front && !inwards)
+        next.media.leave(s.instance);
+}
+
 Vec3f Tracer::finite(Vec3f v)
 {
     if (isFinite(v))

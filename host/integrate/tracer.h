@@ -104,6 +104,9 @@ private:
     bool continuation(Vec3f const* origin, Vec3f const* direction, float importance, PathRay& ray);
     Vec3f traceLobe(Vec3f const* origin, Vec3f const* direction, float spread, float turn,
                     float importance);
+    /// The media of `next`, which leaves `s`, when a ray along `arrived` met it. `ior`: of what
+    /// lies behind the surface, null where it bounds no medium.
+    static void changeMedia(PathRay& next, Vec3f arrived, SurfacePoint const& s, float const* ior);
     Vec3f start(Vec3f origin, Vec3f direction) const;
     Vec3f shadowStart(Vec3f origin, Vec3f direction) const;
     Vec3f gatherNormal(Vec3f P, Vec3f N) const;

@@ -6,6 +6,7 @@
 #include <cmath>
 #include <cstring>
 #include <embree3/rtcore.h>
+#include <tbb/task_arena.h>
 
 namespace zsi::host {
 namespace {
@@ -101,8 +102,7 @@ struct RayScene::Impl {
     std::vector<PreparedInstance> instances;
 
     Impl()
-        // One thread builds: the structure, and with it the order of equal hits, is repeatable.
-        : device(rtcNewDevice("threads=1"), rtcReleaseDevice)
+        : device(rtcNewDevice(nullptr), rtcReleaseDevice)
         , all(nullptr, rtcReleaseScene)
         , opaque(nullptr, rtcReleaseScene)
         , clear(nullptr, rtcReleaseScene)
@@ -113,6 +113,8 @@ struct RayScene::Impl {
         opaque = newScene(device.get());
         clear = newScene(device.get());
     }
+
+    explicit Impl(Scene const& scene);
 
     RTCScene visible(Visibility v) const
     {
@@ -134,10 +136,17 @@ struct RayScene::Impl {
 };
 
 RayScene::RayScene(Scene const& scene)
-    : impl_(std::make_unique<Impl>())
+{
+    // One thread builds: the structure, and with it the order of equal hits, is repeatable. The
+    // device itself would limit the threads of the whole program, not of the build alone.
+    tbb::task_arena(1).execute([&] { impl_ = std::make_unique<Impl>(scene); });
+}
+
+RayScene::Impl::Impl(Scene const& scene)
+    : Impl()
 {
     for (Mesh const& mesh : scene.meshes)
-        impl_->meshes.push_back(buildMesh(impl_->device.get(), mesh));
+        meshes.push_back(buildMesh(device.get(), mesh));
     for (std::size_t i = 0; i < scene.instances.size(); ++i) {
         Instance const& instance = scene.instances[i];
         PreparedInstance prepared{&scene.meshes[static_cast<std::size_t>(instance.mesh)],
@@ -145,14 +154,14 @@ RayScene::RayScene(Scene const& scene)
         // A flattened instance has no inside and no inverse; rays do not meet it.
         if (normalMatrix(instance.objectToWorld, prepared.normalToWorld)) {
             Shader const& material = scene.materials[static_cast<std::size_t>(instance.material)];
-            impl_->attach(instance, static_cast<std::uint32_t>(i),
-                          (material.entryPoints() & kTransmission) != 0);
+            attach(instance, static_cast<std::uint32_t>(i),
+                   (material.entryPoints() & kTransmission) != 0);
         }
-        impl_->instances.push_back(prepared);
+        instances.push_back(prepared);
     }
-    rtcCommitScene(impl_->all.get());
-    rtcCommitScene(impl_->opaque.get());
-    rtcCommitScene(impl_->clear.get());
+    rtcCommitScene(all.get());
+    rtcCommitScene(opaque.get());
+    rtcCommitScene(clear.get());
 }
 
 RayScene::~RayScene() = default;
@@ -215,6 +224,8 @@ SurfacePoint RayScene::surface(Hit const& hit) const
     s.N = normalize(normal[0] * w + normal[1] * hit.u + normal[2] * hit.v);
     if (!(dot(s.N, s.N) > 0.5f)) // opposite normals cancel out
         s.N = s.Ng;
+    if (!(dot(s.Ng, s.Ng) > 0.5f)) // a sliver whose area is too small for a float
+        s.Ng = s.N;
     s.objectN = normalize(interpolate(mesh.normals, corner, hit.u, hit.v));
 
     // The mean of the projections of P onto the corners' tangent planes, as far as P lies below

@@ -1,0 +1,24 @@
+/// Ctrl-C while a picture is made.
+#pragma once
+
+#include <atomic>
+
+namespace zsi::cmd {
+
+/// While one lives, SIGINT and SIGTERM end the program with status 128 + signal, without leaving
+/// anything half-written: at once where nothing is under way, at the next occasion in between
+/// `defer` and the end. One at a time.
+class Interruption {
+public:
+    Interruption();
+    ~Interruption();
+    Interruption(Interruption const&) = delete;
+    Interruption& operator=(Interruption const&) = delete;
+
+    /// From now on a signal only sets the flag that this returns.
+    std::atomic<bool> const& defer();
+    /// 0 when there was no signal, else the exit status that it asks for.
+    int status() const;
+};
+
+} // namespace zsi::cmd
