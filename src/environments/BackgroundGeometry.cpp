@@ -1,6 +1,5 @@
 #include "environments/BackgroundGeometry.h"
 
-#include "environments/iblGrading.h"
 #include "environments/mappedBump.h"
 #include "materials/physical/fresnel.h"
 #include "materials/physical/safeReflect.h"
@@ -26,10 +25,7 @@ Vec3f BackgroundGeometry::bumpedNormal(IShaderAPI* api, ShadeState const& state)
 Vec3f BackgroundGeometry::cube(TextureSamplerCube const& cube, Vec3f direction,
                                ChannelGrade const& grade) const
 {
-    Vec3f const texel = rgb(cube.lookup(cubeCoordinate(rotate(globalIBLMatrix, direction))));
-    ChannelGrade const global{globalIBLContrastPivot, globalIBLContrastValue, globalIBLGainColor,
-                              globalIBLGainSource,    globalIBLGainValue,     globalIBLSatValue};
-    return gradeChannel(gradeChannel(texel, global), grade);
+    return gradeChannel(globalIbl(*this, cube, direction), grade);
 }
 
 /// Light that arrives over the light that would arrive without anything in its way, per channel:

@@ -46,13 +46,7 @@ namespace zsi {
     P(int, diffuseTextureGainSource, (0), "picture: 0 value, 1 colour, 2 colour of luminance")   \
     P(float, diffuseTextureGainValue, (1.0f), "picture: gain")                                   \
     P(float, diffuseTextureSatValue, (1.0f), "picture: saturation, 1 unchanged, 0 grey")         \
-    P(Vec3f, globalIBLContrastPivot, (1.0f, 1.0f, 1.0f), "all cubes: contrast pivot")            \
-    P(float, globalIBLContrastValue, (1.0f), "all cubes: contrast, 1 unchanged")                 \
-    P(Vec3f, globalIBLGainColor, (1.0f, 1.0f, 1.0f), "all cubes: gain colour")                   \
-    P(float, globalIBLSatValue, (1.0f), "all cubes: saturation, 1 unchanged, 0 grey")            \
-    P(int, globalIBLGainSource, (0), "all cubes: 0 value, 1 colour, 2 colour of luminance")      \
-    P(float, globalIBLGainValue, (1.0f), "all cubes: gain")                                      \
-    U(Mat3f, globalIBLMatrix, "rotation of directions before cube lookups")                      \
+    GLOBAL_IBL(P, U, A)                                                                          \
     P(Vec3f, reflectIBLChannelGainColor, (1.0f, 1.0f, 1.0f), "reflectCube: gain colour")         \
     P(int, reflectIBLChannelGainSource, (0), "reflectCube: 0 value, 1 colour, 2 of luminance")   \
     P(float, reflectIBLChannelGainValue, (1.0f), "reflectCube: gain")                            \

@@ -2,7 +2,7 @@
 /// own.
 #pragma once
 
-#include <zsi/vecmath.h>
+#include "environments/iblGrading.h"
 
 namespace zsi {
 
@@ -40,6 +40,25 @@ inline Vec3f gradeChannel(Vec3f c, ChannelGrade const& grade)
     if (grade.saturation != 1.0f)
         c = notBelowZero(c * grade.saturation + grey(luminance(c) * (1.0f - grade.saturation)));
     return c;
+}
+
+/// Rows of the grade that all cubes of a material have, and of their rotation.
+#define GLOBAL_IBL(P, U, A)                                                                 \
+    P(Vec3f, globalIBLContrastPivot, (1.0f, 1.0f, 1.0f), "all cubes: contrast pivot")       \
+    P(float, globalIBLContrastValue, (1.0f), "all cubes: contrast, 1 unchanged")            \
+    P(Vec3f, globalIBLGainColor, (1.0f, 1.0f, 1.0f), "all cubes: gain colour")              \
+    P(float, globalIBLSatValue, (1.0f), "all cubes: saturation, 1 unchanged, 0 grey")       \
+    P(int, globalIBLGainSource, (0), "all cubes: 0 value, 1 colour, 2 colour of luminance") \
+    P(float, globalIBLGainValue, (1.0f), "all cubes: gain")                                 \
+    U(Mat3f, globalIBLMatrix, "rotation of directions before cube lookups")
+
+/// Light from a world direction by a cube of a shader that has these rows, graded for all its
+/// cubes.
+inline Vec3f globalIbl(auto const& s, TextureSamplerCube const& cube, Vec3f const& direction)
+{
+    return gradeChannel(rgb(lookupIbl(cube, s.globalIBLMatrix, direction)),
+                        {s.globalIBLContrastPivot, s.globalIBLContrastValue, s.globalIBLGainColor,
+                         s.globalIBLGainSource, s.globalIBLGainValue, s.globalIBLSatValue});
 }
 
 } // namespace zsi

@@ -6,6 +6,7 @@
 #include "environments/corvid_Env_Default.h"
 #include "lights/voPointLight.h"
 #include "lights/voSpotLight.h"
+#include "materials/legacy/MarlowLegacy.h"
 #include "materials/legacy/XRite.h"
 #include "materials/physical/corvid_Mtl_Dielectric.h"
 #include "materials/physical/corvid_Mtl_Glazing.h"
@@ -52,4 +53,5 @@
     X(corvid_Mtl_Dielectric)    \
     X(corvid_Mtl_Glazing)       \
     X(corvid_Mtl_Metal)         \
+    X(MarlowLegacy)             \
     X(XRite)

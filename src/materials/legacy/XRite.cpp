@@ -17,16 +17,6 @@ constexpr float kPi = 3.14159265f;
 /// Squared width of the coat's highlights: lights are points, and a coat is never quite flat.
 constexpr float kCoatAlpha2 = 0.0016f;
 
-/// Frame about a normal. Duff et al. 2017, "Building an Orthonormal Basis, Revisited". Flakes lie
-/// at random, so it does not matter how it turns about the normal.
-SLArray<Vec3f> frameAbout(Vec3f n)
-{
-    float const s = std::copysign(1.0f, n.z);
-    float const a = -1.0f / (s + n.z);
-    float const b = n.x * n.y * a;
-    return {{{1.0f + s * n.x * n.x * a, s * b, -s * n.x}, {b, s + n.y * n.y * a, -n.y}, n}};
-}
-
 float srgbCurve(float x, float power)
 {
     return x > 0.0031308f ? 1.055f * power - 0.055f : 12.92f * x;
@@ -115,7 +105,7 @@ Vec3f XRite::paint(IShaderAPI* api, ShadeState const& state) const
         return grey(minComponent(occlusion));
 
     Vec3f const n = facedNormal(state, reverseNormal, faceForward);
-    SLArray<Vec3f> const frame = frameAbout(n);
+    SLArray<Vec3f> const frame = frameAbout(n); // flakes lie at random: any turn will do
     Vec3f const v = toLocal(frame, -state.I);
     bool const inside = v.z < 0.0f; // seen from behind, with a normal that is not turned
     Vec3f const upper = inside ? -n : n;

@@ -31,18 +31,22 @@ namespace zsi {
     return orthonormalFrame(transformDirection(toWorld, tangent), N);
 }
 
-/// Gives a frame of a unit normal whose tangent vanished (a mesh without one) any tangent: Duff et
-/// al. 2017, "Building an Orthonormal Basis, Revisited". Other frames stay as they are.
+/// Any frame about a unit normal. Duff et al. 2017, "Building an Orthonormal Basis, Revisited".
+inline SLArray<Vec3f> frameAbout(Vec3f const& N)
+{
+    float const s = std::copysign(1.0f, N.z);
+    float const a = -1.0f / (s + N.z);
+    float const b = N.x * N.y * a;
+    return {{{1.0f + s * N.x * N.x * a, s * b, -s * N.x}, {b, s + N.y * N.y * a, -N.y}, N}};
+}
+
+/// Gives a frame of a unit normal whose tangent vanished (a mesh without one) any tangent. Other
+/// frames stay as they are.
 inline void orthonormalTangent(SLArray<Vec3f>& frame)
 {
     if (dot(frame[0], frame[0]) > 0.0f) [[likely]]
         return;
-    Vec3f const N = frame[2];
-    float const s = std::copysign(1.0f, N.z);
-    float const a = -1.0f / (s + N.z);
-    float const b = N.x * N.y * a;
-    frame[0] = {1.0f + s * N.x * N.x * a, s * b, -s * N.x};
-    frame[1] = {b, s + N.y * N.y * a, -N.y};
+    frame = frameAbout(frame[2]);
 }
 
 /// World direction in local coordinates.
