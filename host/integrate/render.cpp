@@ -122,7 +122,7 @@ Picture render(Scene const& scene, RenderOptions const& options, RenderReport* r
                 out[0] = c.x;
                 out[1] = c.y;
                 out[2] = c.z;
-                out[3] = c.w;
+                out[3] = scene.film.alpha ? c.w : 1.0f;
             }
         if (options.progress) {
             std::lock_guard const lock(progressMutex);

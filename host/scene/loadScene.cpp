@@ -53,7 +53,7 @@ Camera readCamera(JsonReader const& reader)
 
 Film readFilm(JsonReader const& reader)
 {
-    reader.expectKeys({"width", "height", "exposure", "crop"});
+    reader.expectKeys({"width", "height", "exposure", "alpha", "crop"});
     Film film;
     if (auto const v = reader.find("width"))
         film.width = v->toInt(1, kLargestFilm);
@@ -61,6 +61,8 @@ Film readFilm(JsonReader const& reader)
         film.height = v->toInt(1, kLargestFilm);
     if (auto const v = reader.find("exposure"))
         film.exposure = v->toFloat(-64, 64);
+    if (auto const v = reader.find("alpha"))
+        film.alpha = v->toBool();
     if (auto const v = reader.find("crop")) {
         std::vector<JsonReader> const items = v->items();
         if (items.size() != 4)

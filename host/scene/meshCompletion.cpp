@@ -68,7 +68,7 @@ void dropBadTriangles(Mesh& mesh, std::vector<std::string>& warnings)
             if (!isFinite(mesh.positions[i]))
                 return ++notFinite, true;
         Vec3f const c = faceCross(mesh, t);
-        if (!isFinite(c))
+        if (!std::isfinite(length(c)))
             return ++notFinite, true;
         return isDirection(c) ? false : (++flat, true);
     });

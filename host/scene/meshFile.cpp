@@ -26,11 +26,11 @@ std::string extensionOf(std::filesystem::path const& file)
 
 Vec3f toVec3f(aiVector3D const& v) { return {v.x, v.y, v.z}; }
 
-std::vector<Vec3f> toVec3fs(aiVector3D const* values, unsigned count)
+std::vector<Vec3f> transformed(aiVector3D const* values, unsigned count, aiMatrix3x3 const& matrix)
 {
     std::vector<Vec3f> result;
     for (unsigned i = 0; values && i < count; ++i)
-        result.push_back(toVec3f(values[i]));
+        result.push_back(toVec3f(matrix * values[i]));
     return result;
 }
 
@@ -42,22 +42,51 @@ std::vector<Vec2f> toUv(aiVector3D const* values, unsigned count)
     return result;
 }
 
-Mesh toMesh(aiMesh const& part)
+Mesh toMesh(aiMesh const& part, aiMatrix4x4 const& toWorld)
 {
+    aiMatrix3x3 const linear(toWorld);
+    bool const mirrored = linear.Determinant() < 0.0f;
+    aiMatrix3x3 normalMatrix(linear);
+    normalMatrix.Inverse().Transpose(); // not finite for a flattened part, which has no area
+
     Mesh mesh;
-    mesh.positions = toVec3fs(part.mVertices, part.mNumVertices);
-    mesh.normals = toVec3fs(part.mNormals, part.mNumVertices);
-    mesh.tangents = toVec3fs(part.mTangents, part.mNumVertices);
-    mesh.bitangents = toVec3fs(part.mBitangents, part.mNumVertices);
+    for (unsigned i = 0; i < part.mNumVertices; ++i)
+        mesh.positions.push_back(toVec3f(toWorld * part.mVertices[i]));
+    mesh.normals = transformed(part.mNormals, part.mNumVertices, normalMatrix);
+    mesh.tangents = transformed(part.mTangents, part.mNumVertices, linear);
+    mesh.bitangents = transformed(part.mBitangents, part.mNumVertices, linear);
     mesh.uv = toUv(part.mTextureCoords[0], part.mNumVertices);
     mesh.uv1 = toUv(part.mTextureCoords[1], part.mNumVertices);
     if (aiColor4D const* const colors = part.mColors[0])
         for (unsigned i = 0; i < part.mNumVertices; ++i)
             mesh.colors.emplace_back(colors[i].r, colors[i].g, colors[i].b, colors[i].a);
     for (unsigned i = 0; i < part.mNumFaces; ++i)
-        if (aiFace const& face = part.mFaces[i]; face.mNumIndices == 3)
-            mesh.triangles.push_back({face.mIndices[0], face.mIndices[1], face.mIndices[2]});
+        if (aiFace const& face = part.mFaces[i]; face.mNumIndices == 3) {
+            unsigned const* const corner = face.mIndices;
+            // A mirror turns faces inside out.
+            mesh.triangles.push_back(
+                {corner[0], corner[mirrored ? 2 : 1], corner[mirrored ? 1 : 2]});
+        }
     return mesh;
+}
+
+/// The meshes of all nodes at their places.
+std::vector<Mesh> placedParts(aiScene const& scene)
+{
+    std::vector<Mesh> parts;
+    std::vector<std::pair<aiNode const*, aiMatrix4x4>> open{{scene.mRootNode, {}}};
+    while (!open.empty()) {
+        auto const [node, parentToWorld] = open.back();
+        open.pop_back();
+        aiMatrix4x4 const toWorld = parentToWorld * node->mTransformation;
+        for (unsigned i = 0; i < node->mNumMeshes; ++i)
+            if (Mesh part = toMesh(*scene.mMeshes[node->mMeshes[i]], toWorld);
+                !part.triangles.empty())
+                parts.push_back(std::move(part));
+        for (unsigned i = node->mNumChildren; i-- > 0;) // the first child is taken next
+            open.emplace_back(node->mChildren[i], toWorld);
+    }
+    return parts;
 }
 
 template <class Value>
@@ -126,17 +155,14 @@ Mesh readMeshFile(std::filesystem::path const& file)
     Assimp::Importer importer;
     importer.SetPropertyInteger(AI_CONFIG_PP_SBP_REMOVE,
                                 aiPrimitiveType_POINT | aiPrimitiveType_LINE);
-    aiScene const* const scene = importer.ReadFile(
-        file.string(),
-        aiProcess_ValidateDataStructure | aiProcess_Triangulate | aiProcess_SortByPType
-            | aiProcess_PreTransformVertices | aiProcess_JoinIdenticalVertices);
-    if (!scene)
+    aiScene const* const scene =
+        importer.ReadFile(file.string(),
+                          aiProcess_ValidateDataStructure | aiProcess_Triangulate
+                              | aiProcess_SortByPType | aiProcess_JoinIdenticalVertices);
+    if (!scene || !scene->mRootNode)
         throw InputError(fmt::format("{}: cannot be read as a mesh: {}", file.string(),
                                      importer.GetErrorString()));
-    std::vector<Mesh> parts;
-    for (unsigned i = 0; i < scene->mNumMeshes; ++i)
-        if (Mesh part = toMesh(*scene->mMeshes[i]); !part.triangles.empty())
-            parts.push_back(std::move(part));
+    std::vector<Mesh> parts = placedParts(*scene);
     return joined(parts);
 }
 

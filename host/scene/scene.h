@@ -56,6 +56,7 @@ struct Film {
     int height = 360;
     std::optional<std::array<int, 4>> crop; ///< x0, y0, x1, y1 in pixels, end exclusive
     float exposure = 0.0f; ///< stops, applied to 8-bit output only
+    bool alpha = true; ///< false: the picture is opaque, whatever the shaders say
 };
 
 struct Settings {

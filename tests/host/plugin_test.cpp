@@ -1,6 +1,6 @@
-#include "base/error.h"
 #include "plugin/shaderLibrary.h"
 #include "plugin/symbolTable.h"
+#include "support/inputError.h"
 #include "support/temporaryFolder.h"
 
 #include <cstdlib>
@@ -12,26 +12,12 @@ namespace zsi::host {
 namespace {
 
 namespace fs = std::filesystem;
+using test::errorOf;
+using test::expectContains;
 
 fs::path fixture(std::string const& name)
 {
     return fs::path(ZSI_FIXTURE_DIR) / name / (name + ".so");
-}
-
-std::string errorOf(auto&& action)
-{
-    try {
-        action();
-    } catch (InputError const& error) {
-        return error.what();
-    }
-    return "no error";
-}
-
-void expectContains(std::string const& message, std::vector<std::string> const& parts)
-{
-    for (std::string const& part : parts)
-        EXPECT_NE(message.find(part), std::string::npos) << '"' << part << "\" in: " << message;
 }
 
 TEST(Plugin, FindsAndDescribesTheClassesOfAnyLibrary)
