@@ -1,6 +1,7 @@
 /// What one scalar call costs at the very least, for the arithmetic that the formulas ask for:
 /// hand-written kernels that the library's stand beside.
 #include "harness.h"
+#include "materials/physical/facetLossTable.h"
 
 #include <algorithm>
 #include <cstring>
@@ -247,6 +248,121 @@ BENCH_NOINLINE float glass_sample_world(Glass const& g, float const* m, V3 I, V3
     return w;
 }
 
+// ---- anisotropic GGX metal -------------------------------------------------------------
+
+// Conductor Fresnel, height-correlated masking, and the light that bounces further from the
+// library's tables of what one bounce loses.
+struct Metal {
+    float rough = 0.3f, anisotropy = 1;
+    V3 r0 = {0.95f, 0.64f, 0.54f}, edge = {1, 0.9f, 0.8f};
+};
+inline V3 notBelow0(V3 a) { return {std::max(a.x, 0.f), std::max(a.y, 0.f), std::max(a.z, 0.f)}; }
+inline float lerp(float a, float b, float t) { return a + t * (b - a); }
+struct Cell {
+    int node;
+    float share;
+    Cell(float x, int last)
+        : node(std::min(static_cast<int>(x), last))
+        , share(x - static_cast<float>(node))
+    {
+    }
+};
+inline float pow5(float k)
+{
+    float k2 = k * k;
+    return k2 * k2 * k;
+}
+struct MetalSeen { // a metal from the direction v
+    float ax, ay, wide, rootWide, stretchedV, lossV, broad;
+    bool even;
+    Cell width, ratio;
+    V3 v, r0, bump, further;
+
+    MetalSeen(Metal const& m, V3 v_)
+        : ax(std::min(std::max(m.rough, 0.001f), 1.f))
+        , ay(std::min(std::max(ax * m.anisotropy, 0.001f), 1.f))
+        , wide(std::max(ax, ay))
+        , rootWide(std::sqrt(wide))
+        , even(ax == ay)
+        , width(rootWide * 6, 5)
+        , ratio(even ? 3 : (std::min(ax, ay) / wide - 0.1f) * (3 / 0.9f), 2)
+        , v(v_)
+        , r0(m.r0)
+    {
+        constexpr float c = 1 / 7.f, k = (6 / 7.f) * (6 / 7.f) * (6 / 7.f) * (6 / 7.f) * (6 / 7.f);
+        V3 one = {1, 1, 1};
+        bump = (r0 * (1 - k) + one * k) * (one - m.edge) * (1 / (c * (1 - c) * k));
+        stretchedV = stretched(v);
+        lossV = loss(v);
+        Cell w(rootWide * 12, 11);
+        float const* t = &zsi::kMeanFacetLoss[w.node][ratio.node];
+        float lost =
+            wide * lerp(lerp(t[0], t[1], ratio.share), lerp(t[4], t[5], ratio.share), w.share);
+        V3 mean = notBelow0(r0 * (20 / 21.f) + one * (1 / 21.f) - bump * (1 / 126.f));
+        V3 rest = one - mean * lost;
+        V3 F2 = mean * mean * (1 - lost);
+        further = {F2.x / rest.x, F2.y / rest.y, F2.z / rest.z};
+        broad = lossV > 0 ? lossV * kInvPi / lost : 0;
+    }
+    float stretched(V3 w) const
+    {
+        float x = ax * w.x, y = ay * w.y;
+        return std::sqrt(x * x + y * y + w.z * w.z);
+    }
+    float loss(V3 w) const
+    {
+        constexpr int kStepWidth = 4 * 9 * 5, kStepRatio = 9 * 5, kStepCosine = 5;
+        Cell c(w.z * (1 + wide) / (w.z + wide) * 8, 7);
+        float const* t = &zsi::kFacetLoss[width.node][0][c.node][0];
+        auto cosines = [&](float const* p) { return lerp(p[0], p[kStepCosine], c.share); };
+        if (even) {
+            t += 3 * kStepRatio;
+            return lerp(cosines(t), cosines(t + kStepWidth), width.share);
+        }
+        Cell a(std::fabs(ax >= ay ? w.x : w.y) / std::sqrt(w.x * w.x + w.y * w.y) * 4, 3);
+        t += ratio.node * kStepRatio + a.node;
+        auto azimuths = [&](float const* p) { return lerp(cosines(p), cosines(p + 1), a.share); };
+        auto ratios = [&](float const* p) {
+            return lerp(azimuths(p), azimuths(p + kStepRatio), ratio.share);
+        };
+        return lerp(ratios(t), ratios(t + kStepWidth), width.share);
+    }
+    V3 fresnel(float c) const
+    {
+        float k = pow5(1 - c);
+        return notBelow0(r0 * (1 - k) + V3{k, k, k} - bump * (c * (1 - c) * k));
+    }
+    // density: of facets whose normal is the half vector of v and l
+    V3 value(V3 l, float& density) const
+    {
+        V3 h = v + l;
+        float hh = dot(h, h), x = h.x / ax, y = h.y / ay, r = hh / (x * x + y * y + h.z * h.z);
+        density = r * r / (kPi * ax * ay);
+        float once = density * (0.5f / (v.z * stretched(l) + l.z * stretchedV));
+        V3 single = fresnel(std::min(0.5f * std::sqrt(hh), 1.f)) * once;
+        return single + further * (broad * loss(l));
+    }
+    float sample(float pick, float u1, float u2, V3& l, V3& out) const
+    {
+        float s, c;
+        sincosf(6.283185f * u1, &s, &c);
+        if (pick < lossV) {
+            float r = std::sqrt(u2);
+            l = {r * c, r * s, std::sqrt(1 - u2)};
+        } else {
+            float k = 1 / stretchedV, vz = v.z * k, z = (1 - u2) * (1 + vz) - vz;
+            float r = std::sqrt(std::max(0.f, 1 - z * z));
+            V3 h = {(r * c + ax * v.x * k) * ax, (r * s + ay * v.y * k) * ay, z + vz};
+            l = h * (2 * dot(v, h) / dot(h, h)) - v;
+            if (!(l.z > 0))
+                return 0;
+        }
+        float density;
+        out = value(l, density);
+        return (1 - lossV) * density / (2 * (v.z + stretchedV)) + lossV * l.z * kInvPi;
+    }
+};
+
 // ---- the same roads through the library's kind of entry point ---------------------------
 // A virtual call that reads its inputs from one big record and writes its results there;
 // random numbers and light come from virtual host services. This is the floor of an entry
@@ -355,6 +471,40 @@ struct GlassEntry final : Entry {
     }
 };
 
+struct MetalEntry final : Entry {
+    Metal m;
+    void transfer(Host*, Record& r) const override
+    {
+        Frame f = frame(r.toWorld, r.N, r.tangent);
+        V3 v = f.in(r.I * -1), l = f.in(r.direction);
+        r.cosine = 0;
+        r.brdf = {0, 0, 0};
+        if (!(v.z > 0 && l.z > 0))
+            return;
+        float ignored;
+        r.brdf = MetalSeen(m, v).value(l, ignored);
+        r.cosine = l.z;
+    }
+    void sample(Host* h, Record& r) const override
+    {
+        Frame f = frame(r.toWorld, r.N, r.tangent);
+        V3 v = f.in(r.I * -1);
+        r.type = 0;
+        if (!(v.z > 0))
+            return;
+        float u1, u2, pick = h->random();
+        h->random2(&u1, &u2);
+        V3 l;
+        float pdf = MetalSeen(m, v).sample(pick, u1, u2, l, r.brdf);
+        if (!(pdf > 0))
+            return;
+        r.direction = f.out(l);
+        r.cosine = l.z;
+        r.invPdf = 1 / pdf;
+        r.type = 2;
+    }
+};
+
 // ---- lights and environment ---------------------------------------------------------
 
 struct Spot {
@@ -401,7 +551,9 @@ Spot g_spot;
 Grade g_grade;
 WardEntry g_wardEntry;
 GlassEntry g_glassEntry;
-Entry *g_entryWard = &g_wardEntry, *g_entryGlass = &g_glassEntry;
+MetalEntry g_metalEntry, g_brushedEntry;
+Entry *g_entryWard = &g_wardEntry, *g_entryGlass = &g_glassEntry, *g_entryMetal = &g_metalEntry,
+      *g_entryBrushed = &g_brushedEntry;
 Light g_lights[4] = {{{0, 0, 1}, {1, 0.9f, 0.8f}, {1, 1, 1}, &g_lights[1]},
                      {{0.6f, 0, 0.8f}, {0.5f, 0.9f, 0.8f}, {1, 1, 1}, &g_lights[2]},
                      {{0, -0.8f, 0.6f}, {1, 0.4f, 0.8f}, {0.5f, 1, 1}, &g_lights[3]},
@@ -430,6 +582,7 @@ void registerFloors()
     g_service = &g_serviceA;
     std::memcpy(g_record.toWorld, toWorld, sizeof toWorld);
     g_host->lights = g_lights;
+    g_brushedEntry.m.anisotropy = 2.5f;
 #define FLOOR(NAME, EXPR) \
     add("floor." NAME,    \
         [](Item const* it, int n) { return each(it, n, [](Item const& i) -> float { EXPR }); })
@@ -468,6 +621,14 @@ void registerFloors()
           g_entryGlass->transfer(g_host, r); return r.brdf.x;);
     FLOOR("ggx_dielectric_sample_entry", Record& r = fill(i, i.wtW);
           g_entryGlass->sample(g_host, r); return r.brdf.x + r.direction.x;);
+    FLOOR("metal_transfer_entry", Record& r = fill(i, i.wiW); g_entryMetal->transfer(g_host, r);
+          return r.cosine + sum(r.brdf););
+    FLOOR("metal_sample_entry", Record& r = fill(i, i.wiW); g_entryMetal->sample(g_host, r);
+          return r.invPdf + r.direction.x + sum(r.brdf););
+    FLOOR("metal_brushed_transfer_entry", Record& r = fill(i, i.wiW);
+          g_entryBrushed->transfer(g_host, r); return r.cosine + sum(r.brdf););
+    FLOOR("metal_brushed_sample_entry", Record& r = fill(i, i.wiW);
+          g_entryBrushed->sample(g_host, r); return r.invPdf + r.direction.x + sum(r.brdf););
     FLOOR("spot_light", return sum(spot(g_spot, i.woW, i.n, 100 * i.u[0])););
     FLOOR("environment_grading", return sum(environment(g_grade, i.woW, i.n)););
 #undef FLOOR

@@ -5,6 +5,7 @@
 #include "neutralHost.h"
 
 #include <memory>
+#include <string>
 
 namespace bench {
 namespace {
@@ -23,7 +24,7 @@ struct Setup {
     ShadeState state = neutralRecord();
     long tangent;
 
-    Setup(void* library, char const* className, int lights = 4)
+    Setup(void* library, char const* className, int lights)
         : shader(library, className)
         , host(lights)
         , tangent(shader.attributeOffset("tangent"))
@@ -44,10 +45,10 @@ struct Setup {
 
 /// Registers a loop over one entry point; `configure` sets parameters.
 template <class Configure, class Call>
-void kernel(void* library, char const* name, char const* className, Configure configure, Call call,
-            int lights = 4)
+void kernel(void* library, std::string const& name, std::string const& className,
+            Configure configure, Call call, int lights = 4)
 {
-    auto const setup = std::make_shared<Setup>(library, className, lights);
+    auto const setup = std::make_shared<Setup>(library, className.c_str(), lights);
     configure(setup->shader);
     add(name, [setup, call](Item const* it, int n) {
         return each(it, n, [&](Item const& i) -> float { return call(*setup, i); });
@@ -73,6 +74,13 @@ constexpr auto kSample = [](Setup& s, Item const& i) {
 };
 constexpr auto kShade = [](Setup& s, Item const& i) {
     ShadeState& r = s.fill(i, i.wiW);
+    s.shader.material()->shade(&s.host, r);
+    return r.Ci.x + r.Ci.y + r.Ci.z;
+};
+/// All lights stand where the item's `wi` points, so that almost none is below the horizon.
+constexpr auto kShadeLit = [](Setup& s, Item const& i) {
+    ShadeState& r = s.fill(i, i.wiW);
+    s.host.aimLights(r.sampleDirection);
     s.shader.material()->shade(&s.host, r);
     return r.Ci.x + r.Ci.y + r.Ci.z;
 };
@@ -112,6 +120,54 @@ void registerLightsAndEnvironments(void* library)
     kernel(library, "zsi.environment.flat", "corvid_Env_Default", graded, ray(zsi::kRayCamera));
 }
 
+void registerPhysical(void* library)
+{
+    auto const tinted = [](LoadedShader& s) { s.set("u_tintColor", Vec3f(0.9f, 0.8f, 0.7f)); };
+    kernel(library, "zsi.mirror.sample", "corvid_Mtl_Mirror", tinted, kSample);
+    kernel(library, "zsi.glazing.sample", "corvid_Mtl_Glazing", kDefaults, kSample);
+
+    auto const rough = [](LoadedShader& s) { s.set("u_roughValue", 0.2f); };
+    kernel(library, "zsi.dielectricRough.transfer", "corvid_Mtl_Dielectric", rough, kTransferBoth);
+    kernel(library, "zsi.dielectricRough.sample", "corvid_Mtl_Dielectric", rough, kSample);
+    kernel(library, "zsi.dielectricSmooth.sample", "corvid_Mtl_Dielectric", kDefaults, kSample);
+
+    auto const satin = [](LoadedShader& s) {
+        s.set("u_reflectColor", Vec3f(0.95f, 0.64f, 0.54f))
+            .set("u_edgeColor", Vec3f(1, 0.9f, 0.8f));
+        s.set("u_roughValue", 0.3f);
+    };
+    auto const brushed = [=](LoadedShader& s) {
+        satin(s);
+        s.set("u_anisotropyValue", 2.5f);
+    };
+    kernel(library, "zsi.metal.transfer", "corvid_Mtl_Metal", satin, kTransferReflect);
+    kernel(library, "zsi.metal.sample", "corvid_Mtl_Metal", satin, kSample);
+    kernel(library, "zsi.metalBrushed.transfer", "corvid_Mtl_Metal", brushed, kTransferReflect);
+    kernel(library, "zsi.metalBrushed.sample", "corvid_Mtl_Metal", brushed, kSample);
+}
+
+void registerWard(void* library)
+{
+    auto const satin = [](LoadedShader& s) {
+        s.set("u_diffuseColor", Vec3f(0.6f, 0.5f, 0.4f));
+        s.set("u_specularColor", Vec3f(0.9f, 0.8f, 0.7f));
+        s.set("u_roughValue", 0.1f).set("u_anisotropyValue", 2.5f);
+        s.set("u_brdf00Reflectivity", 0.05f).set("u_brdf90Reflectivity", 1.0f);
+        s.set("u_brdfCurvePower", 5.0f).set("u_reflectivity", 0.8f);
+    };
+    auto const all = [&](std::string const& name, std::string const& className) {
+        kernel(library, name + ".transfer", className, satin, kTransferReflect);
+        kernel(library, name + ".sample", className, satin, kSample);
+        kernel(library, name + ".shade", className, satin, kShade);
+    };
+    all("zsi.ward", "corvid_Mtl_Ward");
+    kernel(library, "zsi.ward.shade4lit", "corvid_Mtl_Ward", satin, kShadeLit, 4);
+    kernel(library, "zsi.ward.shade5lit", "corvid_Mtl_Ward", satin, kShadeLit, 5);
+    for (char const* variant : {"120b7820", "33632204", "5592d496", "5ba0bfff", "82261344",
+                                "aa598cb4", "b9aac246", "ccb3a2e6", "f05db29e"})
+        all(std::string("zsi.ward_") + variant, std::string("corvid_Mtl_Ward_") + variant);
+}
+
 } // namespace
 
 void registerLibrary(char const* sharedObject)
@@ -122,6 +178,8 @@ void registerLibrary(char const* sharedObject)
         std::exit(1);
     }
     registerLightsAndEnvironments(library);
+    registerPhysical(library);
+    registerWard(library);
 }
 
 } // namespace bench

@@ -25,6 +25,11 @@ public:
         }
         head_ = count > 0 ? lights_ : nullptr;
     }
+    void aimLights(zsi::Vec3f direction)
+    {
+        for (zsi::LightSample* l = head_; l; l = l->next)
+            l->L = direction;
+    }
 
     using V = zsi::Vec3f const*;
     zsi::LightSample* getLightSamples(int, V, V) override { return head_; }

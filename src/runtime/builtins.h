@@ -44,6 +44,9 @@ inline float sl_lib_log10(float x)
     return std::log(x) * fInvLog10;
 }
 
+/// The same vector copied float by float: GCC takes a copy of the block through memory.
+constexpr Vec3f scalars(Vec3f const& v) { return {v.x, v.y, v.z}; }
+
 /// -1 where the ray meets the side that `Ng` points to, +1 on the far side, 0 edge on.
 inline float facingSign(Vec3f const& I, Vec3f const& Ng) { return sign(dot(I, Ng)); }
 

@@ -17,6 +17,10 @@ constexpr Vec3f kBlack(0.0f, 0.0f, 0.0f);
 /// polished metal needs no case of its own.
 constexpr float kLeastWidth = 0.001f;
 
+/// [0, 1]; NaN becomes 0.
+float unitRange(float t) { return minOf(maxOf(t, 0.0f), 1.0f); }
+Vec3f unitRange(Vec3f c) { return {unitRange(c.x), unitRange(c.y), unitRange(c.z)}; }
+
 float greyOf(Vec4f c) { return (c.x + c.y + c.z) * 0.3333333f; }
 
 } // namespace
@@ -39,8 +43,9 @@ void corvid_Mtl_Metal::bendByFacets(IShaderAPI* api, ShadeState const& state,
     reorthogonalize(frame);
 }
 
-[[gnu::noinline]] void corvid_Mtl_Metal::bendFrame(IShaderAPI* api, ShadeState const& state,
-                                                   SLArray<Vec3f>& frame) const
+/// By value, so that a frame that nothing bends need not be in memory.
+[[gnu::noinline]] SLArray<Vec3f>
+corvid_Mtl_Metal::bentFrame(IShaderAPI* api, ShadeState const& state, SLArray<Vec3f> frame) const
 {
     if (u_patternEnable) {
         f_rtBumpPerturb(api, state, frame, attribute_uv(state), u_patternMap, u_patternTransform,
@@ -49,16 +54,17 @@ void corvid_Mtl_Metal::bendByFacets(IShaderAPI* api, ShadeState const& state,
     }
     if (u_bumpSwitcher == 1)
         bendByFacets(api, state, frame);
+    return frame;
 }
 
 void corvid_Mtl_Metal::f_computeShadingFrameNative(IShaderAPI* api, ShadeState const& state,
-                                                          Vec3f const&, Vec3f const& N,
-                                                          Mat3f const& toWorld,
-                                                          SLArray<Vec3f>& frame) const
+                                                   Vec3f const&, Vec3f const& N,
+                                                   Mat3f const& toWorld,
+                                                   SLArray<Vec3f>& frame) const
 {
     frame = computeBaseFrame(attribute_tangent(state), N, toWorld);
     if (u_patternEnable || u_bumpSwitcher == 1) [[unlikely]]
-        bendFrame(api, state, frame);
+        frame = bentFrame(api, state, frame);
 }
 
 /// Orthonormal frame of the lobe, tangent along the brush marks.
@@ -67,8 +73,10 @@ inline SLArray<Vec3f> corvid_Mtl_Metal::lobeFrame(IShaderAPI* api, ShadeState co
 {
     SLArray<Vec3f> frame;
     f_computeShadingFrameNative(api, state, state.P, Nf, Mat3f(state.objectToWorld), frame);
-    if (u_bumpSwitcher == 1) [[unlikely]]
-        normalizeAndReorthogonalize(frame);
+    if (u_bumpSwitcher == 1) [[unlikely]] {
+        frame[2] = normalize(frame[2]);
+        frame = orthonormalFrame(frame[0], frame[2]);
+    }
     orthonormalTangent(frame);
     f_anisoRotateFrame(api, state, frame, 0.0f);
     return frame;
@@ -76,12 +84,12 @@ inline SLArray<Vec3f> corvid_Mtl_Metal::lobeFrame(IShaderAPI* api, ShadeState co
 
 inline AnisotropicGgx corvid_Mtl_Metal::facets(ShadeState const& state) const
 {
-    float const r = u_roughMapEnable
-        ? mappedValue(u_roughMap, u_roughTransform, u_roughAmount, attribute_uv(state))
-        : u_roughValue;
-    float const k = u_anisotropyMapEnable ? mappedValue(u_anisotropyMap, u_anisotropyTransform,
-                                                        u_anisotropyAmount, attribute_uv(state))
-                                          : u_anisotropyValue;
+    float r = u_roughValue, k = u_anisotropyValue;
+    if (u_roughMapEnable) [[unlikely]]
+        r = mappedValue(u_roughMap, u_roughTransform, u_roughAmount, attribute_uv(state));
+    if (u_anisotropyMapEnable) [[unlikely]]
+        k = mappedValue(u_anisotropyMap, u_anisotropyTransform, u_anisotropyAmount,
+                        attribute_uv(state));
     // In this form NaN becomes the narrowest lobe.
     float const ax = minOf(maxOf(r, kLeastWidth), 1.0f);
     float const ay = minOf(maxOf(ax * k, kLeastWidth), 1.0f);
@@ -97,15 +105,15 @@ inline float corvid_Mtl_Metal::kept(ShadeState const& state) const
     return 1.0f;
 }
 
-inline MetalLobe corvid_Mtl_Metal::lobe(ShadeState const& state, Vec3f const& v) const
+[[gnu::always_inline]] inline MetalLobe corvid_Mtl_Metal::lobe(ShadeState const& state,
+                                                               Vec3f const& v) const
 {
-    Vec3f const r0 = u_reflectMapEnable
-        ? mappedColor(u_reflectMap, u_reflectTransform, u_reflectAmount, attribute_uv(state))
-        : u_reflectColor;
-    Vec3f const edge = u_edgeMapEnable
-        ? mappedColor(u_edgeMap, u_edgeTransform, u_edgeAmount, attribute_uv(state))
-        : u_edgeColor;
-    return {facets(state), ConductorFresnel(clamp01(r0), clamp01(edge)), v};
+    Vec3f r0 = u_reflectColor, edge = u_edgeColor;
+    if (u_reflectMapEnable) [[unlikely]]
+        r0 = mappedColor(u_reflectMap, u_reflectTransform, u_reflectAmount, attribute_uv(state));
+    if (u_edgeMapEnable) [[unlikely]]
+        edge = mappedColor(u_edgeMap, u_edgeTransform, u_edgeAmount, attribute_uv(state));
+    return {facets(state), ConductorFresnel(unitRange(r0), unitRange(edge)), v};
 }
 
 void corvid_Mtl_Metal::f_calculateColors(IShaderAPI* api, ShadeState const& state,

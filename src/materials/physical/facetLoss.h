@@ -4,20 +4,25 @@
 #include "materials/physical/anisotropicGgx.h"
 #include "materials/physical/facetLossTable.h"
 
+#include <cstdint>
+
 namespace zsi {
 
-/// Position of x, 0 up, between the nodes of a table: node below and share of the one above.
-/// NaN is taken as 0.
+/// Position of x, 0 up, between the nodes of a table: node below and share of the one above. What
+/// lies beyond the last node, and NaN, is taken as that node, less a rounding error that keeps the
+/// node above inside the table.
 template <int Nodes>
 struct TablePosition {
-    int node;
+    std::int64_t node;
     float share;
 
     explicit TablePosition(float x)
     {
-        float const last = static_cast<float>(Nodes - 2);
-        node = static_cast<int>(x > 0.0f ? minOf(x, last) : 0.0f);
-        share = x > 0.0f ? minOf(x - static_cast<float>(node), 1.0f) : 0.0f;
+        constexpr float kEnd = static_cast<float>(Nodes - 1) * (1.0f - 0x1p-24f);
+        static_assert(kEnd < static_cast<float>(Nodes - 1));
+        x = minOf(x, kEnd);
+        node = static_cast<std::int64_t>(x);
+        share = x - static_cast<float>(node);
     }
 };
 
@@ -44,7 +49,7 @@ public:
     }
 
     /// Mean of the loss over the hemisphere, weighted with the cosine.
-    float mean() const
+    [[gnu::always_inline]] float mean() const
     {
         auto const along = [this](float const(&row)[kRatios]) {
             return lerp(row[ratio_.node], row[ratio_.node + 1], ratio_.share);
@@ -56,11 +61,11 @@ public:
     }
 
     /// Share of the light along w that single bounces on perfect mirrors do not send out.
-    float operator()(Vec3f w) const
+    [[gnu::always_inline]] float operator()(Vec3f w) const
     {
         TablePosition<kCosines> const cosine(w.z * (1.0f + wide_) / (w.z + wide_) * (kCosines - 1));
         if (isotropic_) { // the same at every azimuth
-            auto const along = [&](int width) {
+            auto const along = [&](std::int64_t width) {
                 auto const& row = kFacetLoss[width][kRatios - 1];
                 return lerp(row[cosine.node][0], row[cosine.node + 1][0], cosine.share);
             };
@@ -75,7 +80,7 @@ public:
             };
             return lerp(around(row[cosine.node]), around(row[cosine.node + 1]), cosine.share);
         };
-        auto const along = [&](int width) {
+        auto const along = [&](std::int64_t width) {
             auto const& plane = kFacetLoss[width];
             return lerp(across(plane[ratio_.node]), across(plane[ratio_.node + 1]), ratio_.share);
         };

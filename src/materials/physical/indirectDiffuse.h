@@ -10,8 +10,8 @@ namespace zsi {
 struct IndirectDiffuseFunctions {
     /// weight: the diffuse colour. weight x (ambient + indirect) x occlusion; the services are
     /// asked only as far as the result can still differ from black.
-    Vec3f f_rtIndirectDiffuse(IShaderAPI* api, ShadeState const&, Vec3f weight, Vec3f P,
-                              Vec3f N) const
+    Vec3f f_rtIndirectDiffuse(IShaderAPI* api, ShadeState const&, Vec3f weight, Vec3f const& P,
+                              Vec3f const& N) const
     {
         Vec3f const kBlack(0.0f, 0.0f, 0.0f);
         if (weight == kBlack)

@@ -42,7 +42,8 @@ private:
 class MetalLobe {
 public:
     /// facets: widths as `FacetLoss` takes them.
-    MetalLobe(AnisotropicGgx facets, ConductorFresnel const& fresnel, Vec3f v)
+    /// Inlined, as `value` and `sample` are: the lobe then stays in registers.
+    [[gnu::always_inline]] MetalLobe(AnisotropicGgx facets, ConductorFresnel fresnel, Vec3f v)
         : facets_(facets)
         , fresnel_(fresnel)
         , loss_(facets)
@@ -61,7 +62,7 @@ public:
     }
 
     /// Scattering value, without the cosine.
-    Vec3f value(Vec3f l) const { return value(l, Facet(facets_, v_ + l)); }
+    [[gnu::always_inline]] Vec3f value(Vec3f l) const { return value(l, Facet(facets_, v_ + l)); }
 
     /// Share of light from v that leaves, taking the reflectance of the mirror direction for all.
     Vec3f albedo() const { return fresnel_(v_.z) * (1.0f - lossV_) + further_ * lossV_; }
@@ -75,7 +76,7 @@ public:
         float pdf; ///< 1/sr; 0 where l is below the surface
     };
     /// A direction by the single bounces, or by the cosine as often as light bounces further.
-    Sample sample(float pick, Vec2f u) const
+    [[gnu::always_inline]] Sample sample(float pick, Vec2f u) const
     {
         Sample s;
         if (pick < lossV_) {
@@ -107,7 +108,7 @@ private:
         }
     };
 
-    Vec3f value(Vec3f l, Facet facet) const
+    [[gnu::always_inline]] Vec3f value(Vec3f l, Facet facet) const
     {
         float const once = facet.density
             * AnisotropicGgx::visibility(v_.z, stretchedV_, l.z, facets_.stretched(l));

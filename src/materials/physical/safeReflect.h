@@ -10,13 +10,10 @@ namespace zsi {
 /// Least height of a reflected direction above the geometric surface, as a cosine.
 inline constexpr float kReflectMargin = 0.05f;
 
-/// `R` unless it dips below the margin; then the unit vector in the plane of I and N whose height
-/// is the margin, or N where there is none. I: towards the surface; Ng, N: on the viewer's side;
-/// R: the mirror direction of I about N.
-inline Vec3f keepAboveSurface(Vec3f const& R, Vec3f const& I, Vec3f const& Ng, Vec3f const& N)
+/// The unit vector in the plane of I and N whose height above the surface is the margin, or N where
+/// there is none.
+[[gnu::noinline]] inline Vec3f atReflectMargin(Vec3f I, Vec3f Ng, Vec3f N)
 {
-    if (dot(R, Ng) >= kReflectMargin)
-        return R;
     // R' = alpha I + beta N with |R'| = 1 and R'.Ng = margin: a quadratic in beta.
     float const g = dot(I, Ng), s = dot(Ng, N), d = dot(I, N);
     float const A = s * s + g * g - 2.0f * (d * g) * s;
@@ -38,6 +35,15 @@ inline Vec3f keepAboveSurface(Vec3f const& R, Vec3f const& I, Vec3f const& Ng, V
     return normalize(alpha * I + beta * N);
 }
 
+/// `R`, or the vector at the margin where it dips below that. I: towards the surface; Ng, N: on the
+/// viewer's side; R: the mirror direction of I about N.
+[[gnu::always_inline]] inline Vec3f keepAboveSurface(Vec3f R, Vec3f I, Vec3f Ng, Vec3f N)
+{
+    if (dot(R, Ng) >= kReflectMargin) [[likely]]
+        return R;
+    return atReflectMargin(I, Ng, N);
+}
+
 /// How the ray of a hit meets the shading normal, the side told by the geometric one.
 struct Incidence {
     float
@@ -54,14 +60,16 @@ inline Incidence incidence(ShadeState const& state)
 }
 
 /// I mirrored about N, kept above the surface.
-inline Vec3f f_safe_reflect(IShaderAPI*, ShadeState const&, Vec3f I, Vec3f Ng, Vec3f N)
+[[gnu::always_inline]] inline Vec3f f_safe_reflect(IShaderAPI*, ShadeState const&, Vec3f I,
+                                                   Vec3f Ng, Vec3f N)
 {
     return keepAboveSurface(I - 2.0f * dot(N, I) * N, I, Ng, N);
 }
 
 /// The same as a member; derive from this where the shading language had one.
 struct SafeReflectFunctions {
-    Vec3f f_safe_reflect(IShaderAPI* api, ShadeState const& state, Vec3f I, Vec3f Ng, Vec3f N) const
+    [[gnu::always_inline]] Vec3f f_safe_reflect(IShaderAPI* api, ShadeState const& state, Vec3f I,
+                                                Vec3f Ng, Vec3f N) const
     {
         return zsi::f_safe_reflect(api, state, I, Ng, N);
     }

@@ -5,6 +5,7 @@
 #include "materials/physical/proceduralNormal.h"
 #include "materials/physical/shadingFrame.h"
 #include "materials/ward/wardNoise.h"
+#include "runtime/builtins.h"
 
 namespace zsi {
 
@@ -25,16 +26,19 @@ struct WardFrameFunctions {
 
     /// Tangent, bitangent and normal at `P`, bent by the pattern or the first bump map, then by
     /// the second, then turned about the normal. toWorld takes the "tangent" attribute to world
-    /// space. A pattern leaves the normal's length as it comes out.
-    [[gnu::always_inline]] void f_computeShadingFrame(IShaderAPI* api, ShadeState const& state,
-                                                      Vec3f P, Vec3f N, Mat3f const& toWorld,
-                                                      SLArray<Vec3f>& frame) const
+    /// space: a Mat3f, or the Mat4f that holds it, which then is not copied. A pattern leaves the
+    /// normal's length as it comes out.
+    template <class Matrix>
+    [[gnu::always_inline]] void
+    f_computeShadingFrame(IShaderAPI* api, ShadeState const& state, Vec3f const& P, Vec3f N,
+                          Matrix const& toWorld, SLArray<Vec3f>& frame) const
     {
         auto const& s = self();
-        frame = computeBaseFrame(Shader::attribute_tangent(state), N, toWorld);
         if (s.u_normal0MapEnable || isProcedure(s.u_procedureMapEnable) || s.u_normal1MapEnable)
             [[unlikely]]
-            frame = bentFrame(api, state, P, toWorld, frame);
+            frame = bentFrame(api, state, P, scalars(N), toWorld);
+        else
+            frame = computeBaseFrame(Shader::attribute_tangent(state), N, Mat3f(toWorld));
         s.f_anisoRotateFrame(api, state, frame, 0.0f);
     }
 
@@ -75,12 +79,15 @@ struct WardFrameFunctions {
 private:
     Shader const& self() const { return static_cast<Shader const&>(*this); }
 
-    /// By value, here and below: a frame whose address is never taken stays in registers where
-    /// nothing bends it.
-    [[gnu::noinline]] SLArray<Vec3f> bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f P,
-                                               Mat3f toWorld, SLArray<Vec3f> frame) const
+    /// The whole frame, so that one that nothing bends need not be in memory for this.
+    template <class Matrix>
+    [[gnu::noinline]] SLArray<Vec3f> bentFrame(IShaderAPI* api, ShadeState const& state,
+                                               Vec3f const& P, Vec3f N,
+                                               Matrix const& objectToWorld) const
     {
         auto const& s = self();
+        Mat3f const toWorld(objectToWorld);
+        SLArray<Vec3f> frame = computeBaseFrame(Shader::attribute_tangent(state), N, toWorld);
         Vec2f const uv = Shader::attribute_uv(state);
         if (s.u_normal0MapEnable) {
             float const amount = s.u_normal0Amount

@@ -32,9 +32,13 @@ struct WardLobe {
     float value(Vec3f v, Vec3f l) const
     {
         float const n = norm();
-        if (!(n > 0.0f))
-            return 0.0f;
-        return gauss(l - v) / (std::sqrt(-v.z * l.z) * n);
+        return n > 0.0f ? value(v, l, n) : 0.0f;
+    }
+    /// The same with the norm n, above 0, at hand.
+    float value(Vec3f v, Vec3f l, float n) const
+    {
+        float const spread = std::sqrt(-v.z * l.z) * n;
+        return gauss(l - v) / spread;
     }
 };
 

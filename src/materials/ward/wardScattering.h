@@ -116,12 +116,11 @@ private:
 
     Shader const& self() const { return static_cast<Shader const&>(*this); }
 
-    Surface surface(IShaderAPI* api, ShadeState const& state) const
+    [[gnu::always_inline]] Surface surface(IShaderAPI* api, ShadeState const& state) const
     {
         Surface at;
         at.Nf = state.N * -facingSign(state.I, state.Ng);
-        self().f_computeShadingFrame(api, state, state.P, at.Nf, Mat3f(state.objectToWorld),
-                                     at.frame);
+        self().f_computeShadingFrame(api, state, state.P, at.Nf, state.objectToWorld, at.frame);
         at.v = toLocal(at.frame, state.I);
         return at;
     }

@@ -17,39 +17,70 @@ struct WardShadingFunctions {
 
     void f_calculateColors(IShaderAPI* api, ShadeState const& state, PhysicalColors& out) const
     {
-        auto const& s = self();
-        constexpr Vec3f kBlack(0.0f, 0.0f, 0.0f);
-        float const c = s.cutout(api, state);
+        if (self().u_cutoutMapEnable) [[unlikely]]
+            out = colorsWithHoles(api, state);
+        else
+            surfaceColors(api, state, out);
+    }
+
+private:
+    /// Highlights below this are not worth their exponential.
+    static constexpr float kSpecularThreshold = 1e-5f;
+    static constexpr Vec3f kBlack{0.0f, 0.0f, 0.0f};
+
+    Shader const& self() const { return static_cast<Shader const&>(*this); }
+
+    /// Every term, blended with what is seen through the holes of the cut-out.
+    [[gnu::noinline]] PhysicalColors colorsWithHoles(IShaderAPI* api, ShadeState const& state) const
+    {
+        PhysicalColors out;
+        float const c = self().cutout(api, state); // 0 hole .. 1 surface
         Vec3f seen = kBlack;
-        if (c != 1.0f) [[unlikely]] {
+        if (c != 1.0f) {
             seen = rgb(api->traceThrough(&state.P, &state.I, 1.0f - c));
             if (c == 0.0f) {
                 out.refraction = seen;
                 out.transmissionWeight = {1.0f, 1.0f, 1.0f};
-                return;
+                return out;
             }
         }
+        surfaceColors(api, state, out);
+        out.lit *= c;
+        out.highlight *= c;
+        out.reflection *= c;
+        out.indirect *= c;
+        out.additional *= c;
+        out.refraction = seen * (1.0f - c) + out.refraction * c;
+        out.transmissionWeight = out.transmissionWeight * c + grey(1.0f - c);
+        return out;
+    }
 
+    /// The terms of the surface itself.
+    [[gnu::always_inline]] void surfaceColors(IShaderAPI* api, ShadeState const& state,
+                                              PhysicalColors& out) const
+    {
+        auto const& s = self();
         float const side = facingSign(state.I, state.Ng);
         bool const far = side > 0.0f;
         Vec3f const Nf = state.N * -side;
         SLArray<Vec3f> frame;
-        s.f_computeShadingFrame(api, state, state.P, Nf, Mat3f(state.objectToWorld), frame);
-        if (!(frame[2] == Nf)) [[unlikely]] { // an unbent frame is square and visible already
-            frame[2] = s.f_adjustBumpNormal(api, state, -state.I, Nf, frame[2]);
-            s.f_basisOrthonormalize(api, state, frame);
-        }
+        s.f_computeShadingFrame(api, state, state.P, Nf, state.objectToWorld, frame);
+        bool const bent = !(frame[2] == Nf);
+        if (bent) [[unlikely]] // the frame of a plain normal is square and visible already
+            frame = visibleFrame(api, state, scalars(Nf), scalars(frame[0]), scalars(frame[2]));
         Vec3f const v = toLocal(frame, state.I);
         WardLobe lobe;
         s.f_computeWardRoughness(api, state, lobe.ax, lobe.ay);
         Vec3f diffuse, specular, transmit, filter;
         s.f_computeWardLobeColors(api, state, true, false, -v.z, diffuse, specular, transmit,
                                   filter, state.Pref);
-        Vec3f const N = s.u_normal1AsShadingNormal ? frame[2] : Nf;
+        Vec3f N = scalars(Nf);
+        if (s.u_normal1AsShadingNormal) [[unlikely]]
+            N = scalars(frame[2]);
         bool const glossy = maxComponent(specular) > kSpecularThreshold;
 
-        WardLobe const* const shine = glossy && v.z < 0.0f ? &lobe : nullptr;
-        addLights(api, state, N, frame, v, diffuse, specular, shine, out);
+        bool const shines = glossy && v.z < 0.0f;
+        addLights(api, state, N, bent, frame, v, diffuse, specular, lobe, shines, out);
 
         Vec3f translucent = kBlack;
         if (far) {
@@ -90,36 +121,45 @@ struct WardShadingFunctions {
         if (s.u_additionalMapEnable) [[unlikely]]
             out.additional *= s.u_additionalAmount
                 * clamp01(rgb(Shader::texel(state, s.u_additionalMap, s.u_additionalMapTransform)));
-
-        if (s.u_cutoutMapEnable) [[unlikely]]
-            out = cutOut(out, seen, c);
     }
 
-private:
-    /// Highlights below this are not worth their exponential.
-    static constexpr float kSpecularThreshold = 1e-5f;
+    /// The frame of a bent normal turned to where the viewer can see it. By components, so that a
+    /// frame that needs none of this need not be in memory.
+    [[gnu::noinline]] SLArray<Vec3f> visibleFrame(IShaderAPI* api, ShadeState const& state,
+                                                  Vec3f Nf, Vec3f tangent, Vec3f normal) const
+    {
+        Vec3f const visible = self().f_adjustBumpNormal(api, state, -state.I, Nf, normal);
+        SLArray<Vec3f> frame{{tangent, tangent, visible}};
+        self().f_basisOrthonormalize(api, state, frame);
+        return frame;
+    }
 
-    Shader const& self() const { return static_cast<Shader const&>(*this); }
-
-    /// Lights on the viewer's side. shine: the glossy lobe, null where it does not count.
+    /// Lights on the viewer's side. bent: whether N may differ from the frame's normal; shines:
+    /// whether the glossy lobe counts.
     [[gnu::always_inline]] static void addLights(IShaderAPI* api, ShadeState const& state, Vec3f N,
-                                                 SLArray<Vec3f> const& frame, Vec3f v,
-                                                 Vec3f diffuse, Vec3f specular,
-                                                 WardLobe const* shine, PhysicalColors& out)
+                                                 bool bent, SLArray<Vec3f> const& frame, Vec3f v,
+                                                 Vec3f diffuse, Vec3f specular, WardLobe lobe,
+                                                 bool shines, PhysicalColors& out)
     {
         Vec3f lit(0.0f, 0.0f, 0.0f), highlight(0.0f, 0.0f, 0.0f);
+        float const norm = lobe.norm();
+        shines = shines && norm > 0.0f;
         for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
              light = light->next) {
-            float const w = light->weight * lightFade(dot(light->L, N));
-            if (w == 0.0f || light->color == Vec3f(0.0f, 0.0f, 0.0f))
+            float const height = dot(frame[2], light->L);
+            float const w = light->weight * lightFade(bent ? dot(N, light->L) : height);
+            if (w == 0.0f)
+                continue;
+            // The lobe before the colours: no register outlives the call of its exponential.
+            Vec3f const l(dot(frame[0], light->L), dot(frame[1], light->L), height);
+            bool const bright = shines && l.z > 0.0f;
+            float const glossy = bright ? lobe.value(v, l, norm) : 0.0f;
+            if (light->color == Vec3f(0.0f, 0.0f, 0.0f)) [[unlikely]]
                 continue;
             Vec3f const arriving = light->color * light->shadow * w;
             lit += diffuse * arriving;
-            if (!shine)
-                continue;
-            Vec3f const l = toLocal(frame, light->L);
-            if (l.z > 0.0f)
-                highlight += specular * shine->value(v, l) * arriving;
+            if (bright) [[likely]]
+                highlight += specular * glossy * arriving;
         }
         out.lit = lit;
         out.highlight = highlight;
@@ -144,19 +184,6 @@ private:
             return s.u_refractGlossyValue;
         float const t = Shader::texel(state, s.u_refractGlossyMap, s.u_refractGlossyTransform).x;
         return spreadOfGlossiness(clamp01(t * s.u_refractGlossyAmount));
-    }
-
-    /// Blends every term with what is seen through the holes. c: 0 hole .. 1 surface.
-    static PhysicalColors cutOut(PhysicalColors out, Vec3f seen, float c)
-    {
-        out.lit *= c;
-        out.highlight *= c;
-        out.reflection *= c;
-        out.indirect *= c;
-        out.additional *= c;
-        out.refraction = seen * (1.0f - c) + out.refraction * c;
-        out.transmissionWeight = out.transmissionWeight * c + grey(1.0f - c);
-        return out;
     }
 };
 
