@@ -11,6 +11,7 @@
 #include "materials/physical/corvid_Mtl_Dielectric.h"
 #include "materials/physical/corvid_Mtl_Glazing.h"
 #include "materials/physical/corvid_Mtl_Metal.h"
+#include "materials/physical/corvid_Mtl_MetallicPaint.h"
 #include "materials/utility/corvid_Mtl_AmbientOnly.h"
 #include "materials/utility/corvid_Mtl_Mirror.h"
 #include "materials/utility/corvid_Mtl_NormalsOnly.h"
@@ -53,5 +54,6 @@
     X(corvid_Mtl_Dielectric)    \
     X(corvid_Mtl_Glazing)       \
     X(corvid_Mtl_Metal)         \
+    X(corvid_Mtl_MetallicPaint) \
     X(MarlowLegacy)             \
     X(XRite)

@@ -7,6 +7,8 @@
 /// Mapping". Local directions: z along the normal.
 #pragma once
 
+#include "materials/physical/tiltedFacets.h"
+
 #include <cmath>
 #include <cstdint>
 #include <zsi/vecmath.h>
@@ -59,16 +61,6 @@ inline Vec3i flakeAt(Vec2f p)
             }
         }
     return nearest;
-}
-
-/// Density of facet normals h around the slope s, times pi, 1/sr: Beckmann facets of squared width
-/// alpha2 about a tilted mean.
-inline float facetsAbout(Vec3f h, Vec2f s, float alpha2)
-{
-    if (h.z <= 0.0f)
-        return 0.0f;
-    float const dx = h.x / h.z - s.x, dy = h.y / h.z - s.y, z2 = h.z * h.z;
-    return std::exp(-(dx * dx + dy * dy) / alpha2) / (alpha2 * z2 * z2);
 }
 
 /// What a view ray meets of the layer.
