@@ -41,7 +41,9 @@ PaintFrames corvid_Mtl_MetallicPaint::frames(IShaderAPI* api, ShadeState const& 
     f_computeShadingFrame(api, state, state.P, Nf, Mat3f(state.objectToWorld), f.base, f.coat);
     orthonormalTangent(f.base);
     if (u_finish == 1) {
-        normalizeAndReorthogonalize(f.coat);
+        // The coat is the same around its normal, so any tangent does: the bent frame's own may
+        // be lost to rounding under a strong peel.
+        f.coat = {{kBlack, kBlack, normalize(f.coat[2])}};
         orthonormalTangent(f.coat);
         constexpr float kLeastCosine = 0.01f;
         if (dot(f.coat[2], -state.I) > kLeastCosine)
