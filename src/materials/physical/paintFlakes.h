@@ -202,7 +202,7 @@ private:
     /// Area seen of a lobe whose mean shows the cosine c over its upright part.
     static float seen(float c, float q) { return 0.5f * (c + std::sqrt(c * c + q)); }
 
-    Flake flake_[kMost];
+    Flake flake_[kMost]{};
     int count_ = 0;
     float coverage_, crowdShare_;
     float gloss2_, crowd2_;
