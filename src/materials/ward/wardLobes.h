@@ -5,6 +5,8 @@
 #include "materials/ward/wardGlossy.h"
 #include "runtime/builtins.h"
 
+#include <zsi/zsi.h>
+
 namespace zsi {
 
 /// Roughness that a glossiness channel stands for; x = 1 - glossiness. The curve is fitted in
