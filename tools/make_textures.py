@@ -123,6 +123,19 @@ def decal(u, v):
     return (0.85, 0.12, 0.10, alpha) if star < ring or star <= 0 else (0.95, 0.80, 0.15, alpha)
 
 
+# clay and mortar: fired brick with darker pores, and sandy grey
+def clay(u, v):
+    k = fractal(u, v)
+    pore = smooth(0.30, 0.42, fractal(2 * u + 0.3, 2 * v))
+    shade = (0.70 + 0.6 * k) * (0.72 + 0.28 * pore)
+    return 0.60 * shade, (0.30 + 0.05 * k) * shade, (0.22 + 0.03 * k) * shade
+
+
+def mortar(u, v):
+    shade = 0.85 + 0.3 * (fractal(3 * u, 3 * v) - 0.5)
+    return 0.74 * shade, 0.71 * shade, 0.66 * shade
+
+
 # flakes: a normal per cell as (2x - 1, 2y - 1, z), cells by nearest point
 generator = random.Random(21)
 CELLS = 40
@@ -152,4 +165,6 @@ png("brushed", brushed, 1)
 png("leaf", leaf, 3)
 png("leaf_mask", lambda u, v: (max(0.0, min(1.0, leaf_inside(u, v))),), 1)
 png("decal", decal, 4)
+png("clay", clay, 3, 128)
+png("mortar", mortar, 3, 128)
 png("flakes", flakes, 3)
