@@ -32,6 +32,8 @@ Subcommand addRender(CLI::App& app, std::string const& shaderPath);
 /// All shader libraries; those that cannot be used lead to warnings on stderr.
 host::ShaderLibraries loadLibraries(std::string const& shaderPath);
 
+/// To stdout, at once. Throws InputError when that cannot be written.
+void print(std::string const& text);
 /// One line on stderr: "zsi: warning: ...".
 void warn(std::string const& message);
 

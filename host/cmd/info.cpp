@@ -5,9 +5,7 @@
 #include <CLI/CLI.hpp>
 #include <algorithm>
 #include <array>
-#include <cerrno>
-#include <cstdio>
-#include <cstring>
+#include <cmath>
 #include <fmt/format.h>
 #include <fmt/ranges.h>
 #include <memory>
@@ -176,29 +174,35 @@ std::string classText(host::Shader const& shader)
     return text + table(rows);
 }
 
-std::string listText(host::ShaderLibraries const& libraries)
+/// One object of each class; a class that gives none leads to a warning.
+std::vector<host::Shader> allShaders(host::ShaderLibraries const& libraries)
+{
+    std::vector<host::Shader> shaders;
+    for (std::string const& name : libraries.classNames()) {
+        try {
+            shaders.push_back(libraries.create(name));
+        } catch (host::InputError const& error) {
+            warn(error.what());
+        }
+    }
+    return shaders;
+}
+
+std::string listText(std::vector<host::Shader> const& shaders)
 {
     std::vector<std::vector<std::string>> rows;
-    for (std::string const& name : libraries.classNames()) {
-        host::Shader const shader = libraries.create(name);
-        rows.push_back({name, kindName(shader.kind()),
+    for (host::Shader const& shader : shaders)
+        rows.push_back({shader.className(), kindName(shader.kind()),
                         fmt::format("{}", fmt::join(entryPointNames(shader.entryPoints()), ", "))});
-    }
     return table(rows);
 }
 
-std::string listJson(host::ShaderLibraries const& libraries)
+std::string listJson(std::vector<host::Shader> const& shaders)
 {
     Json classes = Json::array();
-    for (std::string const& name : libraries.classNames())
-        classes.push_back(headJson(libraries.create(name)));
+    for (host::Shader const& shader : shaders)
+        classes.push_back(headJson(shader));
     return Json{{"classes", classes}}.dump(2) + '\n';
-}
-
-void print(std::string const& text)
-{
-    if (std::fwrite(text.data(), 1, text.size(), stdout) != text.size() || std::fflush(stdout))
-        throw host::InputError(fmt::format("cannot write to the output: {}", std::strerror(errno)));
 }
 
 struct Arguments {
@@ -210,7 +214,8 @@ int info(Arguments const& arguments, std::string const& shaderPath)
 {
     host::ShaderLibraries const libraries = loadLibraries(shaderPath);
     if (arguments.className.empty()) {
-        print(arguments.json ? listJson(libraries) : listText(libraries));
+        std::vector<host::Shader> const shaders = allShaders(libraries);
+        print(arguments.json ? listJson(shaders) : listText(shaders));
         return 0;
     }
     host::Shader const shader = libraries.create(arguments.className);

@@ -2,7 +2,9 @@
 #include "cmd/command.h"
 
 #include <CLI/CLI.hpp>
+#include <cerrno>
 #include <cstdio>
+#include <cstring>
 #include <fmt/format.h>
 #include <new>
 
@@ -88,20 +90,33 @@ host::ShaderLibraries loadLibraries(std::string const& shaderPath)
     return libraries;
 }
 
-void warn(std::string const& message) { fmt::print(stderr, "zsi: warning: {}\n", message); }
+void print(std::string const& text)
+{
+    if (std::fwrite(text.data(), 1, text.size(), stdout) != text.size() || std::fflush(stdout))
+        throw host::InputError(fmt::format("cannot write to the output: {}", std::strerror(errno)));
+}
+
+// A message that cannot be written is lost; there is nowhere left to tell it.
+void warn(std::string const& message)
+{
+    std::fputs(("zsi: warning: " + message + '\n').c_str(), stderr);
+}
 
 } // namespace zsi::cmd
 
 int main(int argc, char** argv)
-try {
-    return zsi::cmd::run(argc, argv);
-} catch (zsi::cmd::UsageError const& error) {
-    fmt::print(stderr, "zsi: {}\n", error.what());
-    return zsi::cmd::kBadUsage;
-} catch (std::bad_alloc const&) {
-    std::fputs("zsi: out of memory\n", stderr);
-    return zsi::cmd::kBadInput;
-} catch (std::exception const& error) {
-    fmt::print(stderr, "zsi: {}\n", error.what());
-    return zsi::cmd::kBadInput;
+{
+    auto const complain = [](char const* message, int status) {
+        std::fputs((std::string("zsi: ") + message + '\n').c_str(), stderr);
+        return status;
+    };
+    try {
+        return zsi::cmd::run(argc, argv);
+    } catch (zsi::cmd::UsageError const& error) {
+        return complain(error.what(), zsi::cmd::kBadUsage);
+    } catch (std::bad_alloc const&) {
+        return complain("out of memory", zsi::cmd::kBadInput);
+    } catch (std::exception const& error) {
+        return complain(error.what(), zsi::cmd::kBadInput);
+    }
 }

@@ -40,8 +40,10 @@ void ProgressBar::show(double done)
     next_ = now + std::chrono::milliseconds(200);
     double const elapsed = std::chrono::duration<double>(now - begin_).count();
     int const filled = static_cast<int>(done * kWidth);
-    fmt::print(stderr, "\r[{:#<{}}{:.<{}}] {:3.0f}%  {} left\033[K", "", filled, "",
-               kWidth - filled, std::floor(done * 100.0), clockText(elapsed * (1.0 - done) / done));
+    std::string const line =
+        fmt::format("\r[{:#<{}}{:.<{}}] {:3.0f}%  {} left\033[K", "", filled, "", kWidth - filled,
+                    std::floor(done * 100.0), clockText(elapsed * (1.0 - done) / done));
+    std::fputs(line.c_str(), stderr);
     std::fflush(stderr);
     drawn_ = true;
 }

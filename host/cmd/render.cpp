@@ -131,9 +131,10 @@ int render(Arguments const& arguments, std::string const& shaderPath)
         return status;
     }
     host::writePicture(arguments.output, picture, scene.film.exposure);
-    fmt::print("{}: {}x{}, {} samples a pixel, {} rays, {} non-finite results left out, {:.2f} s\n",
-               arguments.output, picture.width, picture.height, scene.settings.samples, report.rays,
-               report.nonFinite, report.seconds);
+    print(fmt::format("{}: {}x{}, {} samples a pixel, {} rays, {} non-finite results left out, "
+                      "{:.2f} s\n",
+                      arguments.output, picture.width, picture.height, scene.settings.samples,
+                      report.rays, report.nonFinite, report.seconds));
     return 0;
 }
 

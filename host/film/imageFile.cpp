@@ -2,15 +2,18 @@
 
 #include "base/error.h"
 
+#include <OpenImageIO/filesystem.h>
 #include <OpenImageIO/imageio.h>
 #include <algorithm>
 #include <cctype>
 #include <cerrno>
 #include <cmath>
+#include <cstdio>
 #include <cstring>
 #include <fcntl.h>
 #include <fmt/format.h>
 #include <unistd.h>
+#include <utility>
 #include <zsi/vecmath.h>
 
 namespace zsi::host {
@@ -61,44 +64,64 @@ Encoding encodingOf(std::filesystem::path const& file)
     throw InputError(file.string() + ": cannot be written: " + why);
 }
 
-/// A file beside the one that it may become, removed on the way out otherwise. The extension stays
-/// last: it tells the format.
+/// A file beside the one that it may become, removed on the way out otherwise.
 class TemporaryFile {
 public:
+    /// Throws InputError when there can be no such file.
     explicit TemporaryFile(std::filesystem::path const& goal)
-        : path(goal.parent_path()
-               / fmt::format(".{}.{}{}", goal.stem().string(), getpid(), goal.extension().string()))
-        , goal_(goal)
+        : goal_(goal)
+        , path_(
+              goal.parent_path()
+              / fmt::format(".{}.{}{}", goal.stem().string(), getpid(), goal.extension().string()))
+        , descriptor_(open(path_.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666))
     {
+        if (descriptor_ < 0)
+            fail(goal_, std::strerror(errno));
     }
     TemporaryFile(TemporaryFile const&) = delete;
     TemporaryFile& operator=(TemporaryFile const&) = delete;
     ~TemporaryFile()
     {
-        std::error_code ignored;
-        std::filesystem::remove(path, ignored);
-    }
-    void becomeGoal() const
-    {
-        std::error_code error;
-        std::filesystem::rename(path, goal_, error);
-        if (error)
-            fail(goal_, error.message());
+        if (descriptor_ >= 0)
+            close(descriptor_);
+        if (!path_.empty())
+            unlink(path_.c_str());
     }
 
-    std::filesystem::path const path;
+    void write(std::vector<unsigned char> const& bytes) const
+    {
+        for (std::size_t done = 0; done < bytes.size();) {
+            ssize_t const n = ::write(descriptor_, bytes.data() + done, bytes.size() - done);
+            if (n < 0 && errno != EINTR)
+                fail(goal_, std::strerror(errno));
+            done += n > 0 ? static_cast<std::size_t>(n) : 0;
+        }
+    }
+
+    void becomeGoal()
+    {
+        int const closed = close(std::exchange(descriptor_, -1)); // some disks tell only now
+        if (closed != 0 || rename(path_.c_str(), goal_.c_str()) != 0)
+            fail(goal_, std::strerror(errno));
+        path_.clear();
+    }
 
 private:
     std::filesystem::path const& goal_;
+    std::filesystem::path path_;
+    int descriptor_;
 };
 
-/// `goal` is the name for messages.
-void writeTo(std::filesystem::path const& file, std::filesystem::path const& goal,
-             Picture const& picture, float exposure, Encoding encoding)
+/// The bytes of the file. Made in memory, since some encoders do not notice a full disk and one
+/// ends the program over it.
+std::vector<unsigned char> encode(std::filesystem::path const& file, Picture const& picture,
+                                  float exposure, Encoding encoding)
 {
+    std::vector<unsigned char> result;
+    OIIO::Filesystem::IOVecOutput memory(result);
     auto const output = OIIO::ImageOutput::create(file.string());
-    if (!output)
-        fail(goal, OIIO::geterror());
+    if (!output || !output->set_ioproxy(&memory))
+        fail(file, OIIO::geterror());
     OIIO::ImageSpec spec(picture.width, picture.height, encoding.channels, encoding.type);
     bool const encoded = encoding.type == OIIO::TypeDesc::UINT8;
     spec.attribute("oiio:ColorSpace", encoded ? "sRGB" : "Linear");
@@ -110,7 +133,7 @@ void writeTo(std::filesystem::path const& file, std::filesystem::path const& goa
         spec.attribute("compression", "zip");
     spec.attribute("CompressionQuality", 95);
     if (!output->open(file.string(), spec))
-        fail(goal, output->geterror());
+        fail(file, output->geterror());
 
     auto const pixels =
         static_cast<std::size_t>(picture.width) * static_cast<std::size_t>(picture.height);
@@ -131,7 +154,8 @@ void writeTo(std::filesystem::path const& file, std::filesystem::path const& goa
     }
     bool const closed = output->close();
     if (!written || !closed)
-        fail(goal, output->geterror());
+        fail(file, output->geterror());
+    return result;
 }
 
 } // namespace
@@ -145,10 +169,6 @@ void checkPictureFile(std::filesystem::path const& file)
     if (std::filesystem::exists(file, ignored) && access(file.c_str(), W_OK) != 0)
         fail(file, std::strerror(errno));
     TemporaryFile const temporary(file);
-    int const descriptor = open(temporary.path.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0600);
-    if (descriptor < 0)
-        fail(file, std::strerror(errno));
-    close(descriptor);
 }
 
 void writePicture(std::filesystem::path const& file, Picture const& picture, float exposure)
@@ -156,8 +176,8 @@ void writePicture(std::filesystem::path const& file, Picture const& picture, flo
     Encoding const encoding = encodingOf(file);
     if (picture.width <= 0 || picture.height <= 0)
         throw InputError(file.string() + ": the picture is empty");
-    TemporaryFile const temporary(file);
-    writeTo(temporary.path, file, picture, exposure, encoding);
+    TemporaryFile temporary(file);
+    temporary.write(encode(file, picture, exposure, encoding));
     temporary.becomeGoal();
 }
 
