@@ -35,9 +35,12 @@ std::string shown(JsonValue const& v)
         return '"' + printable(v.text) + '"';
     case JsonValue::Kind::Array:
         return fmt::format("an array of {}", v.items.size());
-    default:
-        return kindName(v.kind);
+    case JsonValue::Kind::Object:
+        return "an object";
+    case JsonValue::Kind::Null:
+        break;
     }
+    return "null";
 }
 
 } // namespace

@@ -8,6 +8,7 @@
 #include <fstream>
 #include <iterator>
 #include <nlohmann/json.hpp>
+#include <utility>
 
 namespace zsi::host {
 
@@ -167,7 +168,8 @@ private:
         JsonValue& parent = *open_.back();
         if (parent.kind == JsonValue::Kind::Array)
             return &parent.items.emplace_back(std::move(value));
-        return &parent.members.emplace_back(std::move(key_), std::move(value)).second;
+        parent.members.push_back({std::move(key_), std::move(value)});
+        return &parent.members.back().value;
     }
     bool add(JsonValue value)
     {
@@ -220,26 +222,6 @@ JsonValue const* JsonValue::find(std::string_view name) const
 JsonValue* JsonValue::find(std::string_view name)
 {
     return const_cast<JsonValue*>(std::as_const(*this).find(name));
-}
-
-char const* kindName(JsonValue::Kind kind)
-{
-    switch (kind) {
-    case JsonValue::Kind::Null:
-        return "null";
-    case JsonValue::Kind::Bool:
-        return "true or false";
-    case JsonValue::Kind::Integer:
-    case JsonValue::Kind::Float:
-        return "a number";
-    case JsonValue::Kind::String:
-        return "a string";
-    case JsonValue::Kind::Array:
-        return "an array";
-    case JsonValue::Kind::Object:
-        return "an object";
-    }
-    return "nothing";
 }
 
 JsonValue readJson(std::filesystem::path const& file)

@@ -5,10 +5,11 @@
 #include <memory>
 #include <string>
 #include <string_view>
-#include <utility>
 #include <vector>
 
 namespace zsi::host {
+
+struct JsonMember;
 
 /// A JSON value with its place in a file. Members of an object keep the file's order.
 struct JsonValue {
@@ -19,7 +20,7 @@ struct JsonValue {
     double number = 0; ///< of Integer and Float; exact up to 2^53
     std::string text;
     std::vector<JsonValue> items;
-    std::vector<std::pair<std::string, JsonValue>> members;
+    std::vector<JsonMember> members;
     std::shared_ptr<std::filesystem::path const> file;
     int line = 0; ///< from 1
 
@@ -27,8 +28,10 @@ struct JsonValue {
     JsonValue* find(std::string_view name);
 };
 
-/// "a string", "an object", ... for messages.
-char const* kindName(JsonValue::Kind kind);
+struct JsonMember {
+    std::string key;
+    JsonValue value;
+};
 
 /// Reads a JSON file in which comments may stand. Throws InputError that names file, line and
 /// column when it cannot be read or is no JSON, and for a key that an object has twice.

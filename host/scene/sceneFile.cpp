@@ -63,18 +63,19 @@ void merge(JsonValue& base, JsonReader const& over, Level level, std::string_vie
         return;
     }
     if (level == Level::Shader && changesClass(base, over.value()))
-        std::erase_if(base.members, [](auto const& m) { return m.first == "parameters"; });
+        std::erase_if(base.members, [](JsonMember const& m) { return m.key == "parameters"; });
     for (auto const& [key, value] : over.members()) {
         JsonValue* const old = base.find(key);
         if (value.kind() == JsonValue::Kind::Null) {
             if (!old)
                 value.fail("null takes out what an included file has, which is nothing here"
                            + suggestion(key, keysOf(base)));
-            std::erase_if(base.members, [&name = key](auto const& m) { return m.first == name; });
+            std::erase_if(base.members,
+                          [&name = key](JsonMember const& m) { return m.key == name; });
         } else if (old) {
             merge(*old, value, below(level, section, key), level == Level::Scene ? key : section);
         } else {
-            base.members.emplace_back(key, value.value());
+            base.members.push_back({key, value.value()});
         }
     }
     // Messages about the object as a whole lead to where it was last changed.
@@ -107,7 +108,7 @@ JsonValue readWithIncludes(fs::path const& file, std::vector<fs::path>& open)
     if (!fs::exists(included))
         include->fail(included.string() + ": no such file");
     JsonValue merged = readWithIncludes(included, open);
-    std::erase_if(scene.members, [](auto const& m) { return m.first == "include"; });
+    std::erase_if(scene.members, [](JsonMember const& m) { return m.key == "include"; });
     merge(merged, JsonReader(scene), Level::Scene, {});
     return merged;
 }
