@@ -4,6 +4,7 @@
 /// Default initialisation leaves them unset, value initialisation (`Vec3f{}`) zeroes them.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <type_traits>
 
@@ -106,7 +107,7 @@ struct Mat3f {
 /// tangent, bitangent, normal, in this order.
 template <class T, int N = 3>
 struct SLArray {
-    T element[N];
+    T element[static_cast<std::size_t>(N)];
 
     constexpr T& operator[](int i) { return element[i]; }
     constexpr T const& operator[](int i) const { return element[i]; }
