@@ -130,6 +130,8 @@ void BackgroundGeometry::shade(IShaderAPI* api, ShadeState& state) const
     bool const clear = 1.0f > picture.w;
     Vec4f const behind =
         clear ? api->traceThrough(&state.P, &state.I, 1.0f) : Vec4f(0.0f, 0.0f, 0.0f, 0.0f);
+    // Up to here all kinds of rays ask the host for the same.
+    Vec3f const n = bumpedNormal(api, state);
 
     Vec3f color;
     if (state.rayType == kRayReflection && useCubeReflection && reflectCube.texture) {
@@ -140,9 +142,8 @@ void BackgroundGeometry::shade(IShaderAPI* api, ShadeState& state) const
                       .gain = reflectIBLChannelGainValue,
                       .saturation = reflectIBLChannelSatValue});
     } else {
-        // Rays that only gather light see the smooth ground, and no mirror of a mirror.
+        // Rays that only gather light see no mirror of a mirror.
         bool const gathers = state.rayType == kRayDiffuse || state.rayType == kRayReflection;
-        Vec3f const n = state.rayType == kRayDiffuse ? state.N : bumpedNormal(api, state);
         color = gradeChannel(rgb(picture),
                              {.gainColor = diffuseTextureGainColor,
                               .gainSource = diffuseTextureGainSource,

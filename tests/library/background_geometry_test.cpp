@@ -169,6 +169,7 @@ TEST(BackgroundGeometry, BumpTiltsTheNormalAlongRisingTextureCoordinates)
         Vec3f const n = normalize(transformDirection(g.state.objectToWorld, normal));
         g.state.N = g.state.Ng = n;
         g.state.I = -n;
+        g.state.rayType = i % 3 ? 1 : 32; // whatever the ray
         Vec3f seen(0, 0, 0);
         g.host.onOcclusion = [&](Vec3f, Vec3f N) { return seen = N, Vec3f(1, 1, 1); };
         g.shade();
