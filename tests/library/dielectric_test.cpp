@@ -347,6 +347,21 @@ TEST(Dielectric, BendsItsFrameByTheFirstMapOrTheRippleThenTheSecondMap)
             N = test::unitOf(plus(N, times(T, -0.04 * 2 * 3.33)));
         }
         EXPECT_LT(test::distance(host.calls[0].vectors[1], N), 1e-4);
+
+        // `sample` reads the bumps, then the roughness, and draws at last.
+        test::FunctionTexture<Vec2f> rough([&](Vec2f) {
+            EXPECT_EQ(first.lookups.size(), 2 * c.firstLookups);
+            EXPECT_EQ(second.lookups.size(), 2 * c.secondLookups);
+            EXPECT_EQ(host.noiseCalls, 2 * c.noise);
+            EXPECT_EQ(host.randomCalls, 0);
+            return Vec4f(0.5f, 0, 0, 1);
+        });
+        glass.u_roughMapEnable = true;
+        glass.u_roughMap.texture = &rough;
+        s.allowReflection[0] = s.allowTransmission[0] = 1;
+        glass.sample(&host, s);
+        EXPECT_EQ(rough.lookups.size(), 1u);
+        EXPECT_EQ(host.randomCalls, 3);
     }
 }
 

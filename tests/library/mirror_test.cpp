@@ -87,13 +87,16 @@ TEST(Mirror, SamplesTheMirrorDirectionForTheThirdSwitchOnly)
             1e-6);
         EXPECT_NEAR(double(s.outBrdf.y) * d, 0.25, 1e-5) << "value times cosine is the tint";
     }
-    // Along the surface nothing is faced: straight on, with a value that divides by 0.
-    ShadeState s = test::plainHit();
-    s.I = {1, 0, 0};
-    s.allowReflection[2] = 1;
-    mirror.sample(&host, s);
-    EXPECT_EQ(s.sampleDirection, s.I);
-    EXPECT_TRUE(std::isinf(s.outBrdf.x));
+    // Along the surface nothing is faced: straight on, with a value that divides by a zero. Of
+    // I.(-0 N) only three terms of -0 sum to -0; what is negated then is the cosine.
+    for (float x : {1.0f, -1.0f}) {
+        ShadeState s = test::plainHit();
+        s.I = {x, 0, 0};
+        s.allowReflection[2] = 1;
+        mirror.sample(&host, s);
+        EXPECT_EQ(s.sampleDirection, s.I);
+        EXPECT_EQ(s.outBrdf.x, x * std::numeric_limits<float>::infinity());
+    }
 }
 
 } // namespace

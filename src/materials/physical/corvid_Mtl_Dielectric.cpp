@@ -211,7 +211,7 @@ inline corvid_Mtl_Dielectric::Event corvid_Mtl_Dielectric::chooseEvent(IShaderAP
     else
         weight = mayReflect ? F : 1.0f - F;
     if (refracts) {
-        float const k = (c * c - 1.0f) * eta * eta + 1.0f;
+        float const k = (c * c - 1.0f) * (eta * eta) + 1.0f;
         if (k >= 0.0f)
             return {weight, eta * c - std::sqrt(k), eta, true};
         if (!mayReflect)
@@ -232,24 +232,20 @@ inline void corvid_Mtl_Dielectric::continuePath(ShadeState& state, SLArray<Vec3f
     state.outBrdf = grey(weight);
 }
 
+/// framed: the whole frame stands already, not its normal alone.
 [[gnu::always_inline]] inline void
-corvid_Mtl_Dielectric::samplePolished(IShaderAPI* api, ShadeState& state, Vec3f Nf, Indices n) const
+corvid_Mtl_Dielectric::samplePolished(IShaderAPI* api, ShadeState& state, SLArray<Vec3f>& frame,
+                                      bool framed, Indices n) const
 {
-    // The facet is the frame normal: without bumps the frame waits until the host has been asked.
-    bool const bent = bends();
-    SLArray<Vec3f> frame;
-    Vec3f N = Nf;
-    if (bent) [[unlikely]] {
-        f_computeShadingFrame(api, state, state.P, Nf, state.objectToWorld, frame);
-        N = frame[2];
-    }
+    // The facet is the frame normal: the rest of the frame waits until the host has been asked.
+    Vec3f const N = frame[2];
     float const c = dot(N, -state.I);
     Event const event = chooseEvent(api, state, c, c, n.eta());
     if (event.ends()) {
         state.sampleType = kSampleNone;
         return;
     }
-    if (!bent) [[likely]]
+    if (!framed) [[likely]]
         frame = computeBaseFrame(attribute_tangent(state), N, Mat3f(state.objectToWorld));
     float const b = event.alongView;
     Vec3f d(b * dot(frame[0], state.I), b * dot(frame[1], state.I), event.alongFacet - b * c);
@@ -259,9 +255,9 @@ corvid_Mtl_Dielectric::samplePolished(IShaderAPI* api, ShadeState& state, Vec3f 
     continuePath(state, frame, d, event.weight, event, n);
 }
 
-[[gnu::always_inline]] inline void corvid_Mtl_Dielectric::sampleRough(IShaderAPI* api,
-                                                                      ShadeState& state, Vec3f Nf,
-                                                                      Indices n, float r) const
+[[gnu::always_inline]] inline void
+corvid_Mtl_Dielectric::sampleRough(IShaderAPI* api, ShadeState& state, SLArray<Vec3f>& frame,
+                                   bool framed, Indices n, float r) const
 {
     Ggx const facets{r * r};
     Vec2f const xi = api->random2D();
@@ -271,8 +267,8 @@ corvid_Mtl_Dielectric::samplePolished(IShaderAPI* api, ShadeState& state, Vec3f 
     float const phi = 6.283185f * xi.y;
     Vec3f const m(sine * std::cos(phi), sine * std::sin(phi), cosine);
 
-    SLArray<Vec3f> frame;
-    f_computeShadingFrame(api, state, state.P, Nf, state.objectToWorld, frame);
+    if (!framed) [[likely]]
+        frame = computeBaseFrame(attribute_tangent(state), frame[2], Mat3f(state.objectToWorld));
     Vec3f const v = toLocal(frame, -state.I);
     Event const event = chooseEvent(api, state, v.z, dot(v, m), n.eta());
     if (event.ends()) {
@@ -295,13 +291,17 @@ void corvid_Mtl_Dielectric::sample(IShaderAPI* api, ShadeState& state) const
     }
     float const side = dot(state.I, state.Ng);
     bool const leaving = side > 0.0f;
-    Vec3f const Nf = state.N * -sign(side);
     Indices const n = indices(state, leaving);
+    SLArray<Vec3f> frame;
+    frame[2] = state.N * -sign(side);
+    bool const bent = bends();
+    if (bent) [[unlikely]] // bumps are read before the roughness and before the random numbers
+        f_computeShadingFrame(api, state, state.P, Vec3f(frame[2]), state.objectToWorld, frame);
     float const r = roughness(state);
     if (leaving || r < kSmoothRoughness)
-        samplePolished(api, state, Nf, n);
+        samplePolished(api, state, frame, bent, n);
     else
-        sampleRough(api, state, Nf, n, r);
+        sampleRough(api, state, frame, bent, n, r);
 }
 
 } // namespace zsi

@@ -75,8 +75,10 @@ private:
     Vec3f pathTransmittance(ShadeState const& state) const;
     Event chooseEvent(IShaderAPI* api, ShadeState const& state, float cosine, float c,
                       float eta) const;
-    void samplePolished(IShaderAPI* api, ShadeState& state, Vec3f Nf, Indices n) const;
-    void sampleRough(IShaderAPI* api, ShadeState& state, Vec3f Nf, Indices n, float r) const;
+    void samplePolished(IShaderAPI* api, ShadeState& state, SLArray<Vec3f>& frame, bool framed,
+                        Indices n) const;
+    void sampleRough(IShaderAPI* api, ShadeState& state, SLArray<Vec3f>& frame, bool framed,
+                     Indices n, float r) const;
     static void continuePath(ShadeState& state, SLArray<Vec3f> const& frame, Vec3f d, float weight,
                              Event event, Indices n);
 };
