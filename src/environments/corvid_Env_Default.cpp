@@ -2,21 +2,26 @@
 
 namespace zsi {
 
-// Apart from `shade`, so that the flat background pays for no stack frame.
-[[gnu::noinline]] static void shadeIbl(corvid_Env_Default const& shader, ShadeState& state,
-                                       bool diffuse)
+// Apart from `shade`, so that the flat background pays for no stack frame; arguments where `shade`
+// has them.
+[[gnu::noinline]] static void shadeDiffuse(corvid_Env_Default const& shader, IShaderAPI*,
+                                           ShadeState& state)
 {
-    state.Ci = diffuse ? diffuseIbl(shader, shader.diffuseCube, state.I)
-                       : reflectIbl(shader, shader.reflectionCube, state.I);
+    state.Ci = diffuseIbl(shader, shader.diffuseCube, state.I);
+}
+[[gnu::noinline]] static void shadeReflection(corvid_Env_Default const& shader, IShaderAPI*,
+                                              ShadeState& state)
+{
+    state.Ci = reflectIbl(shader, shader.reflectionCube, state.I);
 }
 
-void corvid_Env_Default::shade(IShaderAPI*, ShadeState& state) const
+void corvid_Env_Default::shade(IShaderAPI* api, ShadeState& state) const
 {
     // A ray of any kind at the depth limit is answered from the reflection cube.
-    bool const depthLeft = state.rayDepth < state.maxRayDepth;
-    bool const diffuse = depthLeft && state.rayType == kRayDiffuse;
-    if (diffuse || !depthLeft || state.rayType == kRayReflection)
-        shadeIbl(*this, state, diffuse);
+    if (!(state.rayDepth < state.maxRayDepth) || state.rayType == kRayReflection)
+        shadeReflection(*this, api, state);
+    else if (state.rayType == kRayDiffuse)
+        shadeDiffuse(*this, api, state);
     else
         state.Ci = withAlpha(backgroundColor, 0.0f);
 }

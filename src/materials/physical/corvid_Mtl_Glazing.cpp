@@ -88,34 +88,43 @@ void corvid_Mtl_Glazing::transfer(IShaderAPI*, ShadeState& state) const
              + (1.0f - R) * facets.reflection(v, mirrored, reflectionHalf(v, mirrored)));
 }
 
+/// The pane's mirror image. factor: what the choice of this event leaves of its reflectance.
+inline void corvid_Mtl_Glazing::sampleReflected(ShadeState& state, float factor) const
+{
+    auto const [cosine, along] = incidence(state);
+    state.sampleType = kSampleStraight;
+    state.sampleInvPdf = 1.0f;
+    state.sampleCosine = cosine;
+    state.sampleDirection = state.I - state.N * (2.0f * along);
+    state.outBrdf = u_reflectColor * (factor / cosine);
+}
+
+/// Straight on. Value and cosine are negative: their product counts.
+inline void corvid_Mtl_Glazing::sampleTransmitted(ShadeState& state, float factor) const
+{
+    float const cosine = -incidence(state).cosine;
+    state.sampleType = kSampleSmooth;
+    state.sampleInvPdf = 1.0f;
+    state.sampleCosine = cosine;
+    state.sampleDirection = state.I;
+    state.outBrdf = u_refractColor * (factor / cosine);
+}
+
 void corvid_Mtl_Glazing::sample(IShaderAPI* api, ShadeState& state) const
 {
     bool const mayReflect = anySwitch(state.allowReflection);
     bool const mayTransmit = anySwitch(state.allowTransmission);
-    if (!mayReflect && !mayTransmit) {
-        state.sampleType = kSampleNone;
-        return;
-    }
-    float factor = 1.0f;
-    bool transmits = mayTransmit;
-    if (mayReflect && mayTransmit)
-        transmits = api->random() > reflectance();
-    else
-        factor = mayReflect ? reflectance() : 1.0f - reflectance();
-
-    auto const [cosine, along] = incidence(state);
-    state.sampleInvPdf = 1.0f;
-    if (transmits) {
-        // Value and cosine are negative: their product counts.
-        state.sampleCosine = -cosine;
-        state.sampleDirection = state.I;
-        state.outBrdf = u_refractColor * (factor / -cosine);
-        state.sampleType = kSampleSmooth;
+    if (mayReflect && mayTransmit) [[likely]] {
+        if (api->random() > reflectance())
+            sampleTransmitted(state, 1.0f);
+        else
+            sampleReflected(state, 1.0f);
+    } else if (mayReflect) {
+        sampleReflected(state, reflectance());
+    } else if (mayTransmit) {
+        sampleTransmitted(state, 1.0f - reflectance());
     } else {
-        state.sampleCosine = cosine;
-        state.sampleDirection = state.I - state.N * (2.0f * along);
-        state.outBrdf = u_reflectColor * (factor / cosine);
-        state.sampleType = kSampleStraight;
+        state.sampleType = kSampleNone;
     }
 }
 

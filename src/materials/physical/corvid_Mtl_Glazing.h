@@ -33,6 +33,8 @@ public:
 private:
     float reflectance() const { return u_reflectance * u_reflectance / u_level; }
     Vec3f transmissionTint(ShadeState const& state) const;
+    void sampleReflected(ShadeState& state, float factor) const;
+    void sampleTransmitted(ShadeState& state, float factor) const;
 };
 
 } // namespace zsi

@@ -76,7 +76,7 @@ struct PhysicalShading : MaskingFunctions<Shader>, AmbientOcclusionFunctions<Sha
 /// Which events a host accepts from `sample`: any of its three switches.
 inline bool anySwitch(std::uint8_t const (&allowed)[3])
 {
-    return (allowed[0] | allowed[1] | allowed[2]) != 0;
+    return allowed[0] || allowed[1] || allowed[2]; // the first is set most often
 }
 
 } // namespace zsi

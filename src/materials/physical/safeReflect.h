@@ -46,18 +46,19 @@ inline constexpr float kReflectMargin = 0.05f;
 
 /// How the ray of a hit meets the shading normal, the side told by the geometric one.
 struct Incidence {
-    float cosine; ///< -I.N for the normal faced to the viewer; a zero where the ray runs along
-                  ///< Ng's plane
-    float along; ///< I.N for the normal as it is; I - 2 along N is the mirror direction
+    float cosine; ///< -I.N for the normal faced to the viewer; a zero along Ng's plane
+    float along; ///< I.N for the normal as it is: I - 2 along N is the mirror direction
 };
 inline Incidence incidence(ShadeState const& state)
 {
     float const side = dot(state.I, state.Ng);
-    if (!(side < 0.0f) && !(side > 0.0f)) [[unlikely]]
-        // Neither side: no normal to mirror at. What divides by the zero takes its sign.
-        return {-dot(state.I, -state.N * 0.0f), 0.0f};
     float const along = dot(state.I, state.N);
-    return {side < 0.0f ? -along : along, along};
+    if (side < 0.0f) [[likely]]
+        return {-along, along};
+    if (side > 0.0f)
+        return {along, along};
+    // Neither side: no normal to mirror at. What divides by the zero takes its sign.
+    return {-dot(state.I, -state.N * 0.0f), 0.0f};
 }
 
 /// I mirrored about N, kept above the surface.

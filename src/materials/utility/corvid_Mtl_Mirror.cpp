@@ -34,16 +34,16 @@ void corvid_Mtl_Mirror::transfer(IShaderAPI*, ShadeState&) const { }
 
 void corvid_Mtl_Mirror::sample(IShaderAPI*, ShadeState& state) const
 {
-    if (!state.allowReflection[2]) {
+    if (!state.allowReflection[2]) [[unlikely]] {
         state.sampleType = kSampleNone;
         return;
     }
     auto const [cosine, along] = incidence(state);
+    state.sampleType = kSampleStraight;
+    state.sampleInvPdf = 1.0f;
     state.sampleCosine = cosine;
     state.sampleDirection = state.I - state.N * (2.0f * along); // not kept above the surface
     state.outBrdf = u_tintColor * (1.0f / cosine); // without the rise of `shade`
-    state.sampleInvPdf = 1.0f;
-    state.sampleType = kSampleStraight;
 }
 
 } // namespace zsi
