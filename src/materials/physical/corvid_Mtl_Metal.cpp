@@ -43,10 +43,12 @@ void corvid_Mtl_Metal::bendByFacets(IShaderAPI* api, ShadeState const& state,
     reorthogonalize(frame);
 }
 
-/// By value, so that a frame that nothing bends need not be in memory.
-[[gnu::noinline]] SLArray<Vec3f>
-corvid_Mtl_Metal::bentFrame(IShaderAPI* api, ShadeState const& state, SLArray<Vec3f> frame) const
+void corvid_Mtl_Metal::f_computeShadingFrameNative(IShaderAPI* api, ShadeState const& state,
+                                                   Vec3f const&, Vec3f const& N,
+                                                   Mat3f const& toWorld,
+                                                   SLArray<Vec3f>& frame) const
 {
+    frame = computeBaseFrame(attribute_tangent(state), N, toWorld);
     if (u_patternEnable) {
         f_rtBumpPerturb(api, state, frame, attribute_uv(state), u_patternMap, u_patternTransform,
                         u_patternAmount, 1.0f);
@@ -54,29 +56,28 @@ corvid_Mtl_Metal::bentFrame(IShaderAPI* api, ShadeState const& state, SLArray<Ve
     }
     if (u_bumpSwitcher == 1)
         bendByFacets(api, state, frame);
-    return frame;
 }
 
-void corvid_Mtl_Metal::f_computeShadingFrameNative(IShaderAPI* api, ShadeState const& state,
-                                                   Vec3f const&, Vec3f const& N,
-                                                   Mat3f const& toWorld,
-                                                   SLArray<Vec3f>& frame) const
-{
-    frame = computeBaseFrame(attribute_tangent(state), N, toWorld);
-    if (u_patternEnable || u_bumpSwitcher == 1) [[unlikely]]
-        frame = bentFrame(api, state, frame);
-}
-
-/// Orthonormal frame of the lobe, tangent along the brush marks.
-inline SLArray<Vec3f> corvid_Mtl_Metal::lobeFrame(IShaderAPI* api, ShadeState const& state,
-                                                  Vec3f const& Nf) const
+/// The whole frame by value, so that one that nothing bends need not be in memory for this.
+[[gnu::noinline]] SLArray<Vec3f>
+corvid_Mtl_Metal::bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f Nf) const
 {
     SLArray<Vec3f> frame;
     f_computeShadingFrameNative(api, state, state.P, Nf, Mat3f(state.objectToWorld), frame);
-    if (u_bumpSwitcher == 1) [[unlikely]] {
-        frame[2] = normalize(frame[2]);
-        frame = orthonormalFrame(frame[0], frame[2]);
-    }
+    if (u_bumpSwitcher == 1)
+        normalizeAndReorthogonalize(frame);
+    return frame;
+}
+
+/// Orthonormal frame of the lobe, tangent along the brush marks.
+[[gnu::always_inline]] inline SLArray<Vec3f>
+corvid_Mtl_Metal::lobeFrame(IShaderAPI* api, ShadeState const& state, Vec3f const& Nf) const
+{
+    SLArray<Vec3f> frame;
+    if (u_patternEnable || u_bumpSwitcher == 1) [[unlikely]]
+        frame = bentFrame(api, state, scalars(Nf));
+    else
+        frame = computeBaseFrame(attribute_tangent(state), Nf, Mat3f(state.objectToWorld));
     orthonormalTangent(frame);
     f_anisoRotateFrame(api, state, frame, 0.0f);
     return frame;

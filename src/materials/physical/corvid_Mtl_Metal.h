@@ -67,7 +67,7 @@ public:
                                      SLArray<Vec3f>& frame) const;
 
 private:
-    SLArray<Vec3f> bentFrame(IShaderAPI* api, ShadeState const& state, SLArray<Vec3f> frame) const;
+    SLArray<Vec3f> bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f Nf) const;
     void bendByFacets(IShaderAPI* api, ShadeState const& state, SLArray<Vec3f>& frame) const;
     SLArray<Vec3f> lobeFrame(IShaderAPI* api, ShadeState const& state, Vec3f const& Nf) const;
     AnisotropicGgx facets(ShadeState const& state) const;

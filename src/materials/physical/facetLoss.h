@@ -51,44 +51,47 @@ public:
     /// Mean of the loss over the hemisphere, weighted with the cosine.
     [[gnu::always_inline]] float mean() const
     {
-        auto const along = [this](float const(&row)[kRatios]) {
-            return lerp(row[ratio_.node], row[ratio_.node + 1], ratio_.share);
-        };
         TablePosition<kMeanWidths> const width(rootWide_ * (kMeanWidths - 1));
-        return wide_
-            * lerp(along(kMeanFacetLoss[width.node]), along(kMeanFacetLoss[width.node + 1]),
-                   width.share);
+        float const* const cell = kMeanFacetLoss[0] + (width.node * kRatios + ratio_.node);
+        float const below = lerp(cell[0], cell[1], ratio_.share);
+        float const above = lerp(cell[kRatios], cell[kRatios + 1], ratio_.share);
+        return wide_ * lerp(below, above, width.share);
     }
 
     /// Share of the light along w that single bounces on perfect mirrors do not send out.
     [[gnu::always_inline]] float operator()(Vec3f w) const
     {
         TablePosition<kCosines> const cosine(w.z * (1.0f + wide_) / (w.z + wide_) * (kCosines - 1));
+        float const* const cell =
+            kFacetLoss[0][0][0] + (width_.node * kWidthStep + cosine.node * kCosineStep);
+        auto const across = [&](float const* at) {
+            return lerp(at[0], at[kCosineStep], cosine.share);
+        };
         if (isotropic_) { // the same at every azimuth
-            auto const along = [&](std::int64_t width) {
-                auto const& row = kFacetLoss[width][kRatios - 1];
-                return lerp(row[cosine.node][0], row[cosine.node + 1][0], cosine.share);
-            };
-            return lerp(along(width_.node), along(width_.node + 1), width_.share);
+            float const* const even = cell + (kRatios - 1) * kRatioStep;
+            return lerp(across(even), across(even + kWidthStep), width_.share);
         }
         float const side = std::sqrt(w.x * w.x + w.y * w.y);
         TablePosition<kAzimuths> const azimuth(std::fabs(alongX_ ? w.x : w.y) / side
                                                * (kAzimuths - 1));
-        auto const across = [&](float const(&row)[kCosines][kAzimuths]) {
-            auto const around = [&](float const(&cell)[kAzimuths]) {
-                return lerp(cell[azimuth.node], cell[azimuth.node + 1], azimuth.share);
-            };
-            return lerp(around(row[cosine.node]), around(row[cosine.node + 1]), cosine.share);
+        auto const around = [&](float const* at) {
+            return lerp(across(at), across(at + 1), azimuth.share);
         };
-        auto const along = [&](std::int64_t width) {
-            auto const& plane = kFacetLoss[width];
-            return lerp(across(plane[ratio_.node]), across(plane[ratio_.node + 1]), ratio_.share);
+        auto const along = [&](float const* at) {
+            return lerp(around(at), around(at + kRatioStep), ratio_.share);
         };
-        return lerp(along(width_.node), along(width_.node + 1), width_.share);
+        float const* const uneven = cell + (ratio_.node * kRatioStep + azimuth.node);
+        return lerp(along(uneven), along(uneven + kWidthStep), width_.share);
     }
 
 private:
     static constexpr int kWidths = 7, kMeanWidths = 13, kRatios = 4, kCosines = 9, kAzimuths = 5;
+    // From a node to its neighbour: the table is read as one row, with fixed steps from one
+    // address.
+    static constexpr int kCosineStep = kAzimuths, kRatioStep = kCosines * kCosineStep,
+                         kWidthStep = kRatios * kRatioStep;
+    static_assert(sizeof kFacetLoss == sizeof(float) * kWidths * kWidthStep);
+    static_assert(sizeof kMeanFacetLoss == sizeof(float) * kMeanWidths * kRatios);
 
     static float lerp(float a, float b, float t) { return a + t * (b - a); }
 
