@@ -150,16 +150,20 @@ private:
             float const w = light->weight * lightFade(bent ? dot(N, light->L) : height);
             if (w == 0.0f)
                 continue;
-            // The lobe before the colours: no register outlives the call of its exponential.
-            Vec3f const l(dot(frame[0], light->L), dot(frame[1], light->L), height);
-            bool const bright = shines && l.z > 0.0f;
-            float const glossy = bright ? lobe.value(v, l, norm) : 0.0f;
-            if (light->color == Vec3f(0.0f, 0.0f, 0.0f)) [[unlikely]]
-                continue;
-            Vec3f const arriving = light->color * light->shadow * w;
-            lit += diffuse * arriving;
-            if (bright) [[likely]]
-                highlight += specular * glossy * arriving;
+            auto const black = [&] { return light->color == kBlack; };
+            auto const arriving = [&] { return light->color * light->shadow * w; };
+            if (shines && height > 0.0f) {
+                // The lobe before the colours: no register outlives the call of its exponential.
+                Vec3f const l(dot(frame[0], light->L), dot(frame[1], light->L), height);
+                float const glossy = lobe.value(v, l, norm);
+                if (black()) [[unlikely]]
+                    continue;
+                Vec3f const c = arriving();
+                lit += diffuse * c;
+                highlight += specular * glossy * c;
+            } else if (!black()) {
+                lit += diffuse * arriving();
+            }
         }
         out.lit = lit;
         out.highlight = highlight;
