@@ -3,7 +3,7 @@
 # openimageio-tools: OpenImageIO's CMake package refuses to load without its programs.
 packages_build=(g++ cmake ninja-build libembree-dev libopenimageio-dev openimageio-tools libtbb-dev
     libassimp-dev nlohmann-json3-dev libcli11-dev libfmt-dev)
-packages_test=(libgtest-dev libbenchmark-dev binutils clang-14)
+packages_test=(libgtest-dev libbenchmark-dev binutils clang-14 valgrind)
 
 # install_missing PACKAGE...: installs those that are not there; sudo only if not root.
 install_missing() {
