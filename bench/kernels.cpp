@@ -168,6 +168,17 @@ void registerWard(void* library)
         all(std::string("zsi.ward_") + variant, std::string("corvid_Mtl_Ward_") + variant);
 }
 
+/// Without bounds, at their defaults.
+void registerUnbounded(void* library)
+{
+    for (char const* name : {"corvid_Mtl_MetallicPaint", "MarlowLegacy", "XRite"}) {
+        std::string const prefix = std::string("zsi.") + name;
+        kernel(library, prefix + ".shade", name, kDefaults, kShade);
+        kernel(library, prefix + ".transfer", name, kDefaults, kTransferReflect);
+        kernel(library, prefix + ".sample", name, kDefaults, kSample);
+    }
+}
+
 } // namespace
 
 void registerLibrary(char const* sharedObject)
@@ -180,6 +191,7 @@ void registerLibrary(char const* sharedObject)
     registerLightsAndEnvironments(library);
     registerPhysical(library);
     registerWard(library);
+    registerUnbounded(library);
 }
 
 } // namespace bench

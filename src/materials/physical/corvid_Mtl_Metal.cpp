@@ -215,8 +215,8 @@ void corvid_Mtl_Metal::sample(IShaderAPI* api, ShadeState& state) const
     state.outBrdf = s.value * keep;
     state.sampleCosine = s.l.z;
     state.sampleInvPdf = 1.0f / (s.pdf * chance);
-    state.sampleType =
-        state.allowReflection[0] | state.allowReflection[1] ? kSampleMixture : kSampleStraight;
+    state.sampleType = (state.allowReflection[0] | state.allowReflection[1]) != 0 ? kSampleMixture
+                                                                                  : kSampleStraight;
 }
 
 } // namespace zsi

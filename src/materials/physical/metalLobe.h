@@ -43,7 +43,8 @@ class MetalLobe {
 public:
     /// facets: widths as `FacetLoss` takes them.
     /// Inlined, as `value` and `sample` are: the lobe then stays in registers.
-    [[gnu::always_inline]] MetalLobe(AnisotropicGgx facets, ConductorFresnel fresnel, Vec3f v)
+    [[gnu::always_inline]] MetalLobe(AnisotropicGgx facets, ConductorFresnel const& fresnel,
+                                     Vec3f v)
         : facets_(facets)
         , fresnel_(fresnel)
         , loss_(facets)
