@@ -202,9 +202,11 @@ std::string readText(std::filesystem::path const& file)
     std::error_code failed;
     if (!std::filesystem::exists(file, failed))
         throw InputError(file.string() + ": no such file");
+    if (std::filesystem::is_directory(file, failed)) // reading one throws
+        throw InputError(file.string() + ": is a folder; expected a scene file");
     std::ifstream in(file, std::ios::binary);
     std::string text{std::istreambuf_iterator<char>(in), {}};
-    if (!in || std::filesystem::is_directory(file, failed))
+    if (!in)
         throw InputError(file.string() + ": cannot be read");
     return text;
 }

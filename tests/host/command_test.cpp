@@ -259,6 +259,7 @@ TEST_F(Command, BadCallsEndInOneLineAndLeaveNothing)
              {"--crop 0,0,33,24", "32x24"}})
         expectError(std::string("render scene.json -o a.png ") + options, 2, {part});
     expectError("render missing.json -o a.png", 1, {"missing.json", "no such file"});
+    expectError("render folder.png -o a.png", 1, {"folder.png", "expected a scene file"});
     expectError("render broken.json -o a.png", 1, {"broken.json", "camera"});
     expectError("render scene.json -o a.tiff", 1, {"a.tiff", ".exr"});
     expectError("render scene.json -o no/where.png", 1, {"no/where.png", "No such file"});
