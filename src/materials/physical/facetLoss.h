@@ -52,7 +52,7 @@ public:
     [[gnu::always_inline]] float mean() const
     {
         TablePosition<kMeanWidths> const width(rootWide_ * (kMeanWidths - 1));
-        float const* const cell = kMeanFacetLoss[0] + (width.node * kRatios + ratio_.node);
+        float const* const cell = flat(kMeanFacetLoss) + (width.node * kRatios + ratio_.node);
         float const below = lerp(cell[0], cell[1], ratio_.share);
         float const above = lerp(cell[kRatios], cell[kRatios + 1], ratio_.share);
         return wide_ * lerp(below, above, width.share);
@@ -63,7 +63,7 @@ public:
     {
         TablePosition<kCosines> const cosine(w.z * (1.0f + wide_) / (w.z + wide_) * (kCosines - 1));
         float const* const cell =
-            kFacetLoss[0][0][0] + (width_.node * kWidthStep + cosine.node * kCosineStep);
+            flat(kFacetLoss) + (width_.node * kWidthStep + cosine.node * kCosineStep);
         auto const across = [&](float const* at) {
             return lerp(at[0], at[kCosineStep], cosine.share);
         };
@@ -93,6 +93,11 @@ private:
     static_assert(sizeof kFacetLoss == sizeof(float) * kWidths * kWidthStep);
     static_assert(sizeof kMeanFacetLoss == sizeof(float) * kMeanWidths * kRatios);
 
+    template <class Table>
+    static float const* flat(Table const& table)
+    {
+        return reinterpret_cast<float const*>(&table);
+    }
     static float lerp(float a, float b, float t) { return a + t * (b - a); }
 
     float wide_, rootWide_;
