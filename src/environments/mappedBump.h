@@ -54,9 +54,9 @@ inline Vec3f bendNormal(BumpPlacement const& b, Vec4f texel, float amount, Vec3f
         return N;
     Vec3f u, v;
     bumpAxes(b, u, v);
-    Mat3f const toWorld(objectToWorld);
+    Mat3f const linear(objectToWorld);
     auto const onSurface = [&](Vec3f axis) {
-        axis = transformDirection(toWorld, axis);
+        axis = transformDirection(linear, axis);
         return normalize(axis - dot(axis, N) * N);
     };
     // Texels that point level or down would tear the surface open: slopes stay below 20.

@@ -109,11 +109,15 @@ Vec3f MarlowLegacy::mirrored(IShaderAPI* api, ShadeState const& state, Surface c
                            {specularIBLContrastPivot, specularIBLContrastValue,
                             specularIBLGainColor, specularIBLGainSource, specularIBLGainValue});
     }
-    if (!blurred || IBLSpecMode > 0)
-        for (GlossyLobe const& lobe : layers.highlight)
-            if (!(lobe.part == kBlack))
-                sum += lobe.part
-                    * api->traceSpecular(&state.P, &r, lobe.width, maxComponent(lobe.part));
+    auto const traced = [&](GlossyLobe const& lobe) {
+        return lobe.part == kBlack
+            ? kBlack
+            : lobe.part * api->traceSpecular(&state.P, &r, lobe.width, maxComponent(lobe.part));
+    };
+    if (!blurred || IBLSpecMode > 0) {
+        sum += traced(layers.highlight[0]);
+        sum += traced(layers.highlight[1]);
+    }
 
     if (reflection == kBlack)
         return sum;
@@ -170,7 +174,7 @@ void MarlowLegacy::shade(IShaderAPI* api, ShadeState& state) const
         color = kept * grey(minComponent(f_calcAmbientOcclusion(api, state, 1.0f)));
     } else {
         Surface const at = surface(api, state);
-        Layers const layers = this->layers(api, state, at);
+        Layers const layers = layersAt(api, state, at);
         color = kept * opaquePart(api, state, at, layers);
         Vec3f const clear = kept * layers.shares.clear;
         if (!bends()) {

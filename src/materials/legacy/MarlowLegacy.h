@@ -173,7 +173,7 @@ private:
     Vec4f diffuse(IShaderAPI* api, ShadeState const& state, bool alphaAsColor) const;
     Vec3f reflectance(float cosine) const;
     Surface surface(IShaderAPI* api, ShadeState const& state) const;
-    Layers layers(IShaderAPI* api, ShadeState const& state, Surface const& at) const;
+    Layers layersAt(IShaderAPI* api, ShadeState const& state, Surface const& at) const;
     bool bends() const;
     Vec3f refracted(IShaderAPI* api, ShadeState const& state, Vec3f facing) const;
     Vec3f paneTransmittance(IShaderAPI* api, ShadeState const& state, float cosine) const;

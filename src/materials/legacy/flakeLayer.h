@@ -24,10 +24,10 @@ inline constexpr float kFlakeSlope = 0.1f;
 /// Jarzynski and Olano 2020, "Hash Functions for GPU Rendering" (pcg3d).
 inline Vec3f cellHash(std::int32_t ix, std::int32_t iy)
 {
-    auto const mix = [](std::uint32_t v) { return v * 1664525u + 1013904223u; };
-    std::uint32_t x = mix(static_cast<std::uint32_t>(ix));
-    std::uint32_t y = mix(static_cast<std::uint32_t>(iy));
-    std::uint32_t z = mix(0u);
+    auto const step = [](std::uint32_t v) { return v * 1664525u + 1013904223u; };
+    std::uint32_t x = step(static_cast<std::uint32_t>(ix));
+    std::uint32_t y = step(static_cast<std::uint32_t>(iy));
+    std::uint32_t z = step(0u);
     for (int round = 0; round < 2; ++round) {
         x += y * z;
         y += z * x;

@@ -93,8 +93,8 @@ MarlowLegacy::Surface MarlowLegacy::surface(IShaderAPI* api, ShadeState const& s
     return at;
 }
 
-MarlowLegacy::Layers MarlowLegacy::layers(IShaderAPI* api, ShadeState const& state,
-                                          Surface const& at) const
+MarlowLegacy::Layers MarlowLegacy::layersAt(IShaderAPI* api, ShadeState const& state,
+                                            Surface const& at) const
 {
     Layers l{rgb(diffuse(api, state, false)), {}, {}, {}};
     Vec3f const clear = share(transparency(api, state));

@@ -46,12 +46,11 @@ Vec3f MarlowLegacy::scattered(Layers const& layers, Vec3f v, Vec3f l) const
     }
     if (!(l.z > 0.0f))
         return kBlack;
-    Vec3f sum = layers.shares.base * layers.diffuse * kInvPi;
-    GlossyLobe const* const lobes[] = {&layers.highlight[0], &layers.highlight[1], &layers.mirror};
-    for (GlossyLobe const* lobe : lobes)
-        if (!(lobe->part == kBlack))
-            sum += lobe->part * lobe->value(v, l);
-    return sum;
+    auto const glossy = [&](GlossyLobe const& lobe) {
+        return lobe.part == kBlack ? kBlack : lobe.part * lobe.value(v, l);
+    };
+    return layers.shares.base * layers.diffuse * kInvPi + glossy(layers.highlight[0])
+        + glossy(layers.highlight[1]) + glossy(layers.mirror);
 }
 
 void MarlowLegacy::transfer(IShaderAPI* api, ShadeState& state) const
@@ -59,7 +58,7 @@ void MarlowLegacy::transfer(IShaderAPI* api, ShadeState& state) const
     Surface const at = surface(api, state);
     Vec3f const l = toLocal(at.frame, state.sampleDirection);
     Vec3f const kept = kWhite - share(mask(api, state));
-    Vec3f const value = kept * scattered(layers(api, state, at), at.v, l);
+    Vec3f const value = kept * scattered(layersAt(api, state, at), at.v, l);
     state.outBrdf = isFinite(value) ? value : kBlack;
     state.sampleCosine = std::isfinite(l.z) ? std::fabs(l.z) : 0.0f;
 }
@@ -73,7 +72,7 @@ void MarlowLegacy::sample(IShaderAPI* api, ShadeState& state) const
         return;
 
     Surface const at = surface(api, state);
-    Layers const layers = this->layers(api, state, at);
+    Layers const layers = layersAt(api, state, at);
     Vec3f const removed = share(mask(api, state));
     Vec3f const kept = kWhite - removed;
     Vec3f const facing = at.v.z < 0.0f ? -at.n() : at.n();
