@@ -1,11 +1,10 @@
-/// Walks the parameters of a shader one by one.
+/// Changes the parameters of a shader one by one.
 #pragma once
 
 #include "support/loadedLibrary.h"
 
 #include <cstring>
 #include <string>
-#include <vector>
 
 namespace zsi::test {
 
@@ -30,31 +29,6 @@ inline void changeParameter(Registered const& row)
             std::memcpy(row.field + at, &v, sizeof v);
         }
     }
-}
-
-/// Names of the parameters that change no result. `setUp(shader, name)` makes the situation in
-/// which the parameter of that name must matter; `run(shader)` gives all results as numbers.
-template <class Shader>
-std::vector<std::string> deadParameters(auto const& setUp, auto const& run)
-{
-    std::vector<std::string> dead;
-    std::size_t const rows = [] {
-        Shader s;
-        return RecordingManager(s).rows.size();
-    }();
-    for (std::size_t i = 0; i < rows; ++i) {
-        Shader shader;
-        RecordingManager const registered(shader);
-        Registered const& row = registered.rows[i];
-        if (row.type == "attribute")
-            continue;
-        setUp(shader, row.name);
-        std::vector<float> const before = run(shader);
-        changeParameter(row);
-        if (run(shader) == before)
-            dead.push_back(row.name);
-    }
-    return dead;
 }
 
 } // namespace zsi::test

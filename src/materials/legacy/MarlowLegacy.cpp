@@ -35,7 +35,7 @@ MarlowLegacy::Lit MarlowLegacy::lights(IShaderAPI* api, ShadeState const& state,
 {
     Lit lit{kBlack, kBlack};
     Vec3f const fullShadow = shadowColor * shadowIntensity + grey(1.0f - shadowIntensity);
-    float const gain[2] = {specularLightGainValue, specular2LightGainValue};
+    float const gain[3] = {specularLightGainValue, specular2LightGainValue, 1.0f};
     for (int side = 0; side < (faceLight ? 2 : 1); ++side) {
         Vec3f const n = side == 0 ? at.n() : -at.n();
         float const up = side == 0 ? 1.0f : -1.0f;
@@ -51,12 +51,10 @@ MarlowLegacy::Lit MarlowLegacy::lights(IShaderAPI* api, ShadeState const& state,
             if (light == kBlack)
                 continue;
             lit.diffuse += light;
-            for (int i = 0; i < 2; ++i)
-                if (!(layers.highlight[i].part == kBlack))
-                    lit.glossy += light * layers.highlight[i].part
-                        * (gain[i] * kPi * layers.highlight[i].value(v, l));
-            if (!(layers.mirror.part == kBlack))
-                lit.glossy += light * layers.mirror.part * (kPi * layers.mirror.value(v, l));
+            for (int i = 0; i < 3; ++i)
+                if (!(layers.lobe[i].part == kBlack))
+                    lit.glossy +=
+                        light * layers.lobe[i].part * (gain[i] * kPi * layers.lobe[i].value(v, l));
         }
     }
     return lit;
@@ -89,12 +87,20 @@ Vec3f MarlowLegacy::diffuseSurroundings(IShaderAPI* api, ShadeState const& state
 Vec3f MarlowLegacy::mirrored(IShaderAPI* api, ShadeState const& state, Surface const& at,
                              Layers const& layers, Vec3f const& open) const
 {
-    Vec3f const highlights = layers.highlight[0].part + layers.highlight[1].part;
+    Vec3f const highlights = layers.lobe[0].part + layers.lobe[1].part;
     Vec3f const reflection = layers.shares.reflection;
     if (highlights == kBlack && reflection == kBlack)
         return kBlack;
     Vec3f const Ng = dot(state.I, state.Ng) > 0.0f ? -state.Ng : state.Ng;
-    Vec3f const r = f_safe_reflect(api, state, state.I, Ng, at.v.z < 0.0f ? -at.n() : at.n());
+    Vec3f const upper = at.v.z < 0.0f ? -at.n() : at.n();
+    Vec3f const r = f_safe_reflect(api, state, state.I, Ng, upper);
+    // A ray that gathers light would carry the image of a lamp as a speck: it sees a matt surface.
+    auto const seen = [&](float width, Vec3f const& weight) {
+        float const importance = maxComponent(weight);
+        return weight
+            * (state.rayType == kRayDiffuse ? api->indirectDiffuse(&state.P, &upper, importance)
+                                            : api->traceSpecular(&state.P, &r, width, importance));
+    };
 
     Vec3f sum = kBlack;
     bool const blurred = IBLSpecMode >= 0 && specularIBLCube.texture;
@@ -109,14 +115,10 @@ Vec3f MarlowLegacy::mirrored(IShaderAPI* api, ShadeState const& state, Surface c
                            {specularIBLContrastPivot, specularIBLContrastValue,
                             specularIBLGainColor, specularIBLGainSource, specularIBLGainValue});
     }
-    auto const traced = [&](GlossyLobe const& lobe) {
-        return lobe.part == kBlack
-            ? kBlack
-            : lobe.part * api->traceSpecular(&state.P, &r, lobe.width, maxComponent(lobe.part));
-    };
     if (!blurred || IBLSpecMode > 0) {
-        sum += traced(layers.highlight[0]);
-        sum += traced(layers.highlight[1]);
+        for (int i = 0; i < 2; ++i)
+            if (!(layers.lobe[i].part == kBlack))
+                sum += seen(layers.lobe[i].width, layers.lobe[i].part);
     }
 
     if (reflection == kBlack)
@@ -134,8 +136,7 @@ Vec3f MarlowLegacy::mirrored(IShaderAPI* api, ShadeState const& state, Surface c
                             .gainSource = reflectIBLGainSource,
                             .gain = reflectIBLGainValue});
     }
-    return sum
-        + reflection * api->traceSpecular(&state.P, &r, surfaceRoughness, maxComponent(reflection));
+    return sum + seen(surfaceRoughness, reflection);
 }
 
 /// Everything but what comes from behind.

@@ -160,8 +160,7 @@ private:
     struct Layers {
         Vec3f diffuse; ///< colour of the base
         SurfaceShares shares;
-        GlossyLobe highlight[2];
-        GlossyLobe mirror; ///< what lights show of the reflection; no part without reflectLight
+        GlossyLobe lobe[3]; ///< two highlights; what reflectLight makes of the reflection
     };
     struct Lit {
         Vec3f diffuse, glossy;

@@ -12,6 +12,11 @@ namespace {
 
 constexpr Vec3f kBlack(0.0f, 0.0f, 0.0f);
 
+/// Width of the lobes that rays which gather light see at least: a narrow highlight that one of
+/// many such rays meets would be a speck in the picture. Kaplanyan and Dachsbacher 2013, "Path
+/// Space Regularization for Holistic and Robust Light Transport".
+constexpr float kGatheredWidth = 0.3f;
+
 /// What the mapping tells beside the colour, for channels that do not ask.
 struct Projection {
     Vec3i boxAxes{0, 1, 2};
@@ -96,7 +101,7 @@ MarlowLegacy::Surface MarlowLegacy::surface(IShaderAPI* api, ShadeState const& s
 MarlowLegacy::Layers MarlowLegacy::layersAt(IShaderAPI* api, ShadeState const& state,
                                             Surface const& at) const
 {
-    Layers l{rgb(diffuse(api, state, false)), {}, {}, {}};
+    Layers l{rgb(diffuse(api, state, false)), {}, {}};
     Vec3f const clear = share(transparency(api, state));
     Vec3f part[2] = {kBlack, kBlack};
     float const cosine = minOf(std::fabs(at.v.z), 1.0f);
@@ -109,14 +114,17 @@ MarlowLegacy::Layers MarlowLegacy::layersAt(IShaderAPI* api, ShadeState const& s
             attribute_uv(state), p.boxAxes, p.tangentU, p.tangentV, specularUVMatrix));
         part[0] = share(color * first.strength(cosine));
         part[1] = share(specular2Color * second.strength(cosine));
-        l.highlight[0].width = first.width;
-        l.highlight[1].width = second.width;
+        l.lobe[0].width = first.width;
+        l.lobe[1].width = second.width;
     }
     l.shares = shareOut(reflectance(cosine), clear, part[0], part[1], transparencyBlocksHighlights);
     for (int i = 0; i < 2; ++i)
-        l.highlight[i].part = l.shares.highlight[i];
+        l.lobe[i].part = l.shares.highlight[i];
     if (reflectLight)
-        l.mirror = {lobeWidth(surfaceRoughness), l.shares.reflection};
+        l.lobe[2] = {lobeWidth(surfaceRoughness), l.shares.reflection};
+    if (state.rayType == kRayDiffuse)
+        for (GlossyLobe& lobe : l.lobe)
+            lobe.width = maxOf(lobe.width, kGatheredWidth);
     return l;
 }
 

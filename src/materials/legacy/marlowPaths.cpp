@@ -49,8 +49,8 @@ Vec3f MarlowLegacy::scattered(Layers const& layers, Vec3f v, Vec3f l) const
     auto const glossy = [&](GlossyLobe const& lobe) {
         return lobe.part == kBlack ? kBlack : lobe.part * lobe.value(v, l);
     };
-    return layers.shares.base * layers.diffuse * kInvPi + glossy(layers.highlight[0])
-        + glossy(layers.highlight[1]) + glossy(layers.mirror);
+    return layers.shares.base * layers.diffuse * kInvPi + glossy(layers.lobe[0])
+        + glossy(layers.lobe[1]) + glossy(layers.lobe[2]);
 }
 
 void MarlowLegacy::transfer(IShaderAPI* api, ShadeState& state) const
@@ -90,7 +90,7 @@ void MarlowLegacy::sample(IShaderAPI* api, ShadeState& state) const
         else
             weight[kStraight] += clear * paneTransmittance(api, state, minOf(above.z, 1.0f));
     }
-    GlossyLobe const lobe[3] = {layers.highlight[0], layers.highlight[1], layers.mirror};
+    GlossyLobe const(&lobe)[3] = layers.lobe;
     if (reflects && !unlitSurface) {
         if (!reflectLight)
             weight[kMirrored] = kept * layers.shares.reflection;

@@ -10,7 +10,8 @@ namespace zsi {
 /// alpha2 about a tilted mean. A slope is the tangent-plane part of a normal over its upright part.
 inline float facetsAbout(Vec3f h, Vec2f s, float alpha2)
 {
-    if (h.z <= 0.0f)
+    constexpr float kLevel = 1e-6f; // no facets; its fourth power is still a number
+    if (h.z <= kLevel)
         return 0.0f;
     float const dx = h.x / h.z - s.x, dy = h.y / h.z - s.y, z2 = h.z * h.z;
     return std::exp(-(dx * dx + dy * dy) / alpha2) / (alpha2 * z2 * z2);
