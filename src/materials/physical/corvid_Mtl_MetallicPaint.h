@@ -18,9 +18,9 @@ namespace zsi {
     U(Mat3f, u_baseTransform, "UV transform of the base colour map")                           \
     P(float, u_baseAmount, (1.0f), "multiplier of the base colour map")                        \
     P(float, u_baseRoughValue, (0.3f), "relief of the base, 0 smooth to 1")                    \
-    P(float, u_flakeSize, (0.05f), "width of a flake, world units")                            \
+    P(float, u_flakeSize, (0.01f), "width of a flake, world units")                            \
     P(float, u_flakeDensity, (0.6f), "share of the surface that flakes cover, 0..1")           \
-    P(float, u_flakeSpread, (0.25f), "width of the flakes' slopes, 0 lie flat, to 1")          \
+    P(float, u_flakeSpread, (0.18f), "width of the flakes' slopes, 0 lie flat, to 1")          \
     P(float, u_flakeRoughValue, (0.08f), "width of the lobe of one flake, 0.01..1")            \
     P(bool, u_flakeMapEnable, (false), "flake colour from the map")                            \
     P(TextureSampler2D, u_flakeMap, (), "flake colour")                                        \
