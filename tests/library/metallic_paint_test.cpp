@@ -50,7 +50,7 @@ ShadeState hitFrom(Vec3d v, Vec3f place = {0.3f, 0.7f, 0.2f}, float distance = 1
 /// Distance from which this many flakes of the default size share a pixel, seen at the cosine.
 float distanceOf(double flakes, double cosine)
 {
-    return 0.05f / 0.001f * static_cast<float>(std::sqrt(flakes * cosine));
+    return 0.01f / 0.001f * static_cast<float>(std::sqrt(flakes * cosine));
 }
 Paint whitePaint()
 {
