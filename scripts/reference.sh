@@ -2,7 +2,7 @@
 # Writes docs/shaders/ from the parameter rows. With --check: fails when the pages are not current.
 set -euo pipefail
 cd "$(dirname "$0")/.."
-describe=build/tools/describe
+describe=${DESCRIBE:-build/tools/describe}
 [ -x "$describe" ] || { echo "reference: build first (scripts/test.sh)" >&2; exit 1; }
 if [ "${1:-}" = --check ]; then
     pages=$(mktemp -d)
