@@ -134,33 +134,29 @@ public:
         shader.registerShader(this);
     }
 
-    void declareEntryPoints(IShaderBase* s, int mask) override
+    using S = IShaderBase*;
+    using Name = char const*;
+    void declareEntryPoints(S s, int mask) override
     {
         sameShader = sameShader && s == shader_;
         maskFirst = masks.empty() && rows.empty();
         masks.push_back(mask);
     }
-    void registerBool(IShaderBase* s, char const* n, bool* f) override { add(s, "bool", n, f); }
-    void registerInt(IShaderBase* s, char const* n, int* f) override { add(s, "int", n, f); }
-    void registerFloat(IShaderBase* s, char const* n, float* f) override { add(s, "float", n, f); }
-    void registerVec2f(IShaderBase* s, char const* n, Vec2f* f) override { add(s, "Vec2f", n, f); }
-    void registerVec3f(IShaderBase* s, char const* n, Vec3f* f) override { add(s, "Vec3f", n, f); }
-    void registerVec4f(IShaderBase* s, char const* n, Vec4f* f) override { add(s, "Vec4f", n, f); }
-    void registerMat3f(IShaderBase* s, char const* n, Mat3f* f) override { add(s, "Mat3f", n, f); }
-    void registerMat4f(IShaderBase* s, char const* n, Mat4f* f) override { add(s, "Mat4f", n, f); }
-    void registerTexture1D(IShaderBase* s, char const* n, TextureSampler1D* f) override
-    {
-        add(s, "Texture1D", n, f);
-    }
-    void registerTexture2D(IShaderBase* s, char const* n, TextureSampler2D* f) override
-    {
-        add(s, "Texture2D", n, f);
-    }
-    void registerTextureCube(IShaderBase* s, char const* n, TextureSamplerCube* f) override
+    void registerBool(S s, Name n, bool* f) override { add(s, "bool", n, f); }
+    void registerInt(S s, Name n, int* f) override { add(s, "int", n, f); }
+    void registerFloat(S s, Name n, float* f) override { add(s, "float", n, f); }
+    void registerVec2f(S s, Name n, Vec2f* f) override { add(s, "Vec2f", n, f); }
+    void registerVec3f(S s, Name n, Vec3f* f) override { add(s, "Vec3f", n, f); }
+    void registerVec4f(S s, Name n, Vec4f* f) override { add(s, "Vec4f", n, f); }
+    void registerMat3f(S s, Name n, Mat3f* f) override { add(s, "Mat3f", n, f); }
+    void registerMat4f(S s, Name n, Mat4f* f) override { add(s, "Mat4f", n, f); }
+    void registerTexture1D(S s, Name n, TextureSampler1D* f) override { add(s, "Texture1D", n, f); }
+    void registerTexture2D(S s, Name n, TextureSampler2D* f) override { add(s, "Texture2D", n, f); }
+    void registerTextureCube(S s, Name n, TextureSamplerCube* f) override
     {
         add(s, "TextureCube", n, f);
     }
-    void registerAttribute(IShaderBase* s, int kind, char const* name, long offset) override
+    void registerAttribute(S s, int kind, Name name, long offset) override
     {
         sameShader = sameShader && s == shader_;
         rows.push_back({"attribute", name, nullptr, 0, 0, kind, offset});
@@ -170,7 +166,7 @@ private:
     IShaderBase* shader_;
 
     template <class T>
-    void add(IShaderBase* s, char const* type, char const* name, T* field)
+    void add(S s, char const* type, Name name, T* field)
     {
         sameShader = sameShader && s == shader_;
         rows.push_back(
@@ -185,35 +181,19 @@ struct EntryPointCall {
     int kind;
     void (*call)(IShaderBase const&, IShaderAPI*, ShadeState&);
 };
+template <class Shader, void (Shader::*entryPoint)(IShaderAPI*, ShadeState&) const>
+void callOn(IShaderBase const& shader, IShaderAPI* api, ShadeState& state)
+{
+    (static_cast<Shader const&>(shader).*entryPoint)(api, state);
+}
 inline constexpr EntryPointCall kEntryPoints[] = {
-    {"shade", 1, 0,
-     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
-         static_cast<MaterialShader const&>(s).shade(api, r);
-     }},
-    {"transmission", 2, 0,
-     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
-         static_cast<MaterialShader const&>(s).transmission(api, r);
-     }},
-    {"transfer", 4, 0,
-     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
-         static_cast<MaterialShader const&>(s).transfer(api, r);
-     }},
-    {"sample", 8, 0,
-     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
-         static_cast<MaterialShader const&>(s).sample(api, r);
-     }},
-    {"specularity", 16, 0,
-     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
-         static_cast<MaterialShader const&>(s).specularity(api, r);
-     }},
-    {"illumination", 32, 1,
-     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
-         static_cast<LightShader const&>(s).illumination(api, r);
-     }},
-    {"environment shade", 64, 2,
-     [](IShaderBase const& s, IShaderAPI* api, ShadeState& r) {
-         static_cast<EnvironmentShader const&>(s).shade(api, r);
-     }},
+    {"shade", 1, 0, callOn<MaterialShader, &MaterialShader::shade>},
+    {"transmission", 2, 0, callOn<MaterialShader, &MaterialShader::transmission>},
+    {"transfer", 4, 0, callOn<MaterialShader, &MaterialShader::transfer>},
+    {"sample", 8, 0, callOn<MaterialShader, &MaterialShader::sample>},
+    {"specularity", 16, 0, callOn<MaterialShader, &MaterialShader::specularity>},
+    {"illumination", 32, 1, callOn<LightShader, &LightShader::illumination>},
+    {"environment shade", 64, 2, callOn<EnvironmentShader, &EnvironmentShader::shade>},
 };
 
 } // namespace zsi::test

@@ -9,6 +9,7 @@
 #include <cstring>
 #include <limits>
 #include <random>
+#include <zsi/vecmath.h>
 
 namespace zsi::test {
 
@@ -94,25 +95,18 @@ public:
     {
         return supply_.chance(4) ? nullptr : lights_.data();
     }
-    Vec3f ambientLight(V p, V n) override { return color(waveOf(p, n)); }
-    Vec3f shadowTransmission(V from, V to) override { return color(waveOf(from, to)); }
-    Vec3f traceContinue(int, V o, V d, float) override { return color(waveOf(o, d)); }
-    Vec3f traceReflection(V o, V d, float) override { return color(waveOf(o, d)); }
+    Vec3f ambientLight(V p, V n) override { return answer(p, n); }
+    Vec3f shadowTransmission(V from, V to) override { return answer(from, to); }
+    Vec3f traceContinue(int, V o, V d, float) override { return answer(o, d); }
+    Vec3f traceReflection(V o, V d, float) override { return answer(o, d); }
     Vec4f traceThrough(V o, V d, float) override
     {
-        Vec3f const c = color(waveOf(o, d));
-        return {c.x, c.y, c.z, supply_.value()};
+        return withAlpha(answer(o, d), supply_.value());
     }
-    Vec3f traceSpecular(V o, V d, float spread, float) override
-    {
-        return color(waveOf(o, d, spread));
-    }
-    Vec3f traceRefraction(V o, V d, float spread, float) override
-    {
-        return color(waveOf(o, d, spread));
-    }
-    Vec3f occlusion(V p, V n, float) override { return color(waveOf(p, n)); }
-    Vec3f indirectDiffuse(V p, V n, float) override { return color(waveOf(p, n)); }
+    Vec3f traceSpecular(V o, V d, float spread, float) override { return answer(o, d, spread); }
+    Vec3f traceRefraction(V o, V d, float spread, float) override { return answer(o, d, spread); }
+    Vec3f occlusion(V p, V n, float) override { return answer(p, n); }
+    Vec3f indirectDiffuse(V p, V n, float) override { return answer(p, n); }
     float random() override { return supply_.uniform(); }
     Vec2f random2D() override
     {
@@ -127,14 +121,10 @@ public:
         return supply_.value() * wave(p->x, p->y, p->z, p->w);
     }
     float noise3DRecord(V p) override { return supply_.value() * waveOf(p, p); }
-    Vec3f cellNoise3D(V p) override { return color(waveOf(p, p)); }
+    Vec3f cellNoise3D(V p) override { return answer(p, p); }
 
 private:
-    Vec3f color(float brightness)
-    {
-        Vec3f const c = supply_.vector();
-        return {c.x * brightness, c.y * brightness, c.z * brightness};
-    }
+    Vec3f answer(V a, V b, float scalar = 0) { return supply_.vector() * waveOf(a, b, scalar); }
 
     Supply supply_;
     std::array<LightSample, 3> lights_;
