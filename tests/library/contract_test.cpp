@@ -2,6 +2,7 @@
 #include "support/loadedLibrary.h"
 
 #include <algorithm>
+#include <cstring>
 #include <gtest/gtest.h>
 
 namespace zsi {

@@ -208,6 +208,10 @@ TEST(Mirror, SamplesTheMirrorDirectionForTheThirdSwitchOnly)
     for (int i = 0; i < 200; ++i) {
         ShadeState s = test::randomHit(random, i % 2);
         s.allowReflection[0] = s.allowReflection[1] = s.allowTransmission[2] = 1;
+        s.outBrdf = {7, 7, 7};
+        ShadeState const before = s;
+        mirror.transfer(nullptr, s);
+        EXPECT_EQ(std::memcmp(&before, &s, sizeof s), 0) << "a perfect mirror scatters nothing";
         s.sampleType = 77;
         mirror.sample(nullptr, s);
         EXPECT_EQ(s.sampleType, 0u);

@@ -3,7 +3,6 @@
 
 #include <cstdint>
 #include <cstdlib>
-#include <cstring>
 #include <fstream>
 #include <map>
 #include <sstream>
@@ -96,20 +95,18 @@ private:
             {"bool", 1},       {"int", 4},        {"float", 4},       {"Vec2f", 8},
             {"Vec3f", 12},     {"Vec4f", 16},     {"Mat3f", 36},      {"Mat4f", 64},
             {"Texture1D", 16}, {"Texture2D", 16}, {"TextureCube", 16}};
-        CatalogueRow row{type, name, std::vector<unsigned char>(kSizes.at(type)), 0, 0};
-        std::size_t at = 0;
+        CatalogueRow row{type, name, {}, 0, 0};
+        std::size_t const size = kSizes.at(type);
         auto const append = [&](auto value) {
-            if (at + sizeof value > row.value.size())
-                throw std::runtime_error("too many values for " + name);
-            std::memcpy(row.value.data() + at, &value, sizeof value);
-            at += sizeof value;
+            auto const* bytes = reinterpret_cast<unsigned char const*>(&value);
+            row.value.insert(row.value.end(), bytes, bytes + sizeof value);
         };
         for (std::string v; in >> v;) {
             if (v == "none") {
                 append(std::int64_t{0});
                 append(std::int64_t{-1});
             } else if (v == "unset")
-                at = row.value.size();
+                row.value.resize(size);
             else if (type == "bool")
                 append(v == "true");
             else if (type == "int")
@@ -120,8 +117,8 @@ private:
                 append(std::strtof(v.c_str(), nullptr));
         }
         in.clear();
-        if (at != row.value.size())
-            throw std::runtime_error("too few values for " + name);
+        if (row.value.size() != size)
+            throw std::runtime_error("not as many values as it has: " + name);
         return row;
     }
 };
