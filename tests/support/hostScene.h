@@ -1,9 +1,12 @@
-/// Scenes in memory for tests of the renderer.
+/// Small scenes in memory, of things whose light is known.
 #pragma once
 
 #include "integrate/render.h"
+#include "scene/meshShapes.h"
+#include "support/hostLibraries.h"
 
 #include <cmath>
+#include <functional>
 #include <memory>
 #include <string>
 #include <utility>
@@ -12,52 +15,103 @@
 
 namespace zsi::test {
 
-/// A material whose entry points are what a test needs them to be.
-class ProbeMaterial : public MaterialShader {
+constexpr Vec3f kWhite{1, 1, 1};
+
+/// An environment picture as a function of the world direction (z up).
+class Sky final : public HostTextureCube {
 public:
-    explicit ProbeMaterial(int entryPoints)
-        : entryPoints_(entryPoints)
+    explicit Sky(std::function<Vec3f(Vec3f)> light)
+        : light_(std::move(light))
+    {
+    }
+    void reserved0() override { }
+    void reserved1() override { }
+    void lookup(Vec4f* result, Vec3f const* d) const override
+    {
+        *result = withAlpha(light_({d->x, -d->z, d->y}), 1.0f);
+    }
+
+private:
+    std::function<Vec3f(Vec3f)> light_;
+};
+
+inline Sky const kWhiteSky([](Vec3f) { return kWhite; });
+
+using EntryPointFunction = std::function<void(IShaderAPI*, ShadeState&)>;
+
+/// Entry points as functions; bounds a medium like glass where `ior` is not 0.
+class Probe final : public MaterialShader {
+public:
+    Probe(EntryPointFunction shade, EntryPointFunction transmission, float ior)
+        : u_ior(ior)
+        , shade_(std::move(shade))
+        , transmission_(std::move(transmission))
     {
     }
     void registerShader(IShaderManager* manager) override
     {
-        manager->declareEntryPoints(this, entryPoints_);
+        manager->declareEntryPoints(this, kShade | (transmission_ ? kTransmission : 0));
+        if (u_ior > 0.0f)
+            manager->registerFloat(this, "u_ior", &u_ior);
     }
     void copy(IShaderBase const*) override { }
+    void shade(IShaderAPI* api, ShadeState& state) const override { shade_(api, state); }
+    void transmission(IShaderAPI* api, ShadeState& state) const override
+    {
+        transmission_(api, state);
+    }
+
+    float u_ior;
 
 private:
-    int entryPoints_;
+    EntryPointFunction shade_, transmission_;
 };
 
-struct SceneBuilder {
+inline Vec4f pixel(host::Picture const& p, int x, int y)
+{
+    float const* c = &p.rgba[static_cast<std::size_t>(y * p.width + x) * 4];
+    return {c[0], c[1], c[2], c[3]};
+}
+
+/// A scene that grows: 8 x 8 pixels of one sample, which all see the origin from above.
+struct Stage {
     host::Scene scene;
 
-    SceneBuilder()
+    Stage()
     {
         scene.film.width = scene.film.height = 8;
-        scene.settings.samples = 16;
-        scene.camera.verticalFov = 20.0f;
+        scene.settings.samples = 1;
+        watch({0, 0, 0}, {0, 0, 1});
     }
 
-    static host::ShaderLibraries const& library()
+    /// Every pixel looks at `point` from `offset` beside it.
+    void watch(Vec3f point, Vec3f offset)
     {
-        static host::ShaderLibraries const libraries = [] {
-            host::ShaderLibraries l;
-            l.load(ZSI_SHADER_LIBRARY);
-            return l;
-        }();
-        return libraries;
+        scene.camera.verticalFov = 1e-3f;
+        scene.camera.position = point + offset;
+        scene.camera.target = point;
+        scene.camera.up = offset.x == 0 && offset.y == 0 ? Vec3f(0, 1, 0) : Vec3f(0, 0, 1);
+    }
+    void sky(Sky const& sky, Vec3f background = {0, 0, 0})
+    {
+        HostTextureCube const* const cube = &sky;
+        scene.environment = make("corvid_Env_Default",
+                                 {{"globalIBLMatrix", Mat3f::identity()},
+                                  {"reflectionCube", cube},
+                                  {"diffuseCube", cube},
+                                  {"backgroundColor", background}});
+    }
+    /// Neither distance nor angle dims it.
+    host::Light& lamp(Vec3f position, Vec3f color = kWhite)
+    {
+        scene.lights.push_back(
+            {make("voPointLight", {{"color", color}, {"attenuationFactors", Vec3f(1e9f, 1, 0)}}),
+             position});
+        return scene.lights.back();
     }
 
+    // Materials; each gives its index.
     using Values = std::vector<std::pair<std::string, host::ParameterValue>>;
-    static host::Shader make(std::string const& className, Values const& values = {})
-    {
-        host::Shader shader = library().create(className);
-        for (auto const& [name, value] : values)
-            shader.set(name, value);
-        return shader;
-    }
-
     int material(host::Shader shader)
     {
         scene.materials.push_back(std::move(shader));
@@ -67,31 +121,42 @@ struct SceneBuilder {
     {
         return material(make(className, values));
     }
-    template <class Probe, class... Arguments>
-    int probe(Arguments&&... arguments)
+    int probe(EntryPointFunction shade, EntryPointFunction transmission = {}, float ior = 0.0f)
     {
-        return material(
-            host::Shader("probe", std::make_unique<Probe>(std::forward<Arguments>(arguments)...)));
+        return material(host::Shader(
+            "probe", std::make_unique<Probe>(std::move(shade), std::move(transmission), ior)));
+    }
+    /// Nothing but a white diffuse layer.
+    int matte(bool withOcclusion = false)
+    {
+        return material("corvid_Mtl_Ward",
+                        {{"u_diffuseColor", kWhite},
+                         {"u_brdf00Reflectivity", 0.0f},
+                         {"u_brdf90Reflectivity", 0.0f},
+                         {"usePrecalcAO", false},
+                         {"usingRaytracedAO", withOcclusion}});
+    }
+    int mirror(float tint, Vec3f mask = {0, 0, 0})
+    {
+        return material("corvid_Mtl_Mirror", {{"u_tintColor", grey(tint)}, {"maskingColor", mask}});
     }
 
-    void add(host::Mesh mesh, int material, Mat4f const& objectToWorld = Mat4f::identity())
+    void add(host::Mesh mesh, int material, Vec3f at)
     {
+        Mat4f toWorld = Mat4f::identity();
+        toWorld.m[12] = at.x, toWorld.m[13] = at.y, toWorld.m[14] = at.z;
+        scene.instances.push_back({static_cast<int>(scene.meshes.size()), material, toWorld});
         scene.meshes.push_back(std::move(mesh));
-        scene.instances.push_back(
-            {static_cast<int>(scene.meshes.size()) - 1, material, objectToWorld});
     }
-
-    host::Light& light(std::string const& className, Vec3f position, Values const& values = {})
+    /// A level square around the z axis, facing up.
+    void card(int material, float z = 0, float half = 1)
     {
-        scene.lights.push_back({make(className, values), position});
-        return scene.lights.back();
+        add(host::planeMesh({2 * half, 2 * half}), material, {0, 0, z});
     }
-
-    void lookAt(Vec3f from, Vec3f to, Vec3f up = {0, 0, 1})
+    /// A level slab around the z axis.
+    void slab(int material, float top, float thickness, float half)
     {
-        scene.camera.position = from;
-        scene.camera.target = to;
-        scene.camera.up = up;
+        add(host::boxMesh({2 * half, 2 * half, thickness}), material, {0, 0, top - thickness / 2});
     }
 
     host::Picture render(int threads = 2, host::RenderReport* report = nullptr) const
@@ -99,6 +164,16 @@ struct SceneBuilder {
         host::RenderOptions options;
         options.threads = threads;
         return host::render(scene, options, report);
+    }
+    Vec4f middle() const { return pixel(render(1), 4, 4); }
+
+private:
+    static host::Shader make(std::string const& className, Values const& values)
+    {
+        host::Shader shader = libraries().create(className);
+        for (auto const& [name, value] : values)
+            shader.set(name, value);
+        return shader;
     }
 };
 
@@ -110,59 +185,6 @@ inline Vec4f mean(host::Picture const& p)
         sum[i % 4] += static_cast<double>(p.rgba[i]) / (static_cast<double>(p.rgba.size()) / 4);
     return {static_cast<float>(sum[0]), static_cast<float>(sum[1]), static_cast<float>(sum[2]),
             static_cast<float>(sum[3])};
-}
-
-inline Vec4f pixel(host::Picture const& p, int x, int y)
-{
-    float const* c = &p.rgba[static_cast<std::size_t>(y * p.width + x) * 4];
-    return {c[0], c[1], c[2], c[3]};
-}
-
-/// A square of the given half size, facing +z, uv over it.
-inline host::Mesh square(float half)
-{
-    host::Mesh m;
-    m.positions = {{-half, -half, 0}, {half, -half, 0}, {half, half, 0}, {-half, half, 0}};
-    m.normals.assign(4, {0, 0, 1});
-    m.uv = {{0, 0}, {1, 0}, {1, 1}, {0, 1}};
-    m.tangents.assign(4, {1, 0, 0});
-    m.bitangents.assign(4, {0, 1, 0});
-    m.triangles = {{0, 1, 2}, {0, 2, 3}};
-    return m;
-}
-
-/// A ball with smooth normals.
-inline host::Mesh ball(float radius, int segments)
-{
-    host::Mesh m;
-    int const rings = segments / 2;
-    for (int j = 0; j <= rings; ++j)
-        for (int i = 0; i <= segments; ++i) {
-            float const theta = 3.14159265f * static_cast<float>(j) / static_cast<float>(rings);
-            float const phi = 6.28318531f * static_cast<float>(i) / static_cast<float>(segments);
-            Vec3f const n{std::sin(theta) * std::cos(phi), std::sin(theta) * std::sin(phi),
-                          std::cos(theta)};
-            m.positions.push_back(n * radius);
-            m.normals.push_back(n);
-            m.uv.push_back({phi / 6.28318531f, 1 - theta / 3.14159265f});
-            m.tangents.push_back({-std::sin(phi), std::cos(phi), 0});
-            m.bitangents.push_back(cross(n, m.tangents.back()));
-        }
-    auto const row = static_cast<std::uint32_t>(segments + 1);
-    for (std::uint32_t j = 0; j < static_cast<std::uint32_t>(rings); ++j)
-        for (std::uint32_t i = 0; i + 1 < row; ++i) {
-            std::uint32_t const a = j * row + i, b = a + row;
-            m.triangles.push_back({a, b, b + 1});
-            m.triangles.push_back({a, b + 1, a + 1});
-        }
-    return m;
-}
-
-inline Mat4f translation(float x, float y, float z)
-{
-    Mat4f m = Mat4f::identity();
-    m.m[12] = x, m.m[13] = y, m.m[14] = z;
-    return m;
 }
 
 } // namespace zsi::test
