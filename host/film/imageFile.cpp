@@ -28,13 +28,13 @@ std::uint8_t encodeSrgb(float linear)
         return 255;
     float const v =
         linear <= 0.0031308f ? 12.92f * linear : 1.055f * std::pow(linear, 1.0f / 2.4f) - 0.055f;
-    return static_cast<std::uint8_t>(v * 255.0f + 0.5f);
+    return static_cast<std::uint8_t>(std::lround(v * 255.0f));
 }
 
 std::uint8_t encodeLinear(float v)
 {
     return !(v > 0.0f) ? std::uint8_t(0)
-                       : static_cast<std::uint8_t>(minOf(v, 1.0f) * 255.0f + 0.5f);
+                       : static_cast<std::uint8_t>(std::lround(minOf(v, 1.0f) * 255.0f));
 }
 
 struct Encoding {
@@ -115,7 +115,7 @@ private:
 /// The bytes of the file. Made in memory, since some encoders do not notice a full disk and one
 /// ends the program over it.
 std::vector<unsigned char> encode(std::filesystem::path const& file, Picture const& picture,
-                                  float exposure, Encoding encoding)
+                                  float exposure, Encoding const& encoding)
 {
     std::vector<unsigned char> result;
     OIIO::Filesystem::IOVecOutput memory(result);

@@ -58,7 +58,7 @@ public:
 
 private:
     JsonReader child(std::string const& key, JsonValue const& value) const;
-    void expect(JsonValue::Kind kind, char const* what) const;
+    void expect(JsonValue::Kind wanted, char const* what) const;
 
     JsonValue const* value_;
     std::string path_;

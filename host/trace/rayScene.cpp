@@ -201,7 +201,7 @@ SurfacePoint RayScene::surface(Hit const& hit) const
     s.u = hit.u;
     s.v = hit.v;
     Vec3f position[3];
-    for (int i = 0; i < 3; ++i)
+    for (std::size_t i = 0; i < 3; ++i)
         position[i] = transformPoint(instance.toWorld, mesh.positions[corner[i]]);
     float const w = 1.0f - hit.u - hit.v;
     // From the corners, not along the ray: the error does not grow with the ray's length.
@@ -217,7 +217,7 @@ SurfacePoint RayScene::surface(Hit const& hit) const
         return s;
     }
     Vec3f normal[3];
-    for (int i = 0; i < 3; ++i)
+    for (std::size_t i = 0; i < 3; ++i)
         normal[i] = normalize(transformDirection(instance.normalToWorld, mesh.normals[corner[i]]));
     if (dot(s.Ng, normal[0] + normal[1] + normal[2]) < 0.0f)
         s.Ng = -s.Ng;
