@@ -85,7 +85,7 @@ void ShaderLibraries::load(fs::path const& sharedObject)
         auto const getVersion =
             function<GetApiVersionFunction>(handle, fmt::format("{}{}", name, kVersionSuffix));
         if (!create || !getVersion)
-            throw InputError(file + ": cannot find the functions of " + name);
+            throw InputError(fmt::format("{}: cannot find the functions of {}", file, name));
         if (int const version = getVersion(); version != kApiVersion)
             throw InputError(
                 fmt::format("{}: {} was built against version {} of the shader interface, "
