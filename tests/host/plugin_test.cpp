@@ -36,8 +36,11 @@ TEST(Plugin, FindsTheClassesOfAnyLibrary)
 
 TEST(Plugin, ObjectsOutliveTheirLibraries)
 {
+    // A file of its own, which nothing else keeps loaded.
+    test::TemporaryFolder const folder;
+    fs::copy_file(fixture("tinyShaders"), folder.path / "own.so");
     auto libraries = std::make_unique<ShaderLibraries>();
-    libraries->load(fixture("tinyShaders"));
+    libraries->load(folder.path / "own.so");
     Shader first = libraries->create("TinyMaterial");
     Shader second = libraries->create("TinyLight");
     libraries.reset();
