@@ -191,6 +191,7 @@ std::vector<host::Shader> allShaders(host::ShaderLibraries const& libraries)
 std::string listText(std::vector<host::Shader> const& shaders)
 {
     std::vector<std::vector<std::string>> rows;
+    rows.reserve(shaders.size());
     for (host::Shader const& shader : shaders)
         rows.push_back({shader.className(), kindName(shader.kind()),
                         fmt::format("{}", fmt::join(entryPointNames(shader.entryPoints()), ", "))});

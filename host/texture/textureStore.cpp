@@ -156,7 +156,7 @@ LatLong readPicture(std::filesystem::path const& file, ColorSpace space)
             fail(file, input.geterror());
         for (int x = 0; x < spec.width; ++x)
             picture.at(x, y) =
-                toRgba(&row[static_cast<std::size_t>(x * spec.nchannels)], spec.nchannels);
+                toRgba(row.data() + std::ptrdiff_t(x) * spec.nchannels, spec.nchannels);
     }
     return picture;
 }
