@@ -52,6 +52,7 @@ TEST(BackgroundGeometry, FacesCutsAndBlendsByAlpha)
                                c.kept ? withAlpha(seen, a + 0.5f * b) : Vec4f(7, 7, 7, 7), 1e-6));
         EXPECT_EQ(g.state.discardHit, c.kept ? 0 : 1);
         ASSERT_EQ(g.host.count("traceThrough"), c.through);
+        EXPECT_TRUE(!c.through || g.host.calls[0].scalars[0] == 1.0f) << "importance";
     }
 }
 
@@ -183,6 +184,11 @@ TEST(BackgroundGeometry, ReflectivityIsSplitBetweenBlurredAndSharp)
         g.shader.specularCube = {};
         float const sharp = std::pow(1 - c, 5.0f); // only the sharp share is left
         EXPECT_TRUE(shows(g, Vec3f(0.1f, 0.2f, 0.3f) * sharp));
+        if (i % 2 == 0) {
+            EXPECT_NEAR(g.host.calls.back().scalars[0], 0.3f * sharp, 1e-6f) << "importance";
+        }
+        g.state.rayType = 32;
+        EXPECT_TRUE(shows(g, {0, 0, 0})) << "rays that gather light see no mirror";
     }
     // A reflection ray takes the ground for the environment, where there is one.
     Ground g;

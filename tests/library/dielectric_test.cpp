@@ -240,7 +240,7 @@ TEST(Dielectric, BendsItsFrameByTheFirstMapOrTheRippleThenTheSecondMap)
         bool ripples;
     };
     constexpr Case kCases[] = {
-        {"other ripple modes", false, false, 2, false},
+        {"other ripple modes", false, true, 2, false},
         {"ripple", false, false, 1, true},
         {"the first map stops the ripple", true, false, 1, false},
         {"the second does not", false, true, 1, true},

@@ -294,6 +294,7 @@ TEST(Metal, HolesShowLetThroughAndAreSampledInTheirShare)
         EXPECT_NEAR(s.Ci.x, keep, 1e-5f);
         EXPECT_NEAR(s.Ci.z, 1, 1e-5f);
         EXPECT_EQ(host.count("traceThrough"), keep < 1);
+        EXPECT_TRUE(keep == 1 || host.calls[0].scalars[0] == 1 - keep) << "importance";
         EXPECT_EQ(host.count("traceSpecular"), keep > 0);
 
         s.allowTransmission[1] = 1;
@@ -317,6 +318,7 @@ TEST(Metal, HolesShowLetThroughAndAreSampledInTheirShare)
     s.allowTransmission[0] = 0;
     metal.sample(&host, s);
     EXPECT_NEAR(both, 2 * s.sampleInvPdf, 1e-4f * both);
+    EXPECT_TRUE(test::near(s.outBrdf, transferTo(metal, s, s.sampleDirection), 1e-4));
     std::memset(s.allowReflection, 0, sizeof s.allowReflection);
     metal.sample(&host, s);
     EXPECT_EQ(s.sampleType, 0u);
