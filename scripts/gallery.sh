@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # Renders every scene of scenes/gallery into docs/gallery, with a contact sheet.
 #   usage: scripts/gallery.sh [NAME...]     only these, such as voSpotLight
-# SAMPLES sets the samples per pixel (default 256).
+# SAMPLES sets the samples per pixel (default 96).
 set -euo pipefail
 cd "$(dirname "$0")/.."
 . scripts/lib/packages.sh
@@ -19,7 +19,7 @@ if [ ${#names[@]} -eq 0 ]; then
 fi
 for name in "${names[@]}"; do
     echo "$name"
-    ./build/zsi render "scenes/gallery/$name.json" -o "$out/$name.jpg" --samples "${SAMPLES:-256}"
+    ./build/zsi render "scenes/gallery/$name.json" -o "$out/$name.jpg" --samples "${SAMPLES:-96}"
 done
 
 sheet=()
