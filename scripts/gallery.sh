@@ -27,8 +27,8 @@ for scene in scenes/gallery/*.json; do
     picture=$out/$(basename "$scene" .json).jpg
     [ -f "$picture" ] && sheet+=("$picture")
 done
-columns=6
+columns=7
 rows=$(((${#sheet[@]} + columns - 1) / columns))
-oiiotool "${sheet[@]}" --mosaic:pad=8:fit=256x192 "${columns}x${rows}" \
-    --compression jpeg:85 -o "$out/contact-sheet.jpg"
+oiiotool "${sheet[@]}" --mosaic:pad=8:fit=240x180 "${columns}x${rows}" \
+    --compression jpeg:75 -o "$out/contact-sheet.jpg"
 echo "Contact sheet: $out/contact-sheet.jpg"
