@@ -1,6 +1,7 @@
 #include "scene/meshFile.h"
 
 #include "base/error.h"
+#include "base/names.h"
 #include "scene/meshCompletion.h"
 
 #include <algorithm>
@@ -10,7 +11,9 @@
 #include <assimp/scene.h>
 #include <cctype>
 #include <fmt/format.h>
+#include <fstream>
 #include <set>
+#include <sstream>
 
 namespace zsi::host {
 
@@ -22,6 +25,39 @@ std::string extensionOf(std::filesystem::path const& file)
     for (char& c : extension)
         c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
     return extension;
+}
+
+/// The importer never comes back from a PLY header that does not end or has a line of another kind.
+void checkPlyHeader(std::filesystem::path const& file)
+{
+    static std::set<std::string> const kWords{"format",  "comment",  "obj_info",
+                                              "element", "property", "end_header"};
+    constexpr int kMostLines = 1000;
+    std::ifstream in(file, std::ios::binary);
+    std::string line;
+    for (int number = 1; number <= kMostLines && std::getline(in, line); ++number) {
+        std::istringstream words(line);
+        std::string word;
+        words >> word;
+        if (number == 1 ? word != "ply" : !kWords.contains(word))
+            throw InputError(fmt::format("{}:{}: not a PLY header: \"{}\"", file.string(), number,
+                                         printable(line)));
+        if (word == "end_header")
+            return;
+    }
+    throw InputError(file.string() + ": the PLY header has no end_header");
+}
+
+/// Whether every face has corners: the importer ends the program over one that has none.
+bool facesHaveCorners(aiScene const& scene)
+{
+    for (unsigned i = 0; i < scene.mNumMeshes; ++i) {
+        aiMesh const& mesh = *scene.mMeshes[i];
+        if (!std::all_of(mesh.mFaces, mesh.mFaces + mesh.mNumFaces,
+                         [](aiFace const& face) { return face.mNumIndices > 0; }))
+            return false;
+    }
+    return true;
 }
 
 Vec3f toVec3f(aiVector3D const& v) { return {v.x, v.y, v.z}; }
@@ -152,13 +188,17 @@ Mesh readMeshFile(std::filesystem::path const& file)
     if (!kKnown.contains(extensionOf(file)))
         throw InputError(file.string()
                          + ": expected a mesh file (.obj, .ply, .stl, .gltf or .glb)");
+    if (extensionOf(file) == ".ply")
+        checkPlyHeader(file);
     Assimp::Importer importer;
     importer.SetPropertyInteger(AI_CONFIG_PP_SBP_REMOVE,
                                 aiPrimitiveType_POINT | aiPrimitiveType_LINE);
-    aiScene const* const scene =
-        importer.ReadFile(file.string(),
-                          aiProcess_ValidateDataStructure | aiProcess_Triangulate
-                              | aiProcess_SortByPType | aiProcess_JoinIdenticalVertices);
+    aiScene const* scene = importer.ReadFile(file.string(), aiProcess_ValidateDataStructure);
+    if (scene && !facesHaveCorners(*scene))
+        throw InputError(file.string() + ": has a face without corners, or ends before its faces");
+    if (scene)
+        scene = importer.ApplyPostProcessing(aiProcess_Triangulate | aiProcess_SortByPType
+                                             | aiProcess_JoinIdenticalVertices);
     if (!scene || !scene->mRootNode)
         throw InputError(fmt::format("{}: cannot be read as a mesh: {}", file.string(),
                                      importer.GetErrorString()));
