@@ -1,7 +1,7 @@
 /// What one scalar call costs at the very least, for the arithmetic that the formulas ask for:
 /// hand-written kernels that the library's stand beside.
 #include "harness.h"
-#include "materials/physical/facetLossTable.h"
+#include "materials/physical/shared/facetLossTable.h"
 
 #include <algorithm>
 #include <cstring>

@@ -1,7 +1,7 @@
-// Writes src/materials/physical/facetLossTable.h: what one bounce on GGX facets loses.
+// Writes src/materials/physical/shared/facetLossTable.h: what one bounce on GGX facets loses.
 //
 //   g++ -std=c++20 -O2 scripts/facetLossTable.cpp -o build/facetLossTable
-//   build/facetLossTable > src/materials/physical/facetLossTable.h
+//   build/facetLossTable > src/materials/physical/shared/facetLossTable.h
 //
 // Loss = 1 - E with E the directional albedo of perfectly reflecting facets: the mean of G2/G1 over
 // visible facet normals (Heitz 2018, "Sampling the GGX Distribution of Visible Normals", eq. 19),

@@ -4,7 +4,7 @@
 #include "cmd/interruption.h"
 #include "cmd/progressBar.h"
 #include "film/imageFile.h"
-#include "scene/loadScene.h"
+#include "load/loadScene.h"
 
 #include <CLI/CLI.hpp>
 #include <charconv>

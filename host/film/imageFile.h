@@ -1,7 +1,7 @@
 /// Pictures to files.
 #pragma once
 
-#include "integrate/render.h"
+#include "render/render.h"
 
 #include <filesystem>
 

@@ -1,10 +1,10 @@
 /// Light along rays: the renderer's side of a shading call.
 #pragma once
 
-#include "integrate/media.h"
-#include "integrate/preparedScene.h"
-#include "integrate/sampler.h"
 #include "light/lightList.h"
+#include "sampling/sampler.h"
+#include "shading/media.h"
+#include "shading/preparedScene.h"
 
 #include <zsi/vecmath.h>
 

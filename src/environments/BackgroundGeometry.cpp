@@ -1,9 +1,9 @@
 #include "environments/BackgroundGeometry.h"
 
 #include "environments/mappedBump.h"
-#include "materials/physical/fresnel.h"
-#include "materials/physical/safeReflect.h"
-#include "materials/utility/straightThrough.h"
+#include "materials/physical/shared/fresnel.h"
+#include "materials/physical/shared/safeReflect.h"
+#include "materials/physical/shared/straightThrough.h"
 
 namespace zsi {
 

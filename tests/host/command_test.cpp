@@ -1,7 +1,7 @@
 // The zsi command as a user meets it: what it hands on and how it ends. What the parts below it
 // make of their input is tested there.
 #include "film/imageFile.h"
-#include "scene/loadScene.h"
+#include "load/loadScene.h"
 #include "support/hostLibraries.h"
 #include "support/inputError.h"
 #include "support/temporaryFolder.h"

@@ -1,6 +1,6 @@
 // From a scene file to picture files.
 #include "film/imageFile.h"
-#include "scene/loadScene.h"
+#include "load/loadScene.h"
 #include "support/hostLibraries.h"
 #include "support/inputError.h"
 #include "support/temporaryFolder.h"

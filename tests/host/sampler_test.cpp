@@ -1,5 +1,5 @@
-#include "film/pixelFilter.h"
-#include "integrate/sampler.h"
+#include "sampling/pixelFilter.h"
+#include "sampling/sampler.h"
 
 #include <cmath>
 #include <functional>

@@ -1,6 +1,6 @@
 // How pictures and masks come to a surface.
 #include "environments/textureMapping.h"
-#include "materials/physical/masking.h"
+#include "materials/physical/shared/masking.h"
 #include "support/scriptedHost.h"
 
 #include <numbers>

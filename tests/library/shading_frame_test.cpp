@@ -1,6 +1,6 @@
-#include "materials/physical/proceduralNormal.h"
-#include "materials/physical/safeReflect.h"
-#include "materials/physical/shadingFrame.h"
+#include "materials/physical/shared/proceduralNormal.h"
+#include "materials/physical/shared/safeReflect.h"
+#include "materials/physical/shared/shadingFrame.h"
 #include "support/reference.h"
 #include "support/scriptedHost.h"
 

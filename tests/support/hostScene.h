@@ -1,8 +1,8 @@
 /// Small scenes in memory, of things whose light is known.
 #pragma once
 
-#include "integrate/render.h"
-#include "scene/meshShapes.h"
+#include "render/render.h"
+#include "mesh/meshShapes.h"
 #include "support/hostLibraries.h"
 
 #include <cmath>

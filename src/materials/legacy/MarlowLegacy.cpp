@@ -1,9 +1,9 @@
 // What the legacy material shows, and what it lets through to lights.
 #include "materials/legacy/MarlowLegacy.h"
 
-#include "materials/physical/safeReflect.h"
-#include "materials/physical/shadingFrame.h"
-#include "materials/utility/facedNormal.h"
+#include "materials/physical/shared/facedNormal.h"
+#include "materials/physical/shared/safeReflect.h"
+#include "materials/physical/shared/shadingFrame.h"
 
 #include <limits>
 

@@ -3,8 +3,8 @@
 #include "environments/channelGrading.h"
 #include "environments/textureMapping.h"
 #include "materials/legacy/glossyLobe.h"
-#include "materials/physical/ambientOcclusion.h"
-#include "materials/physical/masking.h"
+#include "materials/physical/shared/ambientOcclusion.h"
+#include "materials/physical/shared/masking.h"
 
 namespace zsi {
 

@@ -2,10 +2,10 @@
 
 #include "environments/iblGrading.h"
 #include "materials/legacy/curveFresnel.h"
-#include "materials/physical/ggx.h"
-#include "materials/physical/safeReflect.h"
-#include "materials/physical/shadingFrame.h"
-#include "materials/utility/facedNormal.h"
+#include "materials/physical/shared/facedNormal.h"
+#include "materials/physical/shared/ggx.h"
+#include "materials/physical/shared/safeReflect.h"
+#include "materials/physical/shared/shadingFrame.h"
 
 #include <bit>
 

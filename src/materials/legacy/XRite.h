@@ -1,7 +1,7 @@
 #pragma once
 
 #include "materials/legacy/flakeLayer.h"
-#include "materials/physical/materialSkeleton.h"
+#include "materials/physical/shared/materialSkeleton.h"
 
 namespace zsi {
 

@@ -7,7 +7,7 @@
 /// Mapping". Local directions: z along the normal.
 #pragma once
 
-#include "materials/physical/tiltedFacets.h"
+#include "materials/physical/shared/tiltedFacets.h"
 
 #include <cmath>
 #include <cstdint>

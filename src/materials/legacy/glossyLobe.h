@@ -2,8 +2,8 @@
 #pragma once
 
 #include "materials/legacy/surfaceShares.h"
-#include "materials/physical/anisotropicGgx.h"
-#include "materials/physical/fresnel.h"
+#include "materials/physical/shared/anisotropicGgx.h"
+#include "materials/physical/shared/fresnel.h"
 
 namespace zsi {
 

@@ -2,9 +2,9 @@
 #include "environments/mappedBump.h"
 #include "materials/legacy/MarlowLegacy.h"
 #include "materials/legacy/curveFresnel.h"
-#include "materials/physical/safeReflect.h"
-#include "materials/physical/shadingFrame.h"
-#include "materials/utility/facedNormal.h"
+#include "materials/physical/shared/facedNormal.h"
+#include "materials/physical/shared/safeReflect.h"
+#include "materials/physical/shared/shadingFrame.h"
 #include "runtime/builtins.h"
 
 namespace zsi {

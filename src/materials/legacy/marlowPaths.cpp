@@ -1,8 +1,8 @@
 // The legacy material for path tracers: the layers of `shade`, drawn one at a time.
 #include "materials/legacy/MarlowLegacy.h"
-#include "materials/physical/materialSkeleton.h"
-#include "materials/physical/safeReflect.h"
-#include "materials/physical/shadingFrame.h"
+#include "materials/physical/shared/materialSkeleton.h"
+#include "materials/physical/shared/safeReflect.h"
+#include "materials/physical/shared/shadingFrame.h"
 
 namespace zsi {
 namespace {

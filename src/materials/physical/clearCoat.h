@@ -1,8 +1,8 @@
 /// Clear varnish over a layer of colour: what it mirrors and what it lets down and up again.
 #pragma once
 
-#include "materials/physical/anisotropicGgx.h"
-#include "materials/physical/fresnel.h"
+#include "materials/physical/shared/anisotropicGgx.h"
+#include "materials/physical/shared/fresnel.h"
 
 namespace zsi {
 

@@ -1,11 +1,11 @@
 #include "materials/physical/corvid_Mtl_Dielectric.h"
 
-#include "materials/physical/fresnel.h"
-#include "materials/physical/ggx.h"
-#include "materials/physical/lightFade.h"
-#include "materials/physical/proceduralNormal.h"
-#include "materials/physical/safeReflect.h"
-#include "materials/physical/shadingFrame.h"
+#include "materials/physical/shared/fresnel.h"
+#include "materials/physical/shared/ggx.h"
+#include "materials/physical/shared/lightFade.h"
+#include "materials/physical/shared/proceduralNormal.h"
+#include "materials/physical/shared/safeReflect.h"
+#include "materials/physical/shared/shadingFrame.h"
 #include "runtime/builtins.h"
 
 namespace zsi {

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "materials/physical/materialSkeleton.h"
+#include "materials/physical/shared/materialSkeleton.h"
 
 namespace zsi {
 

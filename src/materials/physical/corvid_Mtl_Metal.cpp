@@ -1,11 +1,11 @@
 #include "materials/physical/corvid_Mtl_Metal.h"
 
 #include "materials/physical/gradientRamp.h"
-#include "materials/physical/lightFade.h"
 #include "materials/physical/metalLobe.h"
-#include "materials/physical/shadingFrame.h"
-#include "materials/physical/textureChannel.h"
-#include "materials/utility/straightThrough.h"
+#include "materials/physical/shared/lightFade.h"
+#include "materials/physical/shared/shadingFrame.h"
+#include "materials/physical/shared/straightThrough.h"
+#include "materials/physical/shared/textureChannel.h"
 #include "runtime/builtins.h"
 
 namespace zsi {

@@ -1,9 +1,9 @@
 #pragma once
 
-#include "materials/physical/anisoRotation.h"
-#include "materials/physical/anisotropicGgx.h"
-#include "materials/physical/materialSkeleton.h"
-#include "materials/physical/safeReflect.h"
+#include "materials/physical/shared/anisoRotation.h"
+#include "materials/physical/shared/anisotropicGgx.h"
+#include "materials/physical/shared/materialSkeleton.h"
+#include "materials/physical/shared/safeReflect.h"
 
 namespace zsi {
 

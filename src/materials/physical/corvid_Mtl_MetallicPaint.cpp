@@ -1,10 +1,10 @@
 #include "materials/physical/corvid_Mtl_MetallicPaint.h"
 
-#include "materials/physical/indirectDiffuse.h"
-#include "materials/physical/lightFade.h"
 #include "materials/physical/paintLobe.h"
-#include "materials/physical/proceduralNormal.h"
-#include "materials/physical/textureChannel.h"
+#include "materials/physical/shared/indirectDiffuse.h"
+#include "materials/physical/shared/lightFade.h"
+#include "materials/physical/shared/proceduralNormal.h"
+#include "materials/physical/shared/textureChannel.h"
 #include "runtime/builtins.h"
 
 namespace zsi {

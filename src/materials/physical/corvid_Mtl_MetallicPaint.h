@@ -1,7 +1,7 @@
 #pragma once
 
-#include "materials/physical/materialSkeleton.h"
-#include "materials/physical/safeReflect.h"
+#include "materials/physical/shared/materialSkeleton.h"
+#include "materials/physical/shared/safeReflect.h"
 
 namespace zsi {
 

@@ -1,8 +1,8 @@
 /// Reflection of rough metal: one lobe that lights, paths and evaluation share.
 #pragma once
 
-#include "materials/physical/facetLoss.h"
-#include "materials/physical/fresnel.h"
+#include "materials/physical/shared/facetLoss.h"
+#include "materials/physical/shared/fresnel.h"
 
 namespace zsi {
 

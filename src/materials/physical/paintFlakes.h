@@ -11,8 +11,8 @@
 /// Local directions: unit, z along the normal.
 #pragma once
 
-#include "materials/physical/anisotropicGgx.h"
-#include "materials/physical/tiltedFacets.h"
+#include "materials/physical/shared/anisotropicGgx.h"
+#include "materials/physical/shared/tiltedFacets.h"
 
 #include <zsi/zsi.h>
 

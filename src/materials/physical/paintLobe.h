@@ -3,7 +3,7 @@
 
 #include "materials/physical/clearCoat.h"
 #include "materials/physical/paintFlakes.h"
-#include "materials/physical/shadingFrame.h"
+#include "materials/physical/shared/shadingFrame.h"
 
 namespace zsi {
 

@@ -1,7 +1,7 @@
 #pragma once
 
-#include "materials/physical/ambientOcclusion.h"
-#include "materials/physical/masking.h"
+#include "materials/physical/shared/ambientOcclusion.h"
+#include "materials/physical/shared/masking.h"
 
 namespace zsi {
 

@@ -1,7 +1,7 @@
 #include "materials/utility/corvid_Mtl_Mirror.h"
 
-#include "materials/physical/fresnel.h"
-#include "materials/physical/safeReflect.h"
+#include "materials/physical/shared/fresnel.h"
+#include "materials/physical/shared/safeReflect.h"
 #include "runtime/builtins.h"
 
 namespace zsi {

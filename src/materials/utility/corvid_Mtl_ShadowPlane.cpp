@@ -1,6 +1,6 @@
 #include "materials/utility/corvid_Mtl_ShadowPlane.h"
 
-#include "materials/utility/straightThrough.h"
+#include "materials/physical/shared/straightThrough.h"
 
 #include <zsi/vecmath.h>
 

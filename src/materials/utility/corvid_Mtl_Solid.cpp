@@ -1,6 +1,6 @@
 #include "materials/utility/corvid_Mtl_Solid.h"
 
-#include "materials/utility/facedNormal.h"
+#include "materials/physical/shared/facedNormal.h"
 
 namespace zsi {
 

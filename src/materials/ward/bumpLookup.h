@@ -1,7 +1,7 @@
 /// Heights of a network for the bump of the first normal channel.
 #pragma once
 
-#include "materials/physical/shadingFrame.h"
+#include "materials/physical/shared/shadingFrame.h"
 #include "materials/ward/network.h"
 
 namespace zsi {

@@ -13,7 +13,7 @@
 /// "_ward_diffuse_color_Tile_brickColor_UnifiedBitmap_amount".
 #pragma once
 
-#include "materials/physical/masking.h"
+#include "materials/physical/shared/masking.h"
 #include "materials/ward/bitmapNode.h"
 #include "materials/ward/compileTimeText.h"
 #include "materials/ward/noiseNode.h"

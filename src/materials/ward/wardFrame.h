@@ -1,9 +1,9 @@
 /// Shading frame of the Ward family: bumps, procedural patterns, rotation, visible normals.
 #pragma once
 
-#include "materials/physical/anisoRotation.h"
-#include "materials/physical/proceduralNormal.h"
-#include "materials/physical/shadingFrame.h"
+#include "materials/physical/shared/anisoRotation.h"
+#include "materials/physical/shared/proceduralNormal.h"
+#include "materials/physical/shared/shadingFrame.h"
 #include "materials/ward/wardNoise.h"
 #include "runtime/builtins.h"
 

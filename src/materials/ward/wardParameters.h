@@ -1,7 +1,7 @@
 /// Parameter rows of the Ward family, in blocks that a class puts in its own order.
 #pragma once
 
-#include "materials/physical/materialSkeleton.h"
+#include "materials/physical/shared/materialSkeleton.h"
 
 namespace zsi {
 

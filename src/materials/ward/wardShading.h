@@ -1,10 +1,10 @@
 /// Shading of the Ward family: lights, traced and indirect light, cut-out, occlusion, mask.
 #pragma once
 
-#include "materials/physical/indirectDiffuse.h"
-#include "materials/physical/lightFade.h"
-#include "materials/physical/materialSkeleton.h"
-#include "materials/physical/safeReflect.h"
+#include "materials/physical/shared/indirectDiffuse.h"
+#include "materials/physical/shared/lightFade.h"
+#include "materials/physical/shared/materialSkeleton.h"
+#include "materials/physical/shared/safeReflect.h"
 #include "materials/ward/wardFrame.h"
 #include "materials/ward/wardLobes.h"
 

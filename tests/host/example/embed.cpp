@@ -2,7 +2,7 @@
 //   embed SHADER_FOLDER PICTURE
 #include "base/error.h"
 #include "film/imageFile.h"
-#include "integrate/render.h"
+#include "render/render.h"
 
 #include <cstdio>
 

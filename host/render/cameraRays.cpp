@@ -1,4 +1,4 @@
-#include "integrate/cameraRays.h"
+#include "render/cameraRays.h"
 
 #include <cmath>
 #include <zsi/vecmath.h>

@@ -1,4 +1,4 @@
-#include "integrate/preparedScene.h"
+#include "shading/preparedScene.h"
 
 #include <cstring>
 #include <string_view>

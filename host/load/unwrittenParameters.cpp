@@ -1,4 +1,4 @@
-#include "scene/unwrittenParameters.h"
+#include "load/unwrittenParameters.h"
 
 #include <algorithm>
 #include <limits>

@@ -1,8 +1,8 @@
-#include "integrate/render.h"
+#include "render/render.h"
 
-#include "film/pixelFilter.h"
-#include "integrate/cameraRays.h"
 #include "integrate/tracer.h"
+#include "render/cameraRays.h"
+#include "sampling/pixelFilter.h"
 
 #include <algorithm>
 #include <array>

@@ -1,7 +1,7 @@
 /// Scene files put together: one file, and what it includes.
 #pragma once
 
-#include "scene/jsonTree.h"
+#include "load/jsonTree.h"
 
 namespace zsi::host {
 

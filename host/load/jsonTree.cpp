@@ -1,4 +1,4 @@
-#include "scene/jsonTree.h"
+#include "load/jsonTree.h"
 
 #include "base/error.h"
 #include "base/names.h"

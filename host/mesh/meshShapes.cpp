@@ -1,4 +1,4 @@
-#include "scene/meshShapes.h"
+#include "mesh/meshShapes.h"
 
 #include <cmath>
 

@@ -1,8 +1,8 @@
 /// From JSON to what a shader's parameters take.
 #pragma once
 
+#include "load/jsonReader.h"
 #include "plugin/shaderLibrary.h"
-#include "scene/jsonReader.h"
 
 namespace zsi::host {
 

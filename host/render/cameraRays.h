@@ -1,7 +1,7 @@
 /// Rays of a camera.
 #pragma once
 
-#include "integrate/sampler.h"
+#include "sampling/sampler.h"
 #include "scene/scene.h"
 
 namespace zsi::host {

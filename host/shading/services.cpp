@@ -1,7 +1,7 @@
 // The services of a shading call. docs/services.md describes them.
-#include "integrate/directions.h"
-#include "integrate/noise.h"
 #include "integrate/tracer.h"
+#include "sampling/directions.h"
+#include "shading/noise.h"
 
 #include <limits>
 

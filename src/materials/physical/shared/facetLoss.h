@@ -1,8 +1,8 @@
 /// What light loses by leaving the facets after one bounce, and what further bounces give back.
 #pragma once
 
-#include "materials/physical/anisotropicGgx.h"
-#include "materials/physical/facetLossTable.h"
+#include "materials/physical/shared/anisotropicGgx.h"
+#include "materials/physical/shared/facetLossTable.h"
 
 #include <cstdint>
 

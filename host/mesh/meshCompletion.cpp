@@ -1,4 +1,4 @@
-#include "scene/meshCompletion.h"
+#include "mesh/meshCompletion.h"
 
 #include <algorithm>
 #include <cmath>

@@ -1,4 +1,4 @@
-#include "film/pixelFilter.h"
+#include "sampling/pixelFilter.h"
 
 #include <cmath>
 #include <vector>

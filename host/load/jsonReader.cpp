@@ -1,4 +1,4 @@
-#include "scene/jsonReader.h"
+#include "load/jsonReader.h"
 
 #include "base/error.h"
 #include "base/names.h"

@@ -1,8 +1,8 @@
 /// What `shade` of every masked material has in common, and the front of the physical materials.
 #pragma once
 
-#include "materials/physical/ambientOcclusion.h"
-#include "materials/physical/masking.h"
+#include "materials/physical/shared/ambientOcclusion.h"
+#include "materials/physical/shared/masking.h"
 
 namespace zsi {
 

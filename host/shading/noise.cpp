@@ -1,4 +1,4 @@
-#include "integrate/noise.h"
+#include "shading/noise.h"
 
 #include "base/hash.h"
 

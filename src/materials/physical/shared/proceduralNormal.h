@@ -1,7 +1,7 @@
 /// Procedural bends of the normal: cast-glass ripple and orange peel.
 #pragma once
 
-#include "materials/physical/shadingFrame.h"
+#include "materials/physical/shared/shadingFrame.h"
 
 #include <cmath>
 #include <zsi/vecmath.h>

@@ -1,8 +1,8 @@
-#include "scene/meshFile.h"
+#include "mesh/meshFile.h"
 
 #include "base/error.h"
 #include "base/names.h"
-#include "scene/meshCompletion.h"
+#include "mesh/meshCompletion.h"
 
 #include <algorithm>
 #include <assimp/Importer.hpp>

@@ -1,8 +1,8 @@
-#include "scene/sceneFile.h"
+#include "load/sceneFile.h"
 
 #include "base/error.h"
 #include "base/names.h"
-#include "scene/jsonReader.h"
+#include "load/jsonReader.h"
 
 #include <algorithm>
 

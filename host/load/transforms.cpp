@@ -1,4 +1,4 @@
-#include "scene/transforms.h"
+#include "load/transforms.h"
 
 #include <cmath>
 #include <zsi/vecmath.h>

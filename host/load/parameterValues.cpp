@@ -1,7 +1,7 @@
-#include "scene/parameterValues.h"
+#include "load/parameterValues.h"
 
 #include "base/error.h"
-#include "scene/transforms.h"
+#include "load/transforms.h"
 #include "texture/textureStore.h"
 
 namespace zsi::host {

@@ -1,7 +1,7 @@
 /// Typed, checked access to the values of a JSON tree.
 #pragma once
 
-#include "scene/jsonTree.h"
+#include "load/jsonTree.h"
 
 #include <array>
 #include <limits>

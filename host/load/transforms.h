@@ -1,7 +1,7 @@
 /// Matrices as scene files write them.
 #pragma once
 
-#include "scene/jsonReader.h"
+#include "load/jsonReader.h"
 
 namespace zsi::host {
 

@@ -1,4 +1,4 @@
-#include "integrate/sampler.h"
+#include "sampling/sampler.h"
 
 #include "base/hash.h"
 
