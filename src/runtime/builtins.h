@@ -1,8 +1,9 @@
 /// Built-in functions of the shading language that are more than plain arithmetic.
 #pragma once
 
+#include "runtime/arithmetic.h"
+
 #include <cmath>
-#include <zsi/vecmath.h>
 
 namespace zsi {
 

@@ -10,7 +10,6 @@
 namespace zsi {
 namespace {
 
-constexpr Vec3f kBlack(0.0f, 0.0f, 0.0f);
 constexpr Vec3f kWhite(1.0f, 1.0f, 1.0f);
 
 /// The light category of scenes that this material comes from.
@@ -161,7 +160,7 @@ Vec3f MarlowLegacy::opaquePart(IShaderAPI* api, ShadeState const& state, Surface
 
 void MarlowLegacy::shade(IShaderAPI* api, ShadeState& state) const
 {
-    Vec3f const removed = share(mask(api, state));
+    Vec3f const removed = saturate(mask(api, state));
     if (removed == kWhite) {
         state.discardHit = 1;
         return;
@@ -194,7 +193,7 @@ void MarlowLegacy::shade(IShaderAPI* api, ShadeState& state) const
             alpha = 1.0f - mean(through) * (1.0f - behind.w);
     }
     state.Ci = usingHDRbuffer ? withAlpha(bounded(color), bounded(alpha))
-                              : withAlpha(share(color), share(alpha));
+                              : withAlpha(saturate(color), saturate(alpha));
 }
 
 void MarlowLegacy::transmission(IShaderAPI* api, ShadeState& state) const
@@ -204,7 +203,7 @@ void MarlowLegacy::transmission(IShaderAPI* api, ShadeState& state) const
     Vec3f reflection = reflectance(cosine);
     if (!(reflection == kBlack)) {
         if (transparencyBlocksHighlights)
-            reflection *= kWhite - share(t);
+            reflection *= kWhite - saturate(t);
         t *= kWhite - reflection;
     }
     if (simulatedThickness > 0.0f)

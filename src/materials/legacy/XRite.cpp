@@ -12,8 +12,6 @@
 namespace zsi {
 namespace {
 
-constexpr float kPi = 3.14159265f;
-
 /// Squared width of the coat's highlights: lights are points, and a coat is never quite flat.
 constexpr float kCoatAlpha2 = 0.0016f;
 
@@ -136,7 +134,7 @@ Vec3f XRite::paint(IShaderAPI* api, ShadeState const& state) const
             continue;
         Vec3f const h = normalize(v + l);
         float const f = f_fast_fresnel(api, state, {0.0f, 0.0f, dot(v, h)}, fresnel);
-        highlight += light * (f * kPi * Ggx{kCoatAlpha2}.reflection(v, l, h));
+        highlight += light * (f * kPi * Ggx{.alpha2 = kCoatAlpha2}.reflection(v, l, h));
         if (flaky)
             glints += light * layer.glint(v, l, h, color, color2);
     }

@@ -2,8 +2,8 @@
 #pragma once
 
 #include "materials/legacy/surfaceShares.h"
-#include "materials/physical/shared/anisotropicGgx.h"
 #include "materials/physical/shared/fresnel.h"
+#include "materials/physical/shared/ggx.h"
 
 namespace zsi {
 
@@ -21,7 +21,7 @@ struct Highlight {
     float rollOff, width, gain;
 
     explicit Highlight(Vec3f const& numbers)
-        : rollOff(share(numbers.x))
+        : rollOff(saturate(numbers.x))
         , width(lobeWidth(numbers.y))
         , gain(maxOf(numbers.z, 0.0f))
     {

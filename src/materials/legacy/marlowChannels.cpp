@@ -10,8 +10,6 @@
 namespace zsi {
 namespace {
 
-constexpr Vec3f kBlack(0.0f, 0.0f, 0.0f);
-
 /// Width of the lobes that rays which gather light see at least: a narrow highlight that one of
 /// many such rays meets would be a speck in the picture. Kaplanyan and Dachsbacher 2013, "Path
 /// Space Regularization for Holistic and Robust Light Transport".
@@ -73,8 +71,8 @@ Vec3f MarlowLegacy::reflectance(float cosine) const
 {
     if (unlitSurface || reflectivityColor == kBlack)
         return kBlack;
-    return share(useUniformReflectivity ? reflectivityColor
-                                        : reflectivityColor * curveFresnel(cosine, fresnel));
+    return saturate(useUniformReflectivity ? reflectivityColor
+                                           : reflectivityColor * curveFresnel(cosine, fresnel));
 }
 
 /// The normal is reversed first, so that the relief rises on the side that counts as outside, then
@@ -102,7 +100,7 @@ MarlowLegacy::Layers MarlowLegacy::layersAt(IShaderAPI* api, ShadeState const& s
                                             Surface const& at) const
 {
     Layers l{rgb(diffuse(api, state, false)), {}, {}};
-    Vec3f const clear = share(transparency(api, state));
+    Vec3f const clear = saturate(transparency(api, state));
     Vec3f part[2] = {kBlack, kBlack};
     float const cosine = minOf(std::fabs(at.v.z), 1.0f);
     if (!unlitSurface) {
@@ -112,8 +110,8 @@ MarlowLegacy::Layers MarlowLegacy::layersAt(IShaderAPI* api, ShadeState const& s
             api, state, specularMode, triplanarXY, specularColor, specularTexture,
             specularTextureMatrix, specularAngularRepeat, state.Pref, state.Nref, false,
             attribute_uv(state), p.boxAxes, p.tangentU, p.tangentV, specularUVMatrix));
-        part[0] = share(color * first.strength(cosine));
-        part[1] = share(specular2Color * second.strength(cosine));
+        part[0] = saturate(color * first.strength(cosine));
+        part[1] = saturate(specular2Color * second.strength(cosine));
         l.lobe[0].width = first.width;
         l.lobe[1].width = second.width;
     }

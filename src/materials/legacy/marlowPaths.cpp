@@ -7,14 +7,16 @@
 namespace zsi {
 namespace {
 
-constexpr Vec3f kBlack(0.0f, 0.0f, 0.0f);
 constexpr Vec3f kWhite(1.0f, 1.0f, 1.0f);
 
 /// Below it, mirrored and refracted paths are not blurred.
 constexpr float kSmooth = 0.005f;
 
 /// How often a layer of this weight is drawn, before the sum of all is scaled to 1.
-float chanceOf(Vec3f weight) { return share(weight.x) + share(weight.y) + share(weight.z); }
+float chanceOf(Vec3f weight)
+{
+    return saturate(weight.x) + saturate(weight.y) + saturate(weight.z);
+}
 
 bool isFinite(Vec3f v) { return std::isfinite(v.x) && std::isfinite(v.y) && std::isfinite(v.z); }
 
@@ -57,7 +59,7 @@ void MarlowLegacy::transfer(IShaderAPI* api, ShadeState& state) const
 {
     Surface const at = surface(api, state);
     Vec3f const l = toLocal(at.frame, state.sampleDirection);
-    Vec3f const kept = kWhite - share(mask(api, state));
+    Vec3f const kept = kWhite - saturate(mask(api, state));
     Vec3f const value = kept * scattered(layersAt(api, state, at), at.v, l);
     state.outBrdf = isFinite(value) ? value : kBlack;
     state.sampleCosine = std::isfinite(l.z) ? std::fabs(l.z) : 0.0f;
@@ -73,7 +75,7 @@ void MarlowLegacy::sample(IShaderAPI* api, ShadeState& state) const
 
     Surface const at = surface(api, state);
     Layers const layers = layersAt(api, state, at);
-    Vec3f const removed = share(mask(api, state));
+    Vec3f const removed = saturate(mask(api, state));
     Vec3f const kept = kWhite - removed;
     Vec3f const facing = at.v.z < 0.0f ? -at.n() : at.n();
     Vec3f const above(at.v.x, at.v.y, std::fabs(at.v.z));

@@ -1,13 +1,9 @@
 /// How the light that leaves a hit is shared out among the layers of a surface.
 #pragma once
 
-#include <zsi/vecmath.h>
+#include "runtime/arithmetic.h"
 
 namespace zsi {
-
-/// A share of light: [0, 1]; NaN is none.
-constexpr float share(float x) { return minOf(maxOf(x, 0.0f), 1.0f); }
-constexpr Vec3f share(Vec3f c) { return {share(c.x), share(c.y), share(c.z)}; }
 
 /// Per channel; the five add up to 1.
 struct SurfaceShares {

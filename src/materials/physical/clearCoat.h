@@ -1,8 +1,8 @@
 /// Clear varnish over a layer of colour: what it mirrors and what it lets down and up again.
 #pragma once
 
-#include "materials/physical/shared/anisotropicGgx.h"
 #include "materials/physical/shared/fresnel.h"
+#include "materials/physical/shared/ggx.h"
 
 namespace zsi {
 

@@ -11,8 +11,6 @@
 namespace zsi {
 namespace {
 
-constexpr Vec3f kBlack(0.0f, 0.0f, 0.0f);
-
 /// Roughness from which on paths scatter; smoother interfaces are sampled as polished.
 constexpr float kSmoothRoughness = 0.01f;
 
@@ -52,7 +50,7 @@ float corvid_Mtl_Dielectric::roughness(ShadeState const& state) const
     return u_roughValue;
 }
 
-[[gnu::noinline]] float corvid_Mtl_Dielectric::mappedRoughness(ShadeState const& state) const
+float corvid_Mtl_Dielectric::mappedRoughness(ShadeState const& state) const
 {
     Vec2f const uv = transformUv(u_roughTransform, attribute_uv(state));
     return u_roughAmount * u_roughMap.lookup(uv).x;
@@ -64,9 +62,9 @@ inline bool corvid_Mtl_Dielectric::bends() const
 }
 
 /// By value, so that a frame that nothing bends need not be in memory.
-[[gnu::noinline]] SLArray<Vec3f>
-corvid_Mtl_Dielectric::bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f const& P,
-                                 Mat4f const& toWorld, SLArray<Vec3f> frame) const
+SLArray<Vec3f> corvid_Mtl_Dielectric::bentFrame(IShaderAPI* api, ShadeState const& state,
+                                                Vec3f const& P, Mat4f const& toWorld,
+                                                SLArray<Vec3f> frame) const
 {
     if (u_normal0MapEnable) {
         f_rtBumpPerturb(api, state, frame, attribute_uv(state), u_normal0Map, u_normal0Transform,
@@ -99,7 +97,7 @@ inline void corvid_Mtl_Dielectric::f_computeShadingFrame(IShaderAPI* api, ShadeS
 float corvid_Mtl_Dielectric::lightValue(SLArray<Vec3f> const& frame, Vec3f v, Vec3f L, Indices n,
                                         float r, float F) const
 {
-    Ggx const facets{r}; // the roughness itself is the squared width here
+    Ggx const facets{.alpha2 = r}; // the roughness itself is the squared width here
     Vec3f const l = toLocal(frame, L);
     Vec3f h = reflectionHalf(v, l);
     if (h.z < 0.0f)
@@ -189,7 +187,7 @@ void corvid_Mtl_Dielectric::transfer(IShaderAPI* api, ShadeState& state) const
     float const r = roughness(state);
     float const F = schlick(u_reflectance, v.z);
     state.sampleCosine = std::fabs(l.z);
-    state.outBrdf = grey(interfaceValue(Ggx{r * r}, v, n.outer, l, n.inner, F));
+    state.outBrdf = grey(interfaceValue(Ggx{.alpha2 = r * r}, v, n.outer, l, n.inner, F));
 }
 
 /// cosine: of the view direction against the frame normal; c: against the facet.
@@ -233,9 +231,9 @@ inline void corvid_Mtl_Dielectric::continuePath(ShadeState& state, SLArray<Vec3f
 }
 
 /// framed: the whole frame stands already, not its normal alone.
-[[gnu::always_inline]] inline void
-corvid_Mtl_Dielectric::samplePolished(IShaderAPI* api, ShadeState& state, SLArray<Vec3f>& frame,
-                                      bool framed, Indices n) const
+inline void corvid_Mtl_Dielectric::samplePolished(IShaderAPI* api, ShadeState& state,
+                                                  SLArray<Vec3f>& frame, bool framed,
+                                                  Indices n) const
 {
     // The facet is the frame normal: the rest of the frame waits until the host has been asked.
     Vec3f const N = frame[2];
@@ -255,11 +253,11 @@ corvid_Mtl_Dielectric::samplePolished(IShaderAPI* api, ShadeState& state, SLArra
     continuePath(state, frame, d, event.weight, event, n);
 }
 
-[[gnu::always_inline]] inline void
-corvid_Mtl_Dielectric::sampleRough(IShaderAPI* api, ShadeState& state, SLArray<Vec3f>& frame,
-                                   bool framed, Indices n, float r) const
+inline void corvid_Mtl_Dielectric::sampleRough(IShaderAPI* api, ShadeState& state,
+                                               SLArray<Vec3f>& frame, bool framed, Indices n,
+                                               float r) const
 {
-    Ggx const facets{r * r};
+    Ggx const facets{.alpha2 = r * r};
     Vec2f const xi = api->random2D();
     float const tan2 = facets.sampleTan2(xi.x);
     float const cosine = 1.0f / std::sqrt(1.0f + tan2);

@@ -7,11 +7,6 @@
 #include "runtime/builtins.h"
 
 namespace zsi {
-namespace {
-
-constexpr Vec3f kBlack(0.0f, 0.0f, 0.0f);
-
-} // namespace
 
 Vec3f corvid_Mtl_Glazing::transmissionTint(ShadeState const& state) const
 {
@@ -32,7 +27,7 @@ void corvid_Mtl_Glazing::f_calculateColors(IShaderAPI* api, ShadeState const& st
         computeBaseFrame(attribute_tangent(state), N, Mat3f(state.objectToWorld));
     Vec3f const v = toLocal(frame, -state.I);
     float const R = reflectance();
-    Ggx const facets{u_rough};
+    Ggx const facets{.alpha2 = u_rough};
 
     for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
          light = light->next) {
@@ -80,7 +75,7 @@ void corvid_Mtl_Glazing::transfer(IShaderAPI*, ShadeState& state) const
     Vec3f const l = toLocal(frame, state.sampleDirection);
     Vec3f const mirrored(l.x, l.y, -l.z);
     // Through the pane with index 1 on both sides the Jacobian is that of the mirrored reflection.
-    Ggx const facets{u_rough};
+    Ggx const facets{.alpha2 = u_rough};
     float const R = reflectance();
     state.sampleCosine = std::fabs(l.z);
     state.outBrdf =

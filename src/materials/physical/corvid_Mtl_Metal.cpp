@@ -11,15 +11,9 @@
 namespace zsi {
 namespace {
 
-constexpr Vec3f kBlack(0.0f, 0.0f, 0.0f);
-
 /// Narrowest lobe: a highlight of a twentieth of a degree, which still has a finite density, so
 /// polished metal needs no case of its own.
 constexpr float kLeastWidth = 0.001f;
-
-/// [0, 1]; NaN becomes 0.
-float unitRange(float t) { return minOf(maxOf(t, 0.0f), 1.0f); }
-Vec3f unitRange(Vec3f c) { return {unitRange(c.x), unitRange(c.y), unitRange(c.z)}; }
 
 float greyOf(Vec4f c) { return (c.x + c.y + c.z) * 0.3333333f; }
 
@@ -59,8 +53,7 @@ void corvid_Mtl_Metal::f_computeShadingFrameNative(IShaderAPI* api, ShadeState c
 }
 
 /// The whole frame by value, so that one that nothing bends need not be in memory for this.
-[[gnu::noinline]] SLArray<Vec3f>
-corvid_Mtl_Metal::bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f Nf) const
+SLArray<Vec3f> corvid_Mtl_Metal::bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f Nf) const
 {
     SLArray<Vec3f> frame;
     f_computeShadingFrameNative(api, state, state.P, Nf, Mat3f(state.objectToWorld), frame);
@@ -70,8 +63,8 @@ corvid_Mtl_Metal::bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f Nf) 
 }
 
 /// Orthonormal frame of the lobe, tangent along the brush marks.
-[[gnu::always_inline]] inline SLArray<Vec3f>
-corvid_Mtl_Metal::lobeFrame(IShaderAPI* api, ShadeState const& state, Vec3f const& Nf) const
+inline SLArray<Vec3f> corvid_Mtl_Metal::lobeFrame(IShaderAPI* api, ShadeState const& state,
+                                                  Vec3f const& Nf) const
 {
     SLArray<Vec3f> frame;
     if (u_patternEnable || u_bumpSwitcher == 1) [[unlikely]]
@@ -98,7 +91,7 @@ inline AnisotropicGgx corvid_Mtl_Metal::facets(ShadeState const& state) const
 }
 
 /// Share of the surface that the cut-out keeps, 0..1.
-inline float corvid_Mtl_Metal::kept(ShadeState const& state) const
+inline float corvid_Mtl_Metal::coverage(ShadeState const& state) const
 {
     if (u_cutoutMapEnable) [[unlikely]]
         return clamp01(
@@ -106,25 +99,25 @@ inline float corvid_Mtl_Metal::kept(ShadeState const& state) const
     return 1.0f;
 }
 
-[[gnu::always_inline]] inline MetalLobe corvid_Mtl_Metal::lobe(ShadeState const& state,
-                                                               Vec3f const& v) const
+inline MetalLobe corvid_Mtl_Metal::lobe(ShadeState const& state, Vec3f const& v) const
 {
     Vec3f r0 = u_reflectColor, edge = u_edgeColor;
     if (u_reflectMapEnable) [[unlikely]]
         r0 = mappedColor(u_reflectMap, u_reflectTransform, u_reflectAmount, attribute_uv(state));
     if (u_edgeMapEnable) [[unlikely]]
         edge = mappedColor(u_edgeMap, u_edgeTransform, u_edgeAmount, attribute_uv(state));
-    return {facets(state), ConductorFresnel(unitRange(r0), unitRange(edge)), v};
+    return {facets(state), ConductorFresnel(saturate(r0), saturate(edge)), v};
 }
 
 void corvid_Mtl_Metal::f_calculateColors(IShaderAPI* api, ShadeState const& state,
                                          PhysicalColors& out) const
 {
-    float const keep = kept(state);
-    if (keep != 1.0f) {
-        out.refraction = rgb(api->traceThrough(&state.P, &state.I, 1.0f - keep)) * (1.0f - keep);
-        out.transmissionWeight = grey(1.0f - keep);
-        if (keep == 0.0f)
+    float const opacity = coverage(state);
+    if (opacity != 1.0f) {
+        out.refraction =
+            rgb(api->traceThrough(&state.P, &state.I, 1.0f - opacity)) * (1.0f - opacity);
+        out.transmissionWeight = grey(1.0f - opacity);
+        if (opacity == 0.0f)
             return;
     }
     float const side = -facingSign(state.I, state.Ng);
@@ -145,10 +138,10 @@ void corvid_Mtl_Metal::f_calculateColors(IShaderAPI* api, ShadeState const& stat
             if (fade == 0.0f || !(l.z > 0.0f))
                 continue;
             out.lit +=
-                light->color * light->shadow * metal.value(l) * (light->weight * fade * keep);
+                light->color * light->shadow * metal.value(l) * (light->weight * fade * opacity);
         }
 
-    out.reflectionWeight = metal.albedo() * keep;
+    out.reflectionWeight = metal.albedo() * opacity;
     if (out.reflectionWeight == kBlack)
         return;
     Vec3f const R = f_safe_reflect(api, state, state.I, Ngf, N);
@@ -164,7 +157,7 @@ void corvid_Mtl_Metal::shade(IShaderAPI* api, ShadeState& state) const
 
 void corvid_Mtl_Metal::transmission(IShaderAPI*, ShadeState& state) const
 {
-    state.transmissionColor = grey(1.0f - kept(state));
+    state.transmissionColor = grey(1.0f - coverage(state));
 }
 
 void corvid_Mtl_Metal::transfer(IShaderAPI* api, ShadeState& state) const
@@ -178,26 +171,26 @@ void corvid_Mtl_Metal::transfer(IShaderAPI* api, ShadeState& state) const
         state.sampleCosine = 0.0f;
         return;
     }
-    state.outBrdf = lobe(state, v).value(l) * kept(state);
+    state.outBrdf = lobe(state, v).value(l) * coverage(state);
     state.sampleCosine = l.z;
 }
 
 void corvid_Mtl_Metal::sample(IShaderAPI* api, ShadeState& state) const
 {
     bool const mayReflect = anySwitch(state.allowReflection);
-    float const keep = kept(state);
+    float const opacity = coverage(state);
     float chance = 1.0f; // that the metal is taken, not a hole
-    if (keep < 1.0f && anySwitch(state.allowTransmission)) {
-        if (!mayReflect || api->random() >= keep) {
+    if (opacity < 1.0f && anySwitch(state.allowTransmission)) {
+        if (!mayReflect || api->random() >= opacity) {
             sampleStraightThrough(state);
             if (!mayReflect)
-                state.outBrdf = grey(1.0f - keep);
+                state.outBrdf = grey(1.0f - opacity);
             return;
         }
-        chance = keep;
+        chance = opacity;
     }
     state.sampleType = kSampleNone;
-    if (!mayReflect || keep == 0.0f)
+    if (!mayReflect || opacity == 0.0f)
         return;
     Vec3f const Nf = -state.N * facingSign(state.I, state.Ng);
     SLArray<Vec3f> const frame = lobeFrame(api, state, Nf);
@@ -212,7 +205,7 @@ void corvid_Mtl_Metal::sample(IShaderAPI* api, ShadeState& state) const
     if (!(dot(Nf, direction) > 0.0f)) // below the surface that is not bent
         return;
     state.sampleDirection = direction;
-    state.outBrdf = s.value * keep;
+    state.outBrdf = s.value * opacity;
     state.sampleCosine = s.l.z;
     state.sampleInvPdf = 1.0f / (s.pdf * chance);
     state.sampleType = (state.allowReflection[0] | state.allowReflection[1]) != 0 ? kSampleMixture

@@ -1,7 +1,7 @@
 #pragma once
 
 #include "materials/physical/shared/anisoRotation.h"
-#include "materials/physical/shared/anisotropicGgx.h"
+#include "materials/physical/shared/ggx.h"
 #include "materials/physical/shared/materialSkeleton.h"
 #include "materials/physical/shared/safeReflect.h"
 
@@ -71,7 +71,7 @@ private:
     void bendByFacets(IShaderAPI* api, ShadeState const& state, SLArray<Vec3f>& frame) const;
     SLArray<Vec3f> lobeFrame(IShaderAPI* api, ShadeState const& state, Vec3f const& Nf) const;
     AnisotropicGgx facets(ShadeState const& state) const;
-    float kept(ShadeState const& state) const;
+    float coverage(ShadeState const& state) const;
     MetalLobe lobe(ShadeState const& state, Vec3f const& v) const;
 };
 

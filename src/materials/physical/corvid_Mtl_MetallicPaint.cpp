@@ -8,18 +8,6 @@
 #include "runtime/builtins.h"
 
 namespace zsi {
-namespace {
-
-constexpr Vec3f kBlack(0.0f, 0.0f, 0.0f);
-
-/// lo..hi; NaN becomes lo.
-float within(float x, float lo, float hi) { return minOf(maxOf(x, lo), hi); }
-Vec3f color01(Vec3f c)
-{
-    return {within(c.x, 0.0f, 1.0f), within(c.y, 0.0f, 1.0f), within(c.z, 0.0f, 1.0f)};
-}
-
-} // namespace
 
 void corvid_Mtl_MetallicPaint::f_computeShadingFrame(IShaderAPI* api, ShadeState const& state,
                                                      Vec3f const& P, Vec3f const& N,
@@ -55,9 +43,8 @@ PaintFrames corvid_Mtl_MetallicPaint::frames(IShaderAPI* api, ShadeState const& 
 
 FlakeFootprint corvid_Mtl_MetallicPaint::footprint(IShaderAPI* api, ShadeState const& state) const
 {
-    FlakeRecipe const flakes{u_flakeSize, within(u_flakeDensity, 0.0f, 1.0f),
-                             within(u_flakeSpread, 0.0f, 1.0f),
-                             within(u_flakeRoughValue, 0.01f, 1.0f)};
+    FlakeRecipe const flakes{u_flakeSize, saturate(u_flakeDensity), saturate(u_flakeSpread),
+                             saturate(u_flakeRoughValue, 0.01f, 1.0f)};
     // Gathered light has no pixel that could show flakes.
     if (flakes.density == 0.0f || !(flakes.size > 0.0f) || state.rayType == kRayDiffuse)
         return FlakeFootprint(flakes);
@@ -85,8 +72,8 @@ PaintColors corvid_Mtl_MetallicPaint::colors(ShadeState const& state) const
     Vec3f const flake = u_flakeMapEnable
         ? mappedColor(u_flakeMap, u_flakeTransform, u_flakeAmount, attribute_uv(state))
         : u_flakeColor;
-    return {color01(base), within(u_baseRoughValue, 0.0f, 1.0f), color01(flake),
-            withAlpha(color01(rgb(u_pearlColor)), within(u_pearlColor.w, 0.0f, 1.0f))};
+    return {saturate(base), saturate(u_baseRoughValue), saturate(flake),
+            withAlpha(saturate(rgb(u_pearlColor)), saturate(u_pearlColor.w))};
 }
 
 float corvid_Mtl_MetallicPaint::coatWidth(ShadeState const& state) const
@@ -95,7 +82,7 @@ float corvid_Mtl_MetallicPaint::coatWidth(ShadeState const& state) const
         ? mappedValue(u_coatRoughMap, u_coatRoughTransform, u_coatRoughAmount, attribute_uv(state))
         : u_coatRoughValue;
     // A highlight of a twentieth of a degree is a mirror's, and still has a finite density.
-    return within(width, 0.001f, 0.5f);
+    return saturate(width, 0.001f, 0.5f);
 }
 
 /// Nf: the normal as faced by V, the direction to the viewer.
@@ -103,7 +90,7 @@ inline PaintLobe corvid_Mtl_MetallicPaint::lobe(IShaderAPI* api, ShadeState cons
                                                 Vec3f const& Nf, Vec3f const& V) const
 {
     return {colors(state),          footprint(api, state),
-            frames(api, state, Nf), within(u_coatReflectivity, 0.0f, 1.0f),
+            frames(api, state, Nf), saturate(u_coatReflectivity),
             coatWidth(state),       V};
 }
 

@@ -27,24 +27,28 @@ struct ConductorFresnel {
     Vec3f operator()(float c) const
     {
         float const w = schlickWeight(c);
-        return kept(r0 * (1.0f - w) + grey(w) - bump * (c * (1.0f - c) * w));
+        return nonNegative(r0 * (1.0f - w) + grey(w) - bump * (c * (1.0f - c) * w));
     }
 
     /// Mean over the hemisphere, weighted with the cosine: the integral of 2 c F(c).
-    Vec3f mean() const { return kept(r0 * (20.0f / 21.0f) + grey(1.0f / 21.0f) - bump / 126.0f); }
+    Vec3f mean() const
+    {
+        return nonNegative(r0 * (20.0f / 21.0f) + grey(1.0f / 21.0f) - bump / 126.0f);
+    }
 
 private:
     /// Dark metals with a dark edge would fall below black.
-    static Vec3f kept(Vec3f f) { return {maxOf(f.x, 0.0f), maxOf(f.y, 0.0f), maxOf(f.z, 0.0f)}; }
+    static Vec3f nonNegative(Vec3f f)
+    {
+        return {maxOf(f.x, 0.0f), maxOf(f.y, 0.0f), maxOf(f.z, 0.0f)};
+    }
 };
 
 /// Metal seen along v; v and every l are local, unit, with z > 0. Values are 1/sr.
 class MetalLobe {
 public:
     /// facets: widths as `FacetLoss` takes them.
-    /// Inlined, as `value` and `sample` are: the lobe then stays in registers.
-    [[gnu::always_inline]] MetalLobe(AnisotropicGgx facets, ConductorFresnel const& fresnel,
-                                     Vec3f v)
+    MetalLobe(AnisotropicGgx facets, ConductorFresnel const& fresnel, Vec3f v)
         : facets_(facets)
         , fresnel_(fresnel)
         , loss_(facets)
@@ -56,14 +60,14 @@ public:
         float const lost = loss_.mean();
         Vec3f const F = fresnel.mean();
         Vec3f const rest = grey(1.0f) - F * lost;
-        float const kept = 1.0f - lost;
-        further_ = {F.x * F.x * kept / rest.x, F.y * F.y * kept / rest.y,
-                    F.z * F.z * kept / rest.z};
+        float const meanAlbedo = 1.0f - lost;
+        further_ = {F.x * F.x * meanAlbedo / rest.x, F.y * F.y * meanAlbedo / rest.y,
+                    F.z * F.z * meanAlbedo / rest.z};
         broad_ = lossV_ > 0.0f ? lossV_ * kInvPi / lost : 0.0f;
     }
 
     /// Scattering value, without the cosine.
-    [[gnu::always_inline]] Vec3f value(Vec3f l) const { return value(l, Facet(facets_, v_ + l)); }
+    Vec3f value(Vec3f l) const { return value(l, Facet(facets_, v_ + l)); }
 
     /// Share of light from v that leaves, taking the reflectance of the mirror direction for all.
     Vec3f albedo() const { return fresnel_(v_.z) * (1.0f - lossV_) + further_ * lossV_; }
@@ -77,7 +81,7 @@ public:
         float pdf; ///< 1/sr; 0 where l is below the surface
     };
     /// A direction by the single bounces, or by the cosine as often as light bounces further.
-    [[gnu::always_inline]] Sample sample(float pick, Vec2f u) const
+    Sample sample(float pick, Vec2f u) const
     {
         Sample s;
         if (pick < lossV_) {
@@ -109,7 +113,7 @@ private:
         }
     };
 
-    [[gnu::always_inline]] Vec3f value(Vec3f l, Facet facet) const
+    Vec3f value(Vec3f l, Facet facet) const
     {
         float const once = facet.density
             * AnisotropicGgx::visibility(v_.z, stretchedV_, l.z, facets_.stretched(l));

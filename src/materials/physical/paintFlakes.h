@@ -11,7 +11,7 @@
 /// Local directions: unit, z along the normal.
 #pragma once
 
-#include "materials/physical/shared/anisotropicGgx.h"
+#include "materials/physical/shared/ggx.h"
 #include "materials/physical/shared/tiltedFacets.h"
 
 #include <zsi/zsi.h>

@@ -7,6 +7,7 @@
 #include "materials/physical/shared/safeReflect.h"
 #include "materials/ward/wardFrame.h"
 #include "materials/ward/wardLobes.h"
+#include "runtime/arithmetic.h"
 
 namespace zsi {
 
@@ -26,7 +27,6 @@ struct WardShadingFunctions {
 private:
     /// Highlights below this are not worth their exponential.
     static constexpr float kSpecularThreshold = 1e-5f;
-    static constexpr Vec3f kBlack{0.0f, 0.0f, 0.0f};
 
     Shader const& self() const { return static_cast<Shader const&>(*this); }
 

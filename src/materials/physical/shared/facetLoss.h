@@ -1,20 +1,20 @@
 /// What light loses by leaving the facets after one bounce, and what further bounces give back.
 #pragma once
 
-#include "materials/physical/shared/anisotropicGgx.h"
 #include "materials/physical/shared/facetLossTable.h"
+#include "materials/physical/shared/ggx.h"
 
 #include <cstdint>
 
 namespace zsi {
 
-/// Position of x, 0 up, between the nodes of a table: node below and share of the one above. What
-/// lies beyond the last node, and NaN, is taken as that node, less a rounding error that keeps the
-/// node above inside the table.
+/// Position of x, 0 up, between the nodes of a table: node below and fraction of the way to the one
+/// above. What lies beyond the last node, and NaN, is taken as that node, less a rounding error
+/// that keeps the node above inside the table.
 template <int Nodes>
 struct TablePosition {
     std::int64_t node;
-    float share;
+    float fraction;
 
     explicit TablePosition(float x)
     {
@@ -22,7 +22,7 @@ struct TablePosition {
         static_assert(kEnd < static_cast<float>(Nodes - 1));
         x = minOf(x, kEnd);
         node = static_cast<std::int64_t>(x);
-        share = x - static_cast<float>(node);
+        fraction = x - static_cast<float>(node);
     }
 };
 
@@ -49,39 +49,39 @@ public:
     }
 
     /// Mean of the loss over the hemisphere, weighted with the cosine.
-    [[gnu::always_inline]] float mean() const
+    float mean() const
     {
         TablePosition<kMeanWidths> const width(rootWide_ * (kMeanWidths - 1));
         float const* const cell = flat(kMeanFacetLoss) + (width.node * kRatios + ratio_.node);
-        float const below = lerp(cell[0], cell[1], ratio_.share);
-        float const above = lerp(cell[kRatios], cell[kRatios + 1], ratio_.share);
-        return wide_ * lerp(below, above, width.share);
+        float const below = lerp(cell[0], cell[1], ratio_.fraction);
+        float const above = lerp(cell[kRatios], cell[kRatios + 1], ratio_.fraction);
+        return wide_ * lerp(below, above, width.fraction);
     }
 
     /// Share of the light along w that single bounces on perfect mirrors do not send out.
-    [[gnu::always_inline]] float operator()(Vec3f w) const
+    float operator()(Vec3f w) const
     {
         TablePosition<kCosines> const cosine(w.z * (1.0f + wide_) / (w.z + wide_) * (kCosines - 1));
         float const* const cell =
             flat(kFacetLoss) + (width_.node * kWidthStep + cosine.node * kCosineStep);
         auto const across = [&](float const* at) {
-            return lerp(at[0], at[kCosineStep], cosine.share);
+            return lerp(at[0], at[kCosineStep], cosine.fraction);
         };
         if (isotropic_) { // the same at every azimuth
             float const* const even = cell + (kRatios - 1) * kRatioStep;
-            return lerp(across(even), across(even + kWidthStep), width_.share);
+            return lerp(across(even), across(even + kWidthStep), width_.fraction);
         }
         float const side = std::sqrt(w.x * w.x + w.y * w.y);
         TablePosition<kAzimuths> const azimuth(std::fabs(alongX_ ? w.x : w.y) / side
                                                * (kAzimuths - 1));
         auto const around = [&](float const* at) {
-            return lerp(across(at), across(at + 1), azimuth.share);
+            return lerp(across(at), across(at + 1), azimuth.fraction);
         };
         auto const along = [&](float const* at) {
-            return lerp(around(at), around(at + kRatioStep), ratio_.share);
+            return lerp(around(at), around(at + kRatioStep), ratio_.fraction);
         };
         float const* const uneven = cell + (ratio_.node * kRatioStep + azimuth.node);
-        return lerp(along(uneven), along(uneven + kWidthStep), width_.share);
+        return lerp(along(uneven), along(uneven + kWidthStep), width_.fraction);
     }
 
 private:

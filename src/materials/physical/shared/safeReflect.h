@@ -12,7 +12,7 @@ inline constexpr float kReflectMargin = 0.05f;
 
 /// The unit vector in the plane of I and N whose height above the surface is the margin, or N where
 /// there is none.
-[[gnu::noinline]] inline Vec3f atReflectMargin(Vec3f I, Vec3f Ng, Vec3f N)
+inline Vec3f atReflectMargin(Vec3f I, Vec3f Ng, Vec3f N)
 {
     // R' = alpha I + beta N with |R'| = 1 and R'.Ng = margin: a quadratic in beta.
     float const g = dot(I, Ng), s = dot(Ng, N), d = dot(I, N);
@@ -37,7 +37,7 @@ inline constexpr float kReflectMargin = 0.05f;
 
 /// `R`, or the vector at the margin where it dips below that. I: towards the surface; Ng, N: on the
 /// viewer's side; R: the mirror direction of I about N.
-[[gnu::always_inline]] inline Vec3f keepAboveSurface(Vec3f R, Vec3f I, Vec3f Ng, Vec3f N)
+inline Vec3f keepAboveSurface(Vec3f R, Vec3f I, Vec3f Ng, Vec3f N)
 {
     if (dot(R, Ng) >= kReflectMargin) [[likely]]
         return R;
@@ -62,16 +62,14 @@ inline Incidence incidence(ShadeState const& state)
 }
 
 /// I mirrored about N, kept above the surface.
-[[gnu::always_inline]] inline Vec3f f_safe_reflect(IShaderAPI*, ShadeState const&, Vec3f I,
-                                                   Vec3f Ng, Vec3f N)
+inline Vec3f f_safe_reflect(IShaderAPI*, ShadeState const&, Vec3f I, Vec3f Ng, Vec3f N)
 {
     return keepAboveSurface(I - 2.0f * dot(N, I) * N, I, Ng, N);
 }
 
 /// The same as a member; derive from this where the shading language had one.
 struct SafeReflectFunctions {
-    [[gnu::always_inline]] Vec3f f_safe_reflect(IShaderAPI* api, ShadeState const& state, Vec3f I,
-                                                Vec3f Ng, Vec3f N) const
+    Vec3f f_safe_reflect(IShaderAPI* api, ShadeState const& state, Vec3f I, Vec3f Ng, Vec3f N) const
     {
         return zsi::f_safe_reflect(api, state, I, Ng, N);
     }

@@ -12,21 +12,17 @@
 namespace zsi {
 
 /// Frame of a normal as it is, unit or not: the tangent made perpendicular to it, both unit.
-[[gnu::always_inline]] inline SLArray<Vec3f> orthonormalFrame(Vec3f const& tangent, Vec3f const& N)
+inline SLArray<Vec3f> orthonormalFrame(Vec3f const& tangent, Vec3f const& N)
 {
     Vec3f const T = normalize(tangent - dot(tangent, N) * N);
     return {{T, normalize(cross(N, T)), N}};
 }
 
 /// Tangent and bitangent made unit and perpendicular to the normal.
-[[gnu::always_inline]] inline void reorthogonalize(SLArray<Vec3f>& frame)
-{
-    frame = orthonormalFrame(frame[0], frame[2]);
-}
+inline void reorthogonalize(SLArray<Vec3f>& frame) { frame = orthonormalFrame(frame[0], frame[2]); }
 
 /// Frame of the "tangent" attribute (object space) and a world-space normal, not normalised here.
-[[gnu::always_inline]] inline SLArray<Vec3f> computeBaseFrame(Vec3f const& tangent, Vec3f const& N,
-                                                              Mat3f const& toWorld)
+inline SLArray<Vec3f> computeBaseFrame(Vec3f const& tangent, Vec3f const& N, Mat3f const& toWorld)
 {
     return orthonormalFrame(transformDirection(toWorld, tangent), N);
 }
