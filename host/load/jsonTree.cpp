@@ -8,6 +8,7 @@
 #include <fstream>
 #include <iterator>
 #include <nlohmann/json.hpp>
+#include <unordered_set>
 #include <utility>
 
 namespace zsi::host {
@@ -17,23 +18,15 @@ namespace {
 // Deeper than any scene; keeps the recursion over a hostile file's tree short.
 constexpr std::size_t kMaxDepth = 64;
 
+/// Where the parser is: the last character that it took, which is the end of a word just read and
+/// the first character too many of a wrong one. A number ends before it, on the same line.
 struct Place {
     int line = 1;
-    int column = 1;
+    int column = 0;
+    bool lineEnds = false;
 };
 
-Place placeOf(std::string_view text, std::size_t offset)
-{
-    std::string_view const before = text.substr(0, offset);
-    std::size_t const lastBreak = before.rfind('\n');
-    Place place;
-    place.line += static_cast<int>(std::count(before.begin(), before.end(), '\n'));
-    place.column +=
-        static_cast<int>(lastBreak == std::string_view::npos ? offset : offset - lastBreak - 1);
-    return place;
-}
-
-/// Gives the parser its characters and tells how many it has taken.
+/// Gives the parser its characters and keeps count of lines on the way.
 class CountingIterator {
 public:
     using iterator_category = std::input_iterator_tag;
@@ -42,39 +35,35 @@ public:
     using pointer = char const*;
     using reference = char const&;
 
-    CountingIterator(char const* at, std::size_t* taken)
+    CountingIterator(char const* at, Place* last)
         : at_(at)
-        , taken_(taken)
+        , last_(last)
     {
     }
     char const& operator*() const { return *at_; }
     CountingIterator& operator++()
     {
+        if (std::exchange(last_->lineEnds, *at_ == '\n')) {
+            ++last_->line;
+            last_->column = 0;
+        }
+        ++last_->column;
         ++at_;
-        ++*taken_;
         return *this;
     }
-    CountingIterator operator++(int)
-    {
-        CountingIterator const before = *this;
-        ++*this;
-        return before;
-    }
     bool operator==(CountingIterator const& other) const { return at_ == other.at_; }
-    bool operator!=(CountingIterator const& other) const { return at_ != other.at_; }
 
 private:
     char const* at_;
-    std::size_t* taken_;
+    Place* last_;
 };
 
 /// Builds the tree from the parser's events.
 class TreeBuilder final : public nlohmann::json_sax<nlohmann::json> {
 public:
-    TreeBuilder(std::filesystem::path const& file, std::string_view text, std::size_t const& taken)
+    TreeBuilder(std::filesystem::path const& file, Place const& last)
         : file_(std::make_shared<std::filesystem::path>(file))
-        , text_(text)
-        , taken_(taken)
+        , last_(last)
     {
     }
 
@@ -113,9 +102,8 @@ public:
 
     bool key(string_t& name) override
     {
-        if (open_.back()->find(name))
-            fail(taken_,
-                 fmt::format("the key \"{}\" stands twice in this object", printable(name)));
+        if (!open_.back().keys.insert(name).second)
+            fail(fmt::format("the key \"{}\" stands twice in this object", printable(name)));
         key_ = std::move(name);
         return true;
     }
@@ -128,16 +116,20 @@ public:
         for (std::string_view const prefix : {"] ", "syntax error while "})
             if (std::size_t const at = why.find(prefix); at != std::string_view::npos)
                 why.remove_prefix(at + prefix.size());
-        fail(taken_, "no valid JSON: " + printable(why));
+        fail("no valid JSON: " + printable(why));
     }
 
 private:
-    [[noreturn]] void fail(std::size_t offset, std::string const& why) const
+    /// An object or an array that goes on.
+    struct Open {
+        JsonValue* value;
+        std::unordered_set<std::string> keys = {};
+    };
+
+    [[noreturn]] void fail(std::string const& why) const
     {
-        // The last character taken is the first that is too many.
-        Place const place = placeOf(text_, offset > 0 ? offset - 1 : 0);
-        throw InputError(
-            fmt::format("{}:{}:{}: {}", file_->string(), place.line, place.column, why));
+        throw InputError(fmt::format("{}:{}:{}: {}", file_->string(), last_.line,
+                                     std::max(last_.column, 1), why));
     }
 
     JsonValue made(JsonValue::Kind kind) const
@@ -145,10 +137,7 @@ private:
         JsonValue v;
         v.kind = kind;
         v.file = file_;
-        // One character behind a number is taken to see its end.
-        std::size_t const ahead =
-            kind == JsonValue::Kind::Integer || kind == JsonValue::Kind::Float ? 1 : 0;
-        v.line = placeOf(text_, taken_ > ahead ? taken_ - ahead : 0).line;
+        v.line = last_.line;
         return v;
     }
 
@@ -165,7 +154,7 @@ private:
             root_ = std::move(value);
             return &root_;
         }
-        JsonValue& parent = *open_.back();
+        JsonValue& parent = *open_.back().value;
         if (parent.kind == JsonValue::Kind::Array)
             return &parent.items.emplace_back(std::move(value));
         parent.members.push_back({std::move(key_), std::move(value)});
@@ -179,8 +168,8 @@ private:
     bool open(JsonValue::Kind kind)
     {
         if (open_.size() == kMaxDepth)
-            fail(taken_, fmt::format("nested deeper than {} levels", kMaxDepth));
-        open_.push_back(insert(made(kind)));
+            fail(fmt::format("nested deeper than {} levels", kMaxDepth));
+        open_.push_back({insert(made(kind))});
         return true;
     }
     bool close()
@@ -190,10 +179,9 @@ private:
     }
 
     std::shared_ptr<std::filesystem::path const> file_;
-    std::string_view text_;
-    std::size_t const& taken_;
+    Place const& last_;
     JsonValue root_;
-    std::vector<JsonValue*> open_; ///< from the root to where values are added now
+    std::vector<Open> open_; ///< from the root to where values are added now
     std::string key_;
 };
 
@@ -221,18 +209,13 @@ JsonValue const* JsonValue::find(std::string_view name) const
     return nullptr;
 }
 
-JsonValue* JsonValue::find(std::string_view name)
-{
-    return const_cast<JsonValue*>(std::as_const(*this).find(name));
-}
-
 JsonValue readJson(std::filesystem::path const& file)
 {
     std::string const text = readText(file);
-    std::size_t taken = 0;
-    TreeBuilder builder(file, text, taken);
-    nlohmann::json::sax_parse(CountingIterator(text.data(), &taken),
-                              CountingIterator(text.data() + text.size(), &taken), &builder,
+    Place last;
+    TreeBuilder builder(file, last);
+    nlohmann::json::sax_parse(CountingIterator(text.data(), &last),
+                              CountingIterator(text.data() + text.size(), &last), &builder,
                               nlohmann::json::input_format_t::json, true, true);
     return builder.take();
 }

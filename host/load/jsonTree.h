@@ -25,7 +25,6 @@ struct JsonValue {
     int line = 0; ///< from 1
 
     JsonValue const* find(std::string_view name) const; ///< null when there is none
-    JsonValue* find(std::string_view name);
 };
 
 struct JsonMember {

@@ -5,6 +5,8 @@
 #include "load/jsonReader.h"
 
 #include <algorithm>
+#include <unordered_map>
+#include <unordered_set>
 
 namespace zsi::host {
 
@@ -64,20 +66,26 @@ void merge(JsonValue& base, JsonReader const& over, Level level, std::string_vie
     }
     if (level == Level::Shader && changesClass(base, over.value()))
         std::erase_if(base.members, [](JsonMember const& m) { return m.key == "parameters"; });
+    std::unordered_map<std::string, std::size_t> places;
+    for (std::size_t i = 0; i < base.members.size(); ++i)
+        places[base.members[i].key] = i;
+    std::unordered_set<std::string> taken;
     for (auto const& [key, value] : over.members()) {
-        JsonValue* const old = base.find(key);
+        auto const old = places.find(key);
         if (value.kind() == JsonValue::Kind::Null) {
-            if (!old)
+            if (old == places.end())
                 value.fail("null takes out what an included file has, which is nothing here"
                            + suggestion(key, keysOf(base)));
-            std::erase_if(base.members,
-                          [&name = key](JsonMember const& m) { return m.key == name; });
-        } else if (old) {
-            merge(*old, value, below(level, section, key), level == Level::Scene ? key : section);
+            taken.insert(key);
+        } else if (old != places.end()) {
+            merge(base.members[old->second].value, value, below(level, section, key),
+                  level == Level::Scene ? key : section);
         } else {
             base.members.push_back({key, value.value()});
         }
     }
+    if (!taken.empty())
+        std::erase_if(base.members, [&](JsonMember const& m) { return taken.contains(m.key); });
     // Messages about the object as a whole lead to where it was last changed.
     base.file = over.value().file;
     base.line = over.value().line;
