@@ -12,9 +12,9 @@
 #include "mesh/meshShapes.h"
 #include "texture/textureStore.h"
 
-#include <algorithm>
 #include <cmath>
 #include <fmt/format.h>
+#include <unordered_map>
 
 namespace zsi::host {
 
@@ -171,12 +171,40 @@ Mesh readMesh(JsonReader const& reader, std::vector<std::string>& warnings)
     return planeMesh({s[0], s[1]});
 }
 
+/// Indices of things that later parts of the scene refer to by name.
+class Names {
+public:
+    explicit Names(char const* what)
+        : what_(what)
+    {
+    }
+    void add(std::string const& name)
+    {
+        indices_.emplace(name, static_cast<int>(names_.size()));
+        names_.push_back(name);
+    }
+    int indexOf(JsonReader const& reader) const
+    {
+        std::string const& name = reader.toString();
+        auto const found = indices_.find(name);
+        if (found == indices_.end())
+            reader.fail(fmt::format("unknown {} \"{}\"{}", what_, printable(name),
+                                    suggestion(name, names_)));
+        return found->second;
+    }
+
+private:
+    char const* what_;
+    std::vector<std::string> names_; ///< in the file's order
+    std::unordered_map<std::string, int> indices_;
+};
+
 /// Reads the parts of one scene in order; later ones refer to earlier ones by name.
 class Loader {
 public:
-    Loader(Scene& scene, ShaderLibraries const& libraries)
+    Loader(Scene& scene, ShaderSource const& shaders)
         : scene_(scene)
-        , libraries_(libraries)
+        , shaders_(shaders)
     {
     }
 
@@ -194,13 +222,14 @@ public:
             for (auto const& [name, mesh] : v->members()) {
                 scene_.meshes.push_back(readMesh(mesh, scene_.warnings));
                 scene_.meshes.back().name = name;
-                meshNames_.push_back(name);
+                meshes_.add(name);
             }
         if (auto const v = root.find("materials"))
             for (auto const& [name, material] : v->members()) {
                 material.expectKeys({"class", "parameters"});
                 scene_.materials.push_back(readShader(material, kMaterial));
                 scene_.materialNames.push_back(name);
+                materials_.add(name);
             }
         if (auto const v = root.find("instances"))
             for (auto const& [name, instance] : v->members())
@@ -241,11 +270,8 @@ private:
     Shader createShader(JsonReader const& className) const
     {
         std::string const& name = className.toString();
-        if (!libraries_.has(name))
-            className.fail(fmt::format("{}: unknown shader class{}", printable(name),
-                                       suggestion(name, libraries_.classNames())));
         try {
-            return libraries_.create(name);
+            return shaders_.create(name);
         } catch (InputError const& error) {
             className.fail(error.what());
         }
@@ -263,23 +289,11 @@ private:
                         names.size() == 1 ? "has" : "have", names.size() == 1 ? "is" : "are"));
     }
 
-    static int indexOf(JsonReader const& reader, std::vector<std::string> const& names,
-                       char const* what)
-    {
-        std::string const& name = reader.toString();
-        auto const found = std::find(names.begin(), names.end(), name);
-        if (found == names.end())
-            reader.fail(
-                fmt::format("unknown {} \"{}\"{}", what, printable(name), suggestion(name, names)));
-        return static_cast<int>(found - names.begin());
-    }
-
     Instance readInstance(JsonReader const& reader) const
     {
         reader.expectKeys({"mesh", "material", "transform"});
-        Instance instance{indexOf(reader.at("mesh"), meshNames_, "mesh"),
-                          indexOf(reader.at("material"), scene_.materialNames, "material"),
-                          Mat4f::identity()};
+        Instance instance{meshes_.indexOf(reader.at("mesh")),
+                          materials_.indexOf(reader.at("material")), Mat4f::identity()};
         auto const transform = reader.find("transform");
         if (!transform)
             return instance;
@@ -314,19 +328,19 @@ private:
     }
 
     Scene& scene_;
-    ShaderLibraries const& libraries_;
-    std::vector<std::string> meshNames_;
+    ShaderSource const& shaders_;
+    Names meshes_{"mesh"}, materials_{"material"};
 };
 
 } // namespace
 
-Scene loadScene(std::filesystem::path const& file, ShaderLibraries const& libraries)
+Scene loadScene(std::filesystem::path const& file, ShaderSource const& shaders)
 {
     JsonValue const tree = readSceneFile(file);
     Scene scene;
     scene.file = file.string();
     scene.textures = std::make_shared<TextureStore>();
-    Loader(scene, libraries).read(JsonReader(tree));
+    Loader(scene, shaders).read(JsonReader(tree));
     return scene;
 }
 

@@ -1,6 +1,7 @@
 /// Reads a JSON scene file.
 #pragma once
 
+#include "plugin/shaderSource.h"
 #include "scene/scene.h"
 
 #include <filesystem>
@@ -9,6 +10,6 @@ namespace zsi::host {
 
 /// Loads scene, meshes, textures and shaders. Relative file names are relative to the scene file.
 /// Throws InputError that names file, JSON path, what was expected, and near names.
-Scene loadScene(std::filesystem::path const& file, ShaderLibraries const& libraries);
+Scene loadScene(std::filesystem::path const& file, ShaderSource const& shaders);
 
 } // namespace zsi::host

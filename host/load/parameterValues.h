@@ -2,7 +2,7 @@
 #pragma once
 
 #include "load/jsonReader.h"
-#include "plugin/shaderLibrary.h"
+#include "plugin/shader.h"
 
 namespace zsi::host {
 

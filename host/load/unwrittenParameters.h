@@ -1,7 +1,7 @@
 /// Parameters without a default that a scene forgot.
 #pragma once
 
-#include "plugin/shaderLibrary.h"
+#include "plugin/shader.h"
 
 #include <set>
 #include <string>

@@ -1,5 +1,6 @@
+#include "plugin/shader.h"
+
 #include "base/error.h"
-#include "plugin/shaderLibrary.h"
 
 #include <array>
 #include <cstring>

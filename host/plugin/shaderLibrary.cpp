@@ -42,25 +42,10 @@ Function function(void* handle, std::string const& name)
 
 } // namespace
 
-struct ShaderLibraries::Impl {
-    struct Library {
-        std::shared_ptr<void> handle;
-        LibraryDescription description;
-    };
-    struct Class {
-        std::shared_ptr<Library const> library;
-        CreateShaderFunction create;
-    };
-    std::map<std::string, Class, std::less<>> classes;
+struct ShaderLibraries::Library {
+    std::shared_ptr<void> handle;
+    LibraryDescription description;
 };
-
-ShaderLibraries::ShaderLibraries()
-    : impl_(std::make_unique<Impl>())
-{
-}
-ShaderLibraries::~ShaderLibraries() = default;
-ShaderLibraries::ShaderLibraries(ShaderLibraries&&) noexcept = default;
-ShaderLibraries& ShaderLibraries::operator=(ShaderLibraries&&) noexcept = default;
 
 void ShaderLibraries::load(fs::path const& sharedObject)
 {
@@ -70,7 +55,7 @@ void ShaderLibraries::load(fs::path const& sharedObject)
         throw InputError(file
                          + ": no shader classes (pairs of <Class>_create and "
                            "<Class>_getAPIVersion)");
-    auto library = std::make_shared<Impl::Library>();
+    auto library = std::make_shared<Library>();
     library->description = readDescription(sharedObject);
     // An absolute path, since a bare name would be searched for along the system's folders.
     void* const handle = dlopen(fs::absolute(sharedObject).c_str(), RTLD_NOW | RTLD_LOCAL);
@@ -78,7 +63,7 @@ void ShaderLibraries::load(fs::path const& sharedObject)
         throw InputError(fmt::format("cannot load shader library: {}", dlerror()));
     library->handle.reset(handle, [](void* h) { dlclose(h); });
 
-    std::map<std::string, Impl::Class> loaded;
+    std::map<std::string, Class> loaded;
     for (std::string const& name : found) {
         auto const create =
             function<CreateShaderFunction>(handle, fmt::format("{}{}", name, kCreateSuffix));
@@ -93,9 +78,9 @@ void ShaderLibraries::load(fs::path const& sharedObject)
                             file, name, version, kApiVersion));
         loaded[name] = {library, create};
     }
-    impl_->classes.insert(loaded.begin(), loaded.end());
+    classes_.insert(loaded.begin(), loaded.end());
     names_.clear();
-    for (auto const& [name, entry] : impl_->classes)
+    for (auto const& [name, entry] : classes_)
         names_.push_back(name);
 }
 
@@ -128,20 +113,10 @@ std::vector<std::string> ShaderLibraries::loadDirectory(fs::path const& director
     return leftOut;
 }
 
-bool ShaderLibraries::has(std::string_view className) const
+Shader ShaderLibraries::make(std::string const& knownClass) const
 {
-    return impl_->classes.find(className) != impl_->classes.end();
-}
-
-Shader ShaderLibraries::create(std::string_view className) const
-{
-    auto const found = impl_->classes.find(className);
-    if (found == impl_->classes.end())
-        throw InputError(fmt::format("{}: unknown shader class{}", printable(className),
-                                     suggestion(className, names_)));
-    Impl::Class const& entry = found->second;
-    Shader shader(found->first, std::unique_ptr<IShaderBase>(entry.create()),
-                  entry.library->handle);
+    Class const& entry = classes_.at(knownClass);
+    Shader shader(knownClass, std::unique_ptr<IShaderBase>(entry.create()), entry.library->handle);
     shader.describe(entry.library->description);
     return shader;
 }

@@ -8,8 +8,8 @@
 namespace zsi::host {
 
 /// The functions that the shared object defines and exports, in the file's order. The file is only
-/// read, no code of it runs. Throws InputError when it cannot be read or is no shared object of
-/// this machine's word size and byte order.
+/// read, no code of it runs. Throws InputError when it cannot be read, is no shared object that
+/// this machine could load, or is damaged.
 std::vector<std::string> exportedFunctions(std::filesystem::path const& sharedObject);
 
 } // namespace zsi::host

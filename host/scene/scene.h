@@ -2,7 +2,7 @@
 /// z up; lengths are in scene units; colours linear RGB.
 #pragma once
 
-#include "plugin/shaderLibrary.h"
+#include "plugin/shader.h"
 
 #include <array>
 #include <memory>

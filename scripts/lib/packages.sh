@@ -3,7 +3,7 @@
 # openimageio-tools: OpenImageIO's CMake package refuses to load without its programs.
 # zlib1g-dev: assimp's CMake package links to it without depending on it.
 packages_build=(g++ cmake ninja-build libembree-dev libopenimageio-dev openimageio-tools libtbb-dev
-    libassimp-dev zlib1g-dev nlohmann-json3-dev libcli11-dev libfmt-dev)
+    libassimp-dev zlib1g-dev nlohmann-json3-dev libcli11-dev libfmt-dev libelf-dev)
 packages_test=(libgtest-dev libbenchmark-dev binutils clang-14 valgrind)
 
 # install_missing PACKAGE...: installs those that are not there; sudo only if not root.

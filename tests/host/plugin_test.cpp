@@ -23,6 +23,12 @@ fs::path fixture(std::string const& name)
     return fs::path(ZSI_FIXTURE_DIR) / name / (name + ".so");
 }
 
+std::string content(fs::path const& file)
+{
+    std::ifstream in(file, std::ios::binary);
+    return {std::istreambuf_iterator<char>(in), {}};
+}
+
 TEST(Plugin, FindsTheClassesOfAnyLibrary)
 {
     EXPECT_TRUE(libraries().has("corvid_Mtl_Solid") && libraries().has("TinyLight"));
@@ -80,6 +86,8 @@ TEST(Plugin, WritesValuesByNameAndType)
 TEST(Plugin, BadLibrariesAreTurnedAway)
 {
     test::TemporaryFolder folder;
+    std::string foreign = content(fixture("tinyShaders"));
+    foreign[18] = static_cast<char>(0xb7); // the machine of its header: AArch64
     struct Case {
         fs::path file;
         std::vector<std::string> message;
@@ -87,8 +95,9 @@ TEST(Plugin, BadLibrariesAreTurnedAway)
     Case const cases[] = {
         {fixture("oldShaders"), {"oldShaders.so", "2700", std::to_string(kApiVersion)}},
         {fixture("noShaders"), {"noShaders.so", "no shader classes"}},
-        {folder.write("text.so", "this is a text file\n"), {"text.so", "not a 64-bit"}},
-        {folder.write("empty.so", ""), {"empty.so", "not a 64-bit"}},
+        {folder.write("text.so", "this is a text file\n"), {"text.so", "not a shared object"}},
+        {folder.write("empty.so", ""), {"empty.so", "not a shared object"}},
+        {folder.write("foreign.so", foreign), {"foreign.so", "for this machine"}},
         {folder.path / "missing.so", {"missing.so", "no such file"}},
         {folder.path, {"no such file"}},
     };
@@ -129,8 +138,7 @@ TEST(Plugin, ADirectoryLoadsWhatItCan)
 /// names; what memory checkers say counts too.
 TEST(Plugin, ReadsDamagedSharedObjects)
 {
-    std::ifstream in(fixture("tinyShaders"), std::ios::binary);
-    std::string const good((std::istreambuf_iterator<char>(in)), {});
+    std::string const good = content(fixture("tinyShaders"));
     ASSERT_GT(good.size(), 1000u);
     test::TemporaryFolder folder;
     std::mt19937 random(7);

@@ -9,6 +9,7 @@
 #include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <ctime>
 #include <gtest/gtest.h>
 #include <limits>
 #include <numeric>
@@ -40,6 +41,15 @@ protected:
 
     test::TemporaryFolder folder;
 };
+
+/// A material without parameters, which no library offers.
+struct TinyLess final : MaterialShader {
+    void registerShader(IShaderManager* m) override { m->declareEntryPoints(this, kShade); }
+    void copy(IShaderBase const*) override { }
+    void shade(IShaderAPI*, ShadeState&) const override { }
+};
+
+IShaderBase* makeTinyLess() { return new TinyLess; }
 
 std::vector<float> numbers(auto const& v)
 {
@@ -123,6 +133,36 @@ TEST_F(SceneFile, AnIncludingSceneChangesTheIncludedOne)
     EXPECT_EQ(scene.instances[0].objectToWorld.m[0], 1.0f) << "transforms are replaced whole";
     EXPECT_EQ(scene.instances[0].objectToWorld.m[14], 3.0f);
     EXPECT_TRUE(scene.lights.empty());
+}
+
+/// What a value of a file costs must not grow with the file.
+TEST_F(SceneFile, LoadingTimeGrowsWithTheFile)
+{
+    auto const seconds = [&](int count) {
+        std::string meshes, materials, instances, over;
+        for (int i = 0; i < count; ++i) {
+            char const* const comma = i ? ",\n" : "\n";
+            std::string const name = '"' + std::to_string(i) + '"';
+            meshes += comma + name + R"(: {"plane": {}})";
+            materials += comma + name + R"(: {"class": "TinyLess"})";
+            instances += comma + name + R"(: {"mesh": )" + name + R"(, "material": )" + name + "}";
+            over += comma + name + R"(: {"transform": {"scale": 2}})";
+        }
+        StaticShaders const tiny({{"TinyLess", &makeTinyLess}});
+        folder.write("many.json",
+                     "{\"meshes\": {" + meshes + "}, \"materials\": {" + materials
+                         + "}, \"instances\": {" + instances + "}}");
+        fs::path const file =
+            folder.write("scene.json", R"({"include": "many.json", "instances": {)" + over + "}}");
+        std::clock_t const start = std::clock();
+        Scene const scene = loadScene(file, tiny);
+        double const taken = static_cast<double>(std::clock() - start) / CLOCKS_PER_SEC;
+        EXPECT_EQ(scene.instances.size(), static_cast<std::size_t>(count));
+        EXPECT_EQ(scene.instances.back().material, count - 1);
+        return taken;
+    };
+    double const few = seconds(1000);
+    EXPECT_LT(seconds(8000), 24 * few); // 8 times the work; 64 times where something is searched
 }
 
 TEST_F(SceneFile, ValuesReachTheParameters)

@@ -2,6 +2,7 @@
 //   embed SHADER_FOLDER PICTURE
 #include "base/error.h"
 #include "film/imageFile.h"
+#include "plugin/shaderLibrary.h"
 #include "render/render.h"
 
 #include <cstdio>
