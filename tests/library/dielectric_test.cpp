@@ -300,5 +300,33 @@ TEST(Dielectric, BendsItsFrameByTheFirstMapOrTheRippleThenTheSecondMap)
     }
 }
 
+/// What breaks a formula gives nothing, not NaN: facets of no width met exactly, no tangent, equal
+/// indices, a ripple's long normal under wide facets.
+TEST(Dielectric, DegenerateInputIsNeutral)
+{
+    Vec3f const kMirror(0.6f, 0, 0.8f), kThrough(0.6f, 0, -0.8f);
+    for (float rough : {0.0f, 1e-30f, 4.0f})
+        for (float ior : {1.0f, 1.5f})
+            for (Vec3f tangent : {Vec3f(1, 0, 0), Vec3f(0, 0, 1), Vec3f(0, 0, 0)})
+                for (int ripple : {0, 1}) {
+                    test::Trial<corvid_Mtl_Dielectric> t;
+                    t.shader.u_roughValue = rough;
+                    t.shader.u_ior = ior;
+                    t.shader.u_procedureMapEnable = ripple;
+                    t.shader.u_procedureMapAmount = 3;
+                    t.host.onNoise = [](Vec4f p) { return 0.5f * p.x; };
+                    t.state.I = kThrough;
+                    test::setAttribute(t.state, 36, tangent);
+                    t.host.addLight(kMirror, {1, 1, 1});
+                    t.host.addLight(kThrough, {1, 1, 1});
+                    EXPECT_TRUE(std::isfinite(t.shade().x)) << rough << ior << ripple;
+                    for (Vec3f const& d : {kMirror, kThrough}) {
+                        t.state.sampleDirection = d;
+                        t.shader.transfer(&t.host, t.state);
+                        EXPECT_TRUE(std::isfinite(t.state.outBrdf.x)) << rough << ior << ripple;
+                    }
+                }
+}
+
 } // namespace
 } // namespace zsi

@@ -123,9 +123,9 @@ TEST(Glazing, ShadesHighlightsReflectionAndWhatLiesBehind)
 
         double const side = front ? 1 : -1, R = reflectanceOf(pane), a2 = double(pane.u_rough);
         ASSERT_EQ(host.calls[0].service, "getLightSamples");
-        EXPECT_EQ(host.calls[0].vectors[1], front ? s.N : -s.N) << "asked with the faced normal";
+        EXPECT_EQ(host.calls[0].vectors[1], s.N) << "asked with the normal as it is";
         EXPECT_EQ(host.calls[0].scalars[0], 0);
-        test::DFrame const frame = test::frameOf(s, side);
+        test::DFrame const frame = test::frameOf(s, 1);
         D3 const v = frame.in(times(s.I, -1)), l = frame.in(L);
         double const lit = 0.75 * test::fadeOf(test::dotOf(L, s.Ng)) * R
             * reflectedOf(a2, v, l, test::unitOf(plus(v, l)));
@@ -165,6 +165,33 @@ TEST(Glazing, ShadesHighlightsReflectionAndWhatLiesBehind)
         pane.transmission(&host, s);
         EXPECT_NEAR(double(s.transmissionColor.z), (1 - R) * double(pane.u_refractColor.z), 1e-6)
             << "shadow rays know neither map nor angle";
+    }
+}
+
+/// From behind, lights meet the frame of the normal as it is: a normal that leans to the viewer has
+/// highlights, one that leans away has none.
+TEST(Glazing, LightsMeetTheNormalAsItIs)
+{
+    struct Lean {
+        Vec3f I, N, L;
+        bool lit;
+    };
+    for (Lean const& lean : {Lean{{0.6f, 0, 0.8f}, {-0.6f, 0, 0.8f}, {0.96f, 0, 0.28f}, false},
+                             Lean{{0.8f, 0, 0.6f}, {-0.8f, 0, 0.6f}, {-0.6f, 0, 0.8f}, true}}) {
+        test::Trial<corvid_Mtl_Glazing> t;
+        t.shader.u_reflectance = 0.5f;
+        t.shader.u_rough = 0.3f;
+        t.shader.u_reflectColor = t.shader.u_refractColor = {0, 0, 0};
+        t.state.I = lean.I;
+        t.state.N = lean.N;
+        test::setAttribute(t.state, 36, Vec3f(0, 1, 0));
+        t.host.addLight(lean.L, {1, 1, 1});
+        D3 const v = times(lean.I, -1), h = test::unitOf(plus(v, lean.L)), n = lean.N;
+        double const want = lean.lit ? 0.25 * smithG1(0.3, D3(0, 0, inner(v, n)), D3(0, 0, 1))
+                * smithG1(0.3, D3(0, 0, inner(lean.L, n)), D3(0, 0, 1))
+                * test::ggxOf(0.3, inner(h, n)) / (4 * inner(v, n) * inner(lean.L, n))
+                                     : 0;
+        EXPECT_NEAR(double(t.shade().x), want, 1e-5);
     }
 }
 

@@ -21,15 +21,14 @@ Vec3f corvid_Mtl_Glazing::transmissionTint(ShadeState const& state) const
 void corvid_Mtl_Glazing::f_calculateColors(IShaderAPI* api, ShadeState const& state,
                                            PhysicalColors& out) const
 {
-    bool const behind = dot(state.I, state.Ng) > 0.0f;
-    Vec3f const N = behind ? -state.N : state.N;
+    // Lights see the pane's normal as it is, the reflection that of the viewer's side.
     SLArray<Vec3f> const frame =
-        computeBaseFrame(attribute_tangent(state), N, Mat3f(state.objectToWorld));
+        computeBaseFrame(attribute_tangent(state), state.N, Mat3f(state.objectToWorld));
     Vec3f const v = toLocal(frame, -state.I);
     float const R = reflectance();
     Ggx const facets{.alpha2 = u_rough};
 
-    for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
+    for (LightSample const* light = api->getLightSamples(0, &state.P, &frame[2]); light;
          light = light->next) {
         float const fade = lightFade(dot(light->L, state.Ng));
         if (fade == 0.0f)
@@ -42,8 +41,9 @@ void corvid_Mtl_Glazing::f_calculateColors(IShaderAPI* api, ShadeState const& st
 
     out.reflectionWeight = u_reflectColor * R;
     if (!(out.reflectionWeight == kBlack)) {
+        float const side = dot(state.I, state.Ng) > 0.0f ? -1.0f : 1.0f;
         Vec3f const direction =
-            f_safe_reflect(api, state, state.I, behind ? -state.Ng : state.Ng, N);
+            f_safe_reflect(api, state, state.I, state.Ng * side, state.N * side);
         out.reflection =
             api->traceReflection(&state.P, &direction, maxComponent(out.reflectionWeight))
             * out.reflectionWeight;

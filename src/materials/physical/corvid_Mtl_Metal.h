@@ -53,6 +53,8 @@ class corvid_Mtl_Metal final : public MaterialShader,
                                public AnisoRotationFunctions<corvid_Mtl_Metal>,
                                public SafeReflectFunctions {
 public:
+    static constexpr bool kMaskSaturates = true;
+
     SHADER(corvid_Mtl_Metal, kShade | kTransmission | kTransfer | kSample, METAL)
     void shade(IShaderAPI* api, ShadeState& state) const override;
     void transmission(IShaderAPI* api, ShadeState& state) const override;

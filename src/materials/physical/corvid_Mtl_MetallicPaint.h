@@ -43,6 +43,8 @@ class corvid_Mtl_MetallicPaint final : public MaterialShader,
                                        public PhysicalShading<corvid_Mtl_MetallicPaint>,
                                        public SafeReflectFunctions {
 public:
+    static constexpr bool kMaskSaturates = true;
+
     SHADER(corvid_Mtl_MetallicPaint, kShade | kTransfer | kSample, METALLIC_PAINT)
     void shade(IShaderAPI* api, ShadeState& state) const override;
     void transfer(IShaderAPI* api, ShadeState& state) const override;

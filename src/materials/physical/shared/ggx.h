@@ -31,7 +31,9 @@ struct Ggx {
     float shadowing(float c) const
     {
         float const c2 = c * c;
-        return std::fabs(c) + std::sqrt(c2 + alpha2 * (1.0f - c2));
+        // A ripple leaves normals longer than 1, whose cosines wide facets would take the root
+        // below 0.
+        return std::fabs(c) + std::sqrt(maxOf(0.0f, c2 + alpha2 * (1.0f - c2)));
     }
 
     /// Whether facets of normal h show themselves to w: else G1 is 0.
@@ -73,7 +75,8 @@ private:
     float scaled(Vec3f v, Vec3f l, Vec3f h, float numerator) const
     {
         float const q = h.x * h.x + h.y * h.y + alpha2 * (h.z * h.z); // (D's root) x h.h
-        return alpha2 * numerator / (kPi * q * q * (shadowing(v.z) * shadowing(l.z)));
+        float const below = kPi * q * q * (shadowing(v.z) * shadowing(l.z));
+        return below > 0.0f ? alpha2 * numerator / below : 0.0f; // width 0, met exactly: a mirror
     }
 };
 

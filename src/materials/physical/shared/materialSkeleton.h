@@ -3,6 +3,7 @@
 
 #include "materials/physical/shared/ambientOcclusion.h"
 #include "materials/physical/shared/masking.h"
+#include "runtime/arithmetic.h"
 
 namespace zsi {
 
@@ -25,8 +26,10 @@ namespace zsi {
 template <class Shader, class Color>
 inline void shadeMasked(Shader const& shader, IShaderAPI* api, ShadeState& state, Color&& color)
 {
-    Vec3f const mask =
+    Vec3f mask =
         shader.f_calcMasking(api, state, Shader::attribute_uv(state), state.Pref, state.Nref);
+    if constexpr (requires { Shader::kMaskSaturates; }) // a class without light below black
+        mask = saturate(mask);
     if (mask == Vec3f(1.0f, 1.0f, 1.0f)) {
         state.discardHit = 1;
         return;

@@ -16,6 +16,8 @@ inline Vec3f atReflectMargin(Vec3f I, Vec3f Ng, Vec3f N)
 {
     // R' = alpha I + beta N with |R'| = 1 and R'.Ng = margin: a quadratic in beta.
     float const g = dot(I, Ng), s = dot(Ng, N), d = dot(I, N);
+    if (g == 0.0f) // along the surface, where alpha below would be a quotient of zeros
+        return N;
     float const A = s * s + g * g - 2.0f * (d * g) * s;
     float const B = (d * g - s) * 2.0f * kReflectMargin;
     float const C = 0.0025f - g * g;
