@@ -201,18 +201,34 @@ TEST(TileNode, HolesTakeTheirShareOfBricks)
     expectSame(tileAt(host, t, {0.50417f, 0.5083f}), kMortar, "pure mortar");
 }
 
-TEST(TileNode, RoughEdgesStayInTheSquare)
+TEST(TileNode, RoughEdgesAreDisplacedAndNothingElse)
 {
     test::ScriptedHost host;
     host.onNoise = [](Vec4f) { return 1.0f; }; // as far up and right as it goes
     TileParameters t = wall(4, 4, 0.1f, 0.1f);
-    t.horizontalCount += 0.1f; // the last gap closes the square
-    t.verticalCount += 0.1f;
-    t.edgeRoughness = 40; // 0.04, more than the gap of 0.025
     t.lineShift = -0.5f;
-    EXPECT_EQ(redOf(tileAt(host, t, {0.5f, 0.999f})), 0.0f);
-    EXPECT_EQ(redOf(tileAt(host, t, {0.999f, 0.5f})), 0.0f);
-    EXPECT_EQ(redOf(tileAt(host, t, {0.5f, 0.5f})), 1.0f);
+    // Cells of a quarter, mortar for 0.025 at their ends.
+    struct Case {
+        char const* why;
+        float roughness;
+        Vec2f at;
+        float brick;
+    };
+    constexpr Case kCases[] = {
+        {"plain, in the mortar", 0, {0.27f, 0.375f}, 0},
+        {"displaced by 0.01 onto the brick", 10, {0.27f, 0.375f}, 1},
+        {"displaced by 0.04 over the end of the square, onto the next brick",
+         40,
+         {0.99f, 0.375f},
+         1},
+        {"the same along v", 40, {0.375f, 0.99f}, 1},
+        {"hardly displaced: the picture without", 1e-6f, {0.999f, 0.375f}, 0},
+        {"hardly displaced, at the other end", 1e-6f, {0.03f, 0.03f}, 1},
+    };
+    for (Case const& c : kCases) {
+        t.edgeRoughness = c.roughness;
+        EXPECT_EQ(redOf(tileAt(host, t, c.at)), c.brick) << c.why;
+    }
 }
 
 TEST(TileNode, FootprintIsWhatAPixelSeesOfTheSurface)

@@ -76,6 +76,32 @@ TEST(WardShading, AsksTheHostInOrderAndTellsTheWeights)
     }
 }
 
+TEST(WardShading, OcclusionOfACutOutSurfaceIsThatOfItsOpacity)
+{
+    // White, without lobe, lit head-on by a light of colour 1; the baked occlusion is full.
+    corvid_Mtl_Ward m;
+    test::plainWard(m);
+    m.u_diffuseColor = {1, 1, 1};
+    m.u_reflectivity = 0;
+    m.u_cutoutMapEnable = true;
+    m.u_cutoutAmount = 0.5f;
+    test::FunctionTexture<Vec2f> white([](Vec2f) { return Vec4f(1, 1, 1, 1); });
+    m.u_cutoutMap.texture = &white;
+    test::ScriptedHost host;
+    host.addLight({0, 0, 1}, {1, 1, 1});
+    auto const shown = [&] {
+        ShadeState s = test::plainWardHit();
+        m.shade(&host, s);
+        return s.Ci.x;
+    };
+    EXPECT_EQ(shown(), 0.5f) << "half a surface";
+    m.ambientOcclusionMode = 1; // no texture: 0
+    EXPECT_EQ(shown(), 0.0f) << "occluded in full, whatever the cut-out";
+    m.u_transparency = true;
+    m.u_transparencyValue = 0.75f;
+    EXPECT_EQ(shown(), 0.5f * 0.25f * 0.75f) << "a quarter of the diffuse light, a quarter opaque";
+}
+
 TEST(WardShading, AdjustedNormalsAreVisibleOnTheArcOfTheirTilt)
 {
     corvid_Mtl_Ward const m;

@@ -206,9 +206,8 @@ private:
         ch *= editColumn ? get("changeColumn") : 1;
         double const d = (2 * smoothNoise(s / (cw / 17), t / (ch / 17), 0, 0) - 1)
             * get("edgeRoughness") * 0.001;
-        double const sEnd = get("horizontalGap") * cw / 2, tEnd = get("verticalGap") * ch / 2;
-        s = std::min(std::max(s + d, sEnd), 1 - sEnd);
-        t = std::min(std::max(t + d, tEnd), 1 - tEnd);
+        s += d;
+        t += d;
         double const row = whole(t / ch), seed = get("randomSeed");
         double const r = smoothNoise(seed + 0.5 + row, 0, 0, 0);
         double x = s / cw + (2 * r - 1 - 0.5) * get("randomShift");

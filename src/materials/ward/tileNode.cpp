@@ -30,6 +30,13 @@ float cellSize(float count, float gap, float brick)
     return (brick > 0.0f ? brick : 1.0f) / (count + gap);
 }
 
+/// A cell that the square can be divided by.
+float divisor(float cell)
+{
+    constexpr float kFinest = 1e-12f; // far below what a picture shows
+    return std::fabs(cell) > kFinest ? cell : kFinest;
+}
+
 /// Whether the cell with this index, from 1, is one that an edit of every n-th meets.
 bool edited(bool use, float index, int n)
 {
@@ -59,14 +66,6 @@ float brickCoverage(float x, float gap, float width)
     return clamp01(before + here + behind);
 }
 
-/// A coordinate after its edge was displaced, kept off the ends of the square by half a gap: no
-/// sliver of a brick shows beyond the mortar that closes the square.
-float displaced(float x, float by, float gap, float cell)
-{
-    float const margin = minOf(0.5f * gap * cell, 0.5f);
-    return clamp(x + by, margin, 1.0f - margin);
-}
-
 float variation(float random, float spread)
 {
     return maxOf(0.0f, (2.0f * random - 1.0f) * spread + 1.0f);
@@ -91,13 +90,15 @@ Vec4f TileFunctions::f_Tile(IShaderAPI* api, ShadeState const&, Vec2f uv, Vec3f,
         cellWidth *= tile.changeRow;
     if (edited(tile.useColumnEdit, columnIndex, tile.perColumn) && tile.changeColumn > 0.0f)
         cellHeight *= tile.changeColumn;
+    cellWidth = divisor(cellWidth);
+    cellHeight = divisor(cellHeight);
 
     if (tile.edgeRoughness != 0.0f) {
         Vec2f const at(s / (cellWidth / kRoughnessFrequency),
                        t / (cellHeight / kRoughnessFrequency));
         float const d = (2.0f * api->noise2D(&at) - 1.0f) * tile.edgeRoughness * kRoughnessScale;
-        s = displaced(s, d, tile.horizontalGap, cellWidth);
-        t = displaced(t, d, tile.verticalGap, cellHeight);
+        s += d;
+        t += d;
     }
 
     float const seed = static_cast<float>(tile.randomSeed);

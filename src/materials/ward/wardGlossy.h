@@ -28,18 +28,18 @@ struct WardLobe {
         return std::exp(-(x * x + y * y) / (h.z * h.z));
     }
 
-    /// Value for light from `l`, 1/sr, for v.z < 0 and l.z > 0.
-    float value(Vec3f v, Vec3f l) const
-    {
-        float const n = norm();
-        return n > 0.0f ? value(v, l, n) : 0.0f;
-    }
-    /// The same with the norm n, above 0, at hand.
+    /// Value for light from `l`, 1/sr, for v.z < 0 and l.z > 0; n: the norm.
     float value(Vec3f v, Vec3f l, float n) const
     {
-        float const spread = std::sqrt(-v.z * l.z) * n;
-        return gauss(l - v) / spread;
+        float const s = spread(v, l, n);
+        return s > kLeastSpread ? gauss(l - v) / s : 0.0f;
     }
+    float value(Vec3f v, Vec3f l) const { return value(v, l, norm()); }
+
+    /// What the Gaussian is divided by. From the least on there is a lobe: below, its width is 0
+    /// or a direction lies in the surface.
+    static float spread(Vec3f v, Vec3f l, float n) { return std::sqrt(-v.z * l.z) * n; }
+    static constexpr float kLeastSpread = 1e-30f; // finite times any colour
 };
 
 /// A direction drawn from the lobe.
@@ -70,8 +70,9 @@ inline WardGlossySample sampleWardLobe(WardLobe lobe, Vec3f v, Vec2f u)
     WardGlossySample s{v - h * (2.0f * vh), 0.0f, -1.0f};
     if (s.direction.z > 0.0f) {
         float const n = lobe.norm();
+        float const spread = lobe.spread(v, s.direction, n);
         s.density = e / (cosH * ct2 * -vh * n);
-        s.value = e / (std::sqrt(-v.z * s.direction.z) * n);
+        s.value = spread > WardLobe::kLeastSpread ? e / spread : 0.0f;
     }
     return s;
 }
@@ -81,11 +82,12 @@ inline WardGlossySample evaluateWardLobe(WardLobe lobe, Vec3f v, Vec3f w)
 {
     WardGlossySample s{w, 0.0f, 0.0f};
     float const n = lobe.norm();
-    if (!(n > 0.0f))
+    float const spread = lobe.spread(v, w, n);
+    if (!(spread > WardLobe::kLeastSpread))
         return s;
     Vec3f const h = normalize(w - v);
     float const e = lobe.gauss(h);
-    s.value = e / (std::sqrt(-v.z * w.z) * n);
+    s.value = e / spread;
     s.density = e / (-dot(v, h) * h.z * n * h.z * h.z);
     return s;
 }

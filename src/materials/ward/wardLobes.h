@@ -160,7 +160,9 @@ private:
             scalar(state, s.u_brdf90ReflectMapEnable, s.u_brdf90ReflectMap,
                    s.u_brdf90ReflectTransform, s.u_brdf90ReflectAmount, s.u_brdf90Reflectivity);
         float const curve = std::pow(1.0f - clamp01(cosTheta), s.u_brdfCurvePower);
-        return clamp01(r0 + curve * (r90 - r0)) * s.u_reflectivity;
+        float const F = r0 + curve * (r90 - r0);
+        // 0 for what is no number: a curve of negative power has no end at grazing.
+        return (F > 0.0f ? minOf(F, 1.0f) : 0.0f) * s.u_reflectivity;
     }
 
     [[gnu::noinline]] Vec3f specularMap(ShadeState const& state) const

@@ -4,6 +4,8 @@
 #include "materials/ward/wardFrame.h"
 #include "materials/ward/wardLobes.h"
 
+#include <limits>
+
 namespace zsi {
 
 /// Path tracing members of a Ward class.
@@ -70,6 +72,10 @@ struct WardScatteringFunctions {
                 state.sampleType = kSampleNone;
                 return;
             }
+            if (g.direction.z > 0.0f && !(g.density >= kLeastDensity)) {
+                state.sampleType = kSampleNone;
+                return;
+            }
             state.sampleDirection = toWorld(at.frame, g.direction);
             state.sampleCosine = cosineOf(state, at.Nf, g.direction.z); // either sign
             state.sampleInvPdf = 1.0f / g.density;
@@ -95,7 +101,7 @@ struct WardScatteringFunctions {
         state.sampleDirection = toWorld(at.frame, g.direction);
         state.sampleCosine = cosineOf(state, at.Nf, g.direction.z);
         float const pdf = g.direction.z * kWardInvPi * pd + (1.0f - pd) * g.density;
-        if (state.sampleCosine < 0.0f || !(pdf > 0.0f)) {
+        if (state.sampleCosine < 0.0f || !(pdf >= kLeastDensity)) {
             state.sampleType = kSampleNone;
             return;
         }
@@ -105,6 +111,9 @@ struct WardScatteringFunctions {
     }
 
 private:
+    /// Densities below have no finite inverse.
+    static constexpr float kLeastDensity = std::numeric_limits<float>::min();
+
     struct Surface {
         Vec3f Nf; ///< plain normal on the viewer's side; zero edge on
         SLArray<Vec3f> frame;

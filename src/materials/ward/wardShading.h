@@ -30,7 +30,8 @@ private:
 
     Shader const& self() const { return static_cast<Shader const&>(*this); }
 
-    /// Every term, blended with what is seen through the holes of the cut-out.
+    /// Every term, blended with what is seen through the holes of the cut-out. The transmission
+    /// weight stays that of the surface: occlusion darkens what is left of it in full.
     [[gnu::noinline]] PhysicalColors colorsWithHoles(IShaderAPI* api, ShadeState const& state) const
     {
         PhysicalColors out;
@@ -51,7 +52,6 @@ private:
         out.indirect *= c;
         out.additional *= c;
         out.refraction = seen * (1.0f - c) + out.refraction * c;
-        out.transmissionWeight = out.transmissionWeight * c + grey(1.0f - c);
         return out;
     }
 
@@ -103,7 +103,7 @@ private:
         if (s.u_transparency && !(transmit == kBlack)) {
             float const eta = far ? s.u_ior / state.beyondIor : state.incomingIor / s.u_ior;
             Vec3f T = sl_lib_refract(state.I, N, eta);
-            if (T == kBlack) // total reflection
+            if (!(dot(T, T) > 0.0f)) // total reflection, or no index
                 T = s.f_safe_reflect(api, state, state.I, NgFaced, N);
             out.refraction = transmit
                 * api->traceRefraction(&state.P, &T, refractionSpread(state),
@@ -143,7 +143,6 @@ private:
     {
         Vec3f lit(0.0f, 0.0f, 0.0f), highlight(0.0f, 0.0f, 0.0f);
         float const norm = lobe.norm();
-        shines = shines && norm > 0.0f;
         for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
              light = light->next) {
             float const height = dot(frame[2], light->L);
