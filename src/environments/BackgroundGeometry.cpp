@@ -4,6 +4,7 @@
 #include "materials/physical/shared/fresnel.h"
 #include "materials/physical/shared/safeReflect.h"
 #include "materials/physical/shared/straightThrough.h"
+#include "runtime/arithmetic.h"
 
 namespace zsi {
 
@@ -28,51 +29,32 @@ Vec3f BackgroundGeometry::cube(TextureSamplerCube const& cube, Vec3f direction,
     return gradeChannel(globalIbl(*this, cube, direction), grade);
 }
 
-/// Light that arrives over the light that would arrive without anything in its way, per channel:
-/// 1 where nothing shadows the point and the bump is flat. The picture holds its own light, so
-/// this factor is all that the scene does to it.
+/// Light on a white surface here: every light in its shadow, as far as the shadow shows, and what
+/// the occlusion leaves of the sky.
 Vec3f BackgroundGeometry::receivedLight(IShaderAPI* api, ShadeState const& state, Vec3f n) const
 {
-    // A light's colour weighs by its largest channel, so that each channel of the ratio is that
-    // of the shadows and no coloured light changes the hue of the picture.
-    float open = 0.0f;
-    Vec3f arriving(0.0f, 0.0f, 0.0f);
+    Vec3f const fullShadow = shadowColor * shadowIntensity + grey(1.0f - shadowIntensity);
     bool const bumped = !(n == state.N);
-    for (LightSample const* l = api->getLightSamples(0, &state.P, &state.N); l; l = l->next) {
-        float const strength = maxComponent(l->color) * l->weight;
+    Vec3f light = kBlack;
+    for (LightSample const* s = api->getLightSamples(0, &state.P, &state.N); s; s = s->next) {
         float relief = 1.0f;
         if (bumped) {
             // The weight knows the smooth surface: cosines of the bump over those. Low light
             // would make that ratio boundless.
             constexpr float kLeastCosine = 0.1f, kMostRelief = 2.0f;
             relief =
-                clamp(dot(n, l->L) / maxOf(dot(state.N, l->L), kLeastCosine), 0.0f, kMostRelief);
+                clamp(dot(n, s->L) / maxOf(dot(state.N, s->L), kLeastCosine), 0.0f, kMostRelief);
         }
-        open += strength;
-        arriving += (strength * relief) * l->shadow;
+        Vec3f const shadow = fullShadow * (grey(1.0f) - s->shadow) + s->shadow;
+        light += s->color * shadow * (s->weight * relief);
     }
-    Vec3f const occlusion = api->occlusion(&state.P, &n, 1.0f);
-
-    Vec3f ratio = open > 0.0f ? arriving / open : grey(1.0f);
-    if (diffuseCube.texture) {
-        // Lights and sky share the point; occlusion is the sky's.
-        Vec3f const sky =
-            notBelowZero(cube(diffuseCube, n,
-                              {diffuseIBLContrastPivot, diffuseIBLContrastValue,
-                               diffuseIBLGainColor, diffuseIBLGainSource, diffuseIBLGainValue}));
-        auto const share = [open](float lights, float sky_, float unoccluded, float otherwise) {
-            return open + sky_ > 0.0f ? (lights + sky_ * unoccluded) / (open + sky_)
-                                      : otherwise * unoccluded;
-        };
-        ratio = {share(arriving.x, sky.x, occlusion.x, ratio.x),
-                 share(arriving.y, sky.y, occlusion.y, ratio.y),
-                 share(arriving.z, sky.z, occlusion.z, ratio.z)};
-    } else {
-        ratio *= occlusion; // nothing to weigh it against
-    }
-    // Where there is no light at all, full shadow: shadowColor as far as the intensity says.
-    Vec3f const fullShadow = shadowColor * shadowIntensity + grey(1.0f - shadowIntensity);
-    return fullShadow * (grey(1.0f) - ratio) + ratio;
+    Vec3f const open = api->occlusion(&state.P, &n, 1.0f);
+    if (diffuseCube.texture)
+        light += open
+            * cube(diffuseCube, n,
+                   {diffuseIBLContrastPivot, diffuseIBLContrastValue, diffuseIBLGainColor,
+                    diffuseIBLGainSource, diffuseIBLGainValue});
+    return light;
 }
 
 /// What the ground mirrors. Rough ground mirrors sharply only towards the horizon: of its
@@ -86,12 +68,12 @@ Vec3f BackgroundGeometry::reflections(IShaderAPI* api, ShadeState const& state, 
         rgb(f_evalMapping(api, state, specularMode, specularColor, specularTexture,
                           specularTextureMatrix, specularAngularRepeat, state.Pref, state.N, false,
                           attribute_uv(state), boxAxes, tangentU, tangentV, specularUVMatrix));
-    if (reflectivity == Vec3f(0.0f, 0.0f, 0.0f))
+    if (reflectivity == kBlack)
         return reflectivity;
 
     Vec3f const r = f_safe_reflect(api, state, state.I, state.Ng, n);
     float const sharp = schlick(0.0f, std::fabs(dot(state.I, n)));
-    Vec3f seen(0.0f, 0.0f, 0.0f);
+    Vec3f seen = kBlack;
     if (specularCube.texture)
         seen = (1.0f - sharp)
             * cube(specularCube, r,

@@ -6,8 +6,8 @@
 
 namespace zsi {
 
-/// Ground or backdrop that carries a photograph: it shows the picture's own brightness and takes
-/// the shadows of the scene. Front faces only.
+/// Ground or backdrop that carries a photograph, lit by the scene and darkened by its shadows.
+/// Front faces only.
 #define BACKGROUND_GEOMETRY(P, U, A)                                                             \
     P(Vec3f, diffuseColor, (1.0f, 1.0f, 1.0f), "colour of mapping mode 0, linear RGB")           \
     P(TextureSampler2D, diffuseTexture, (), "the picture; alpha below 0.05 cuts out")            \
@@ -37,7 +37,7 @@ namespace zsi {
     P(float, bumpScale, (1.0f), "scales the slopes of the bump; 0 none")                         \
     U(Mat3f, bumpUVMatrix, "as diffuseUVMatrix")                                                 \
     P(Vec3f, shadowColor, (0.0f, 0.0f, 0.0f), "factor that full shadow tends to")                \
-    P(float, shadowIntensity, (1.0f), "strength of received shadow and occlusion, 0..1")         \
+    P(float, shadowIntensity, (1.0f), "strength of received shadow, 0..1")                       \
     P(bool, useCubeReflection, (true), "reflections come from reflectCube, not from the scene")  \
     P(TextureSamplerCube, reflectCube, (), "sharp environment")                                  \
     P(TextureSamplerCube, diffuseCube, (), "light of the sky on a white surface facing it")      \

@@ -45,6 +45,7 @@ TEST(BackgroundGeometry, FacesCutsAndBlendsByAlpha)
         g.state.I = c.I;
         g.shader.diffuseMode = 1;
         g.shader.diffuseTexture.texture = &picture;
+        g.host.addLight({0, 0, 1}, {1, 1, 1});
         g.host.onThrough = [](Vec3f, Vec3f) { return Vec4f(1, 2, 3, 0.5f); };
         float const a = c.alpha, b = 1 - c.alpha;
         Vec3f const seen = Vec3f(0.2f, 0.4f, 0.6f) * a + Vec3f(1, 2, 3) * b;
@@ -56,44 +57,70 @@ TEST(BackgroundGeometry, FacesCutsAndBlendsByAlpha)
     }
 }
 
-/// However strong the lights are, an open point shows the picture itself; shadow takes away the
-/// share of light that it keeps from the point, down to the tint.
-TEST(BackgroundGeometry, PictureKeepsItsBrightnessAndTakesShadow)
+/// White ground under one light of (4, 2, 1) with weight 1/2, one of (0, 0, 2) behind the smooth
+/// normal's rim, and a sky of (0.5, 1, 0) that is half open.
+TEST(BackgroundGeometry, LightsAddUpInTheirShadowAndTheSkyInItsOcclusion)
 {
-    test::Random random;
-    for (int i = 0; i < 500; ++i) {
+    struct Case {
+        char const* why;
+        Vec3f shadow, tint;
+        float intensity;
+        bool sky;
+        Vec3d want;
+    };
+    constexpr Case kCases[] = {
+        {"open", {1, 1, 1}, {0, 0, 0}, 1, false, {2, 1, 2.5}},
+        {"sky", {1, 1, 1}, {0, 0, 0}, 1, true, {2.25, 1.5, 2.5}},
+        {"shadow", {0, 0.5f, 1}, {0, 0, 0}, 1, true, {0.25, 1, 2.5}},
+        {"half as strong", {0, 0.5f, 1}, {0, 0, 0}, 0.5f, true, {1.25, 1.25, 2.5}},
+        {"tinted", {0, 0.5f, 0}, {0.5f, 0, 1}, 1, false, {1, 0.5, 2.5}},
+    };
+    for (std::uint32_t const rayType : {1u, 2u, 4u, 32u})
+        for (Case const& c : kCases) {
+            Ground g;
+            g.state.rayType = rayType;
+            g.shader.diffuseColor = {1, 1, 1};
+            g.shader.shadowColor = c.tint;
+            g.shader.shadowIntensity = c.intensity;
+            g.host.addLight({0, 0.6f, 0.8f}, {4, 2, 1}, c.shadow, 0.5f);
+            g.host.addLight({1, 0, 0}, {0, 0, 2}, {1, 1, 1}, 1);
+            g.host.onOcclusion = [](Vec3f, Vec3f) { return Vec3f(0.5f, 0.5f, 0.5f); };
+            Cube cube([](Vec3f at) { return Vec4f(0.25f * at.y, 0.5f, 0, 1); }); // up is y
+            if (c.sky)
+                g.shader.diffuseCube.texture = &cube;
+            g.shader.globalIBLGainValue = 4;
+            g.shader.diffuseIBLGainValue = 0.5f;
+            EXPECT_TRUE(shows(g, c.want)) << c.why << rayType;
+            EXPECT_EQ(g.host.calls[0].scalars[0], 0.0f); // the common list
+            g.shader.diffuseColor = {0.5f, 0, 0.25f}; // the picture scales all of it
+            EXPECT_TRUE(shows(g, {c.want.x / 2, 0, c.want.z / 4})) << c.why;
+        }
+}
+
+/// Light at 60 and at 88 degrees, a normal that leans 45 degrees to it or away.
+TEST(BackgroundGeometry, BumpShadesTheLights)
+{
+    double const low = std::sin(2 * M_PI / 180);
+    struct Case {
+        char const* why;
+        double height, lean, want;
+    };
+    Case const cases[] = {{"cosine of 15 degrees", 0.5, 1, 0.9659258},
+                          {"away", 0.5, -1, 0},
+                          {"at most twice as bright", low, 1, 2 * low}};
+    for (Case const& c : cases) {
+        Picture bump([&](Vec2f) { return Vec4f(c.lean > 0 ? 1 : 0, 0.5f, 1, 1); });
         Ground g;
-        bool const shadowed = i % 3, sky = i % 2;
-        constexpr std::uint32_t kRays[] = {1, 2, 4, 32};
-        g.state.rayType = kRays[i % 4];
-        Vec3d const shadow = shadowed ? random.color() : Vec3f(1, 1, 1), light = random.color();
-        Vec3d const open = shadowed ? random.color() : Vec3f(1, 1, 1);
-        Vec3d const tint = g.shader.shadowColor = random.color();
-        double const intensity = double(g.shader.shadowIntensity = random.in(0, 1));
-        // Strengths 2 and 3, weights 1/2 and 1, the second in shadow.
-        g.host.addLight({0, 0, 1}, {2, 1, 0}, {1, 1, 1}, 0.5f);
-        g.host.addLight({1, 0, 0}, {0, 3, 1}, test::toFloat(shadow), 1);
-        g.host.addLight({0, 0, -1}, {9, 9, 9}, {0, 0, 0}, 0); // below the ground
-        g.host.onOcclusion = [&](Vec3f, Vec3f) { return test::toFloat(open); };
-        Cube cube([&](Vec3f) { return withAlpha(test::toFloat(light), 1); });
-        if (sky)
-            g.shader.diffuseCube.texture = &cube;
-        auto const factor = [&](double s, double o, double l, double t) {
-            // Lights and sky share the point; without a sky all of it is occluded.
-            double const ratio = sky ? (1 + 3 * s + l * o) / (4 + l) : (1 + 3 * s) / 4 * o;
-            return ratio + (1 - ratio) * (1 - intensity + intensity * t);
-        };
-        EXPECT_TRUE(shows(g,
-                          {0.2 * factor(shadow.x, open.x, light.x, tint.x),
-                           0.4 * factor(shadow.y, open.y, light.y, tint.y),
-                           0.6 * factor(shadow.z, open.z, light.z, tint.z)}));
-        EXPECT_TRUE(shadowed || shows(g, {0.2, 0.4, 0.6})) << "nothing in the way";
-        EXPECT_EQ(g.host.count("getLightSamples"), 1);
-        EXPECT_EQ(g.host.count("occlusion"), 1);
-        EXPECT_EQ(g.host.calls[0].scalars[0], 0.0f); // the common list
+        g.shader.diffuseColor = {1, 1, 1};
+        g.shader.bumpMode = 1;
+        g.shader.bumpTexture.texture = &bump;
+        g.shader.bumpUVMatrix = Mat3f::identity();
+        test::setAttribute(g.state, 8, Vec3f(1, 0, 0));
+        test::setAttribute(g.state, 20, Vec3f(0, 1, 0));
+        double const x = std::sqrt(1 - c.height * c.height);
+        g.host.addLight(test::toFloat({x, 0, c.height}), {1, 1, 1}, {1, 1, 1}, float(c.height));
+        EXPECT_TRUE(shows(g, {c.want, c.want, c.want})) << c.why;
     }
-    Ground dark; // no light anywhere: the picture, not black
-    EXPECT_TRUE(shows(dark, dark.shader.diffuseColor));
 }
 
 TEST(BackgroundGeometry, BumpTiltsTheNormalAlongRisingTextureCoordinates)
@@ -193,6 +220,7 @@ TEST(BackgroundGeometry, ReflectivityIsSplitBetweenBlurredAndSharp)
     // A reflection ray takes the ground for the environment, where there is one.
     Ground g;
     Cube cube([](Vec3f d) { return Vec4f(d.x + 2, d.y + 2, d.z + 2, 0.3f); });
+    g.host.addLight({0, 0, 1}, {1, 1, 1});
     g.state.rayType = 2;
     EXPECT_TRUE(shows(g, Vec3f(0.2f, 0.4f, 0.6f)));
     g.shader.reflectCube.texture = &cube;
