@@ -1,5 +1,7 @@
 #include "cmd/interruption.h"
 
+#include "base/replacedFile.h"
+
 #include <csignal>
 #include <unistd.h>
 
@@ -13,8 +15,10 @@ static_assert(std::atomic<bool>::is_always_lock_free && std::atomic<int>::is_alw
 
 void onSignal(int signal)
 {
-    if (!deferred)
+    if (!deferred || requested) { // the second one ends the program where it stands
+        host::ReplacedFile::removeAll();
         _exit(128 + signal);
+    }
     received = signal;
     requested = true;
 }
@@ -28,14 +32,18 @@ Interruption::Interruption()
     struct sigaction action = {};
     action.sa_handler = onSignal;
     action.sa_flags = SA_RESTART;
-    for (int const signal : kSignals)
-        sigaction(signal, &action, nullptr);
+    for (std::size_t i = 0; i < std::size(kSignals); ++i) {
+        sigaction(kSignals[i], nullptr, &before_[i]);
+        // Whoever started the program with a signal ignored, as nohup does, has it stay so.
+        if (before_[i].sa_handler != SIG_IGN)
+            sigaction(kSignals[i], &action, nullptr);
+    }
 }
 
 Interruption::~Interruption()
 {
-    for (int const signal : kSignals)
-        std::signal(signal, SIG_DFL);
+    for (std::size_t i = 0; i < std::size(kSignals); ++i)
+        sigaction(kSignals[i], &before_[i], nullptr);
     deferred = requested = false;
     received = 0;
 }

@@ -3,10 +3,12 @@
 
 #include <CLI/CLI.hpp>
 #include <cerrno>
+#include <csignal>
 #include <cstdio>
 #include <cstring>
 #include <fmt/format.h>
 #include <new>
+#include <unistd.h>
 
 namespace zsi::cmd {
 namespace {
@@ -106,8 +108,13 @@ void warn(std::string const& message)
 
 int main(int argc, char** argv)
 {
+    // A file that grows over a limit is an error of writing, not the end of the program.
+    std::signal(SIGXFSZ, SIG_IGN);
+    // Allocates nothing: there may be nothing left.
     auto const complain = [](char const* message, int status) {
-        std::fputs((std::string("zsi: ") + message + '\n').c_str(), stderr);
+        for (char const* part : {"zsi: ", message, "\n"})
+            if (write(STDERR_FILENO, part, std::strlen(part)) < 0)
+                break; // nowhere left to tell it
         return status;
     };
     try {

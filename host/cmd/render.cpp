@@ -1,4 +1,5 @@
 // zsi render: a scene file to a picture file.
+#include "render/render.h"
 #include "base/error.h"
 #include "cmd/command.h"
 #include "cmd/interruption.h"
@@ -72,7 +73,7 @@ std::array<int, 4> parseCrop(std::string const& text)
 }
 
 /// A crop of the scene keeps its share of a picture of another size.
-void resize(host::Film& film, std::array<int, 2> size)
+void resize(host::FilmSettings& film, std::array<int, 2> size)
 {
     if (film.crop) {
         auto const scaled = [](int at, int to, int from, auto round) {
@@ -118,22 +119,24 @@ int render(Arguments const& arguments, std::string const& shaderPath)
 
     host::RenderReport report;
     host::Picture picture;
-    {
+    try {
         ProgressBar bar;
         host::RenderOptions options;
         options.threads = arguments.threads;
         options.progress = [&](double done) { bar.show(done); };
         options.cancel = &interruption.defer();
         picture = host::render(scene, options, &report);
+    } catch (host::Cancelled const&) {
+        // Told below, as an interruption while rendering is.
     }
     if (int const status = interruption.status()) {
         std::fputs("zsi: interrupted, no picture written\n", stderr);
         return status;
     }
-    host::writePicture(arguments.output, picture, scene.film.exposure);
+    host::writePicture(arguments.output, picture, {scene.film.exposure, scene.film.alpha == true});
     print(fmt::format("{}: {}x{}, {} samples a pixel, {} rays, {} non-finite results left out, "
                       "{:.2f} s\n",
-                      arguments.output, picture.width, picture.height, scene.settings.samples,
+                      arguments.output, picture.width(), picture.height(), scene.settings.samples,
                       report.rays, report.nonFinite, report.seconds));
     return 0;
 }

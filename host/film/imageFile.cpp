@@ -1,19 +1,13 @@
 #include "film/imageFile.h"
 
 #include "base/error.h"
+#include "base/replacedFile.h"
 
 #include <OpenImageIO/filesystem.h>
 #include <OpenImageIO/imageio.h>
 #include <algorithm>
 #include <cctype>
-#include <cerrno>
 #include <cmath>
-#include <cstdio>
-#include <cstring>
-#include <fcntl.h>
-#include <fmt/format.h>
-#include <unistd.h>
-#include <utility>
 #include <zsi/vecmath.h>
 
 namespace zsi::host {
@@ -37,24 +31,21 @@ std::uint8_t encodeLinear(float v)
                        : static_cast<std::uint8_t>(std::lround(minOf(v, 1.0f) * 255.0f));
 }
 
-struct Encoding {
-    int channels;
-    OIIO::TypeDesc type;
-};
+enum class Kind { Exr, Hdr, Png, Jpeg };
 
-Encoding encodingOf(std::filesystem::path const& file)
+Kind kindOf(std::filesystem::path const& file)
 {
     std::string extension = file.extension().string();
     std::transform(extension.begin(), extension.end(), extension.begin(),
                    [](unsigned char c) { return static_cast<char>(std::tolower(c)); });
     if (extension == ".exr")
-        return {4, OIIO::TypeDesc::FLOAT};
+        return Kind::Exr;
     if (extension == ".hdr")
-        return {3, OIIO::TypeDesc::FLOAT};
+        return Kind::Hdr;
     if (extension == ".png")
-        return {4, OIIO::TypeDesc::UINT8};
+        return Kind::Png;
     if (extension == ".jpg" || extension == ".jpeg")
-        return {3, OIIO::TypeDesc::UINT8};
+        return Kind::Jpeg;
     throw InputError(file.string()
                      + ": unknown kind of picture; expected .exr, .hdr, .png, .jpg or .jpeg");
 }
@@ -64,94 +55,91 @@ Encoding encodingOf(std::filesystem::path const& file)
     throw InputError(file.string() + ": cannot be written: " + why);
 }
 
-/// A file beside the one that it may become, removed on the way out otherwise.
-class TemporaryFile {
-public:
-    /// Throws InputError when there can be no such file.
-    explicit TemporaryFile(std::filesystem::path const& goal)
-        : goal_(goal)
-        , path_(
-              goal.parent_path()
-              / fmt::format(".{}.{}{}", goal.stem().string(), getpid(), goal.extension().string()))
-        , descriptor_(open(path_.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666))
-    {
-        if (descriptor_ < 0)
-            fail(goal_, std::strerror(errno));
-    }
-    TemporaryFile(TemporaryFile const&) = delete;
-    TemporaryFile& operator=(TemporaryFile const&) = delete;
-    ~TemporaryFile()
-    {
-        if (descriptor_ >= 0)
-            close(descriptor_);
-        if (!path_.empty())
-            unlink(path_.c_str());
-    }
-
-    void write(std::vector<unsigned char> const& bytes) const
-    {
-        for (std::size_t done = 0; done < bytes.size();) {
-            ssize_t const n = ::write(descriptor_, bytes.data() + done, bytes.size() - done);
-            if (n < 0 && errno != EINTR)
-                fail(goal_, std::strerror(errno));
-            done += n > 0 ? static_cast<std::size_t>(n) : 0;
-        }
-    }
-
-    void becomeGoal()
-    {
-        int const closed = close(std::exchange(descriptor_, -1)); // some disks tell only now
-        if (closed != 0 || rename(path_.c_str(), goal_.c_str()) != 0)
-            fail(goal_, std::strerror(errno));
-        path_.clear();
-    }
-
-private:
-    std::filesystem::path const& goal_;
-    std::filesystem::path path_;
-    int descriptor_;
+/// The layers as one row of channels a pixel, named as EXR files name them: those of the first
+/// layer plainly, the others "layer.channel".
+struct Channels {
+    std::vector<std::string> names;
+    std::vector<float> values;
 };
+
+Channels interleaved(Picture const& picture)
+{
+    Channels all;
+    for (Layer const& layer : picture.layers)
+        for (std::string const& channel : layer.channels)
+            all.names.push_back(&layer == &picture.layers.front() ? channel
+                                                                  : layer.name + '.' + channel);
+    auto const pixels =
+        static_cast<std::size_t>(picture.width()) * static_cast<std::size_t>(picture.height());
+    all.values.reserve(pixels * all.names.size());
+    for (std::size_t i = 0; i < pixels; ++i)
+        for (Layer const& layer : picture.layers) {
+            std::size_t const n = layer.channels.size();
+            auto const from = layer.values.begin() + static_cast<std::ptrdiff_t>(i * n);
+            all.values.insert(all.values.end(), from, from + static_cast<std::ptrdiff_t>(n));
+        }
+    return all;
+}
+
+std::vector<std::uint8_t> encoded(Picture const& picture, std::size_t channels,
+                                  ScreenView const& view)
+{
+    float const gain = std::exp2(view.exposure);
+    std::vector<float> const& rgba = picture.rgba();
+    std::vector<std::uint8_t> bytes(rgba.size() / 4 * channels);
+    for (std::size_t i = 0; i < rgba.size() / 4; ++i)
+        for (std::size_t c = 0; c < channels; ++c) {
+            float const v = rgba[i * 4 + c];
+            bytes[i * channels + c] = c == 3 ? encodeLinear(v) : encodeSrgb(v * gain);
+        }
+    return bytes;
+}
 
 /// The bytes of the file. Made in memory, since some encoders do not notice a full disk and one
 /// ends the program over it.
 std::vector<unsigned char> encode(std::filesystem::path const& file, Picture const& picture,
-                                  float exposure, Encoding const& encoding)
+                                  ScreenView const& view, Kind kind)
 {
     std::vector<unsigned char> result;
     OIIO::Filesystem::IOVecOutput memory(result);
-    auto const output = OIIO::ImageOutput::create(file.string());
+    auto const output = OIIO::ImageOutput::create(file.filename().string());
     if (!output || !output->set_ioproxy(&memory))
         fail(file, OIIO::geterror());
-    OIIO::ImageSpec spec(picture.width, picture.height, encoding.channels, encoding.type);
-    bool const encoded = encoding.type == OIIO::TypeDesc::UINT8;
-    spec.attribute("oiio:ColorSpace", encoded ? "sRGB" : "Linear");
+    bool const screen = kind == Kind::Png || kind == Kind::Jpeg;
+    Channels const all = kind == Kind::Exr ? interleaved(picture) : Channels();
+    int const channels = kind == Kind::Exr ? static_cast<int>(all.names.size())
+        : kind == Kind::Png && view.alpha  ? 4
+                                           : 3;
+    OIIO::ImageSpec spec(picture.width(), picture.height(), channels,
+                         screen ? OIIO::TypeDesc::UINT8 : OIIO::TypeDesc::FLOAT);
+    spec.attribute("oiio:ColorSpace", screen ? "sRGB" : "Linear");
     spec.attribute("Software", "zsi");
     spec.attribute("DateTime", ""); // the same picture is the same file
-    if (encoded)
-        spec.attribute("oiio:UnassociatedAlpha", 1); // colours go out as they are
-    if (file.extension() == ".exr")
-        spec.attribute("compression", "zip");
+    spec.attribute("oiio:UnassociatedAlpha", 1); // colours go out as they are
     spec.attribute("CompressionQuality", 95);
-    if (!output->open(file.string(), spec))
-        fail(file, output->geterror());
-
-    auto const pixels =
-        static_cast<std::size_t>(picture.width) * static_cast<std::size_t>(picture.height);
-    auto const channels = static_cast<std::size_t>(encoding.channels);
-    bool written;
-    if (encoded) {
-        float const gain = std::exp2(exposure);
-        std::vector<std::uint8_t> bytes(pixels * channels);
-        for (std::size_t i = 0; i < pixels; ++i)
-            for (std::size_t c = 0; c < channels; ++c) {
-                float const v = picture.rgba[i * 4 + c];
-                bytes[i * channels + c] = c == 3 ? encodeLinear(v) : encodeSrgb(v * gain);
-            }
-        written = output->write_image(OIIO::TypeDesc::UINT8, bytes.data());
-    } else {
-        written = output->write_image(OIIO::TypeDesc::FLOAT, picture.rgba.data(),
-                                      static_cast<OIIO::stride_t>(4 * sizeof(float)));
+    if (kind == Kind::Exr) {
+        spec.channelnames = all.names;
+        spec.attribute("compression", "zip");
+        // The data window lies where the crop was in the whole picture.
+        spec.x = picture.window.x0;
+        spec.y = picture.window.y0;
+        spec.full_x = spec.full_y = 0;
+        spec.full_width = picture.frameWidth;
+        spec.full_height = picture.frameHeight;
+        spec.erase_attribute("oiio:UnassociatedAlpha");
     }
+    if (!output->open(file.filename().string(), spec))
+        fail(file, output->geterror());
+    bool written;
+    if (kind == Kind::Exr)
+        written = output->write_image(OIIO::TypeDesc::FLOAT, all.values.data());
+    else if (screen)
+        written =
+            output->write_image(OIIO::TypeDesc::UINT8,
+                                encoded(picture, static_cast<std::size_t>(channels), view).data());
+    else
+        written = output->write_image(OIIO::TypeDesc::FLOAT, picture.rgba().data(),
+                                      static_cast<OIIO::stride_t>(4 * sizeof(float)));
     bool const closed = output->close();
     if (!written || !closed)
         fail(file, output->geterror());
@@ -162,23 +150,18 @@ std::vector<unsigned char> encode(std::filesystem::path const& file, Picture con
 
 void checkPictureFile(std::filesystem::path const& file)
 {
-    encodingOf(file);
-    std::error_code ignored;
-    if (std::filesystem::is_directory(file, ignored))
-        fail(file, "it is a folder");
-    if (std::filesystem::exists(file, ignored) && access(file.c_str(), W_OK) != 0)
-        fail(file, std::strerror(errno));
-    TemporaryFile const temporary(file);
+    kindOf(file);
+    ReplacedFile::check(file);
 }
 
-void writePicture(std::filesystem::path const& file, Picture const& picture, float exposure)
+void writePicture(std::filesystem::path const& file, Picture const& picture, ScreenView const& view)
 {
-    Encoding const encoding = encodingOf(file);
-    if (picture.width <= 0 || picture.height <= 0)
+    Kind const kind = kindOf(file);
+    if (picture.width() <= 0 || picture.height() <= 0)
         throw InputError(file.string() + ": the picture is empty");
-    TemporaryFile temporary(file);
-    temporary.write(encode(file, picture, exposure, encoding));
-    temporary.becomeGoal();
+    ReplacedFile goal(file);
+    goal.write(encode(file, picture, view, kind));
+    goal.commit();
 }
 
 } // namespace zsi::host

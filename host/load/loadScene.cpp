@@ -2,6 +2,8 @@
 
 #include "base/error.h"
 #include "base/names.h"
+#include "integrate/integrators.h"
+#include "integrate/layers.h"
 #include "load/jsonReader.h"
 #include "load/parameterValues.h"
 #include "load/sceneFile.h"
@@ -51,10 +53,10 @@ Camera readCamera(JsonReader const& reader)
     return camera;
 }
 
-Film readFilm(JsonReader const& reader)
+FilmSettings readFilm(JsonReader const& reader)
 {
-    reader.expectKeys({"width", "height", "exposure", "alpha", "crop"});
-    Film film;
+    reader.expectKeys({"width", "height", "exposure", "alpha", "crop", "layers"});
+    FilmSettings film;
     if (auto const v = reader.find("width"))
         film.width = v->toInt(1, kLargestFilm);
     if (auto const v = reader.find("height"))
@@ -63,6 +65,9 @@ Film readFilm(JsonReader const& reader)
         film.exposure = v->toFloat(-64, 64);
     if (auto const v = reader.find("alpha"))
         film.alpha = v->toBool();
+    if (auto const v = reader.find("layers"))
+        for (JsonReader const& name : v->items())
+            film.layers.push_back(layerNames()[name.toChoice(layerNames())]);
     if (auto const v = reader.find("crop")) {
         std::vector<JsonReader> const items = v->items();
         if (items.size() != 4)
@@ -97,8 +102,7 @@ Settings readSettings(JsonReader const& reader)
     if (auto const v = reader.find("seed"))
         settings.seed = v->toUint32();
     if (auto const v = reader.find("integrator")) {
-        std::vector<std::string> const names{"shade", "path"};
-        settings.integrator = names[v->toChoice(names)];
+        settings.integrator = integratorNames()[v->toChoice(integratorNames())];
     }
     return settings;
 }

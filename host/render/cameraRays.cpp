@@ -5,7 +5,7 @@
 
 namespace zsi::host {
 
-CameraRays::CameraRays(Camera const& camera, Film const& film)
+CameraRays::CameraRays(Camera const& camera, FilmSettings const& film)
     : position_(camera.position)
     , halfHeight_(std::tan(camera.verticalFov * (3.14159265f / 360.0f)))
     , width_(static_cast<float>(film.width))

@@ -8,7 +8,7 @@ namespace zsi::host {
 
 class CameraRays {
 public:
-    CameraRays(Camera const& camera, Film const& film);
+    CameraRays(Camera const& camera, FilmSettings const& film);
 
     /// The ray through raster position (x, y), pixels, x to the right, y downwards; `lens` in
     /// [0, 1)^2 picks the point of the lens.

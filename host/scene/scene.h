@@ -51,12 +51,15 @@ struct Camera {
     float focusDistance = 0.0f; ///< 0: the distance to the target
 };
 
-struct Film {
+struct FilmSettings {
     int width = 640;
     int height = 360;
     std::optional<std::array<int, 4>> crop; ///< x0, y0, x1, y1 in pixels, end exclusive
     float exposure = 0.0f; ///< stops, applied to 8-bit output only
-    bool alpha = true; ///< false: the picture is opaque, whatever the shaders say
+    /// True: with the alpha of the shaders. False: opaque. Unset: opaque where 8 bits are written,
+    /// with alpha elsewhere.
+    std::optional<bool> alpha;
+    std::vector<std::string> layers; ///< beside the beauty, by name (integrate/layers.h)
 };
 
 struct Settings {
@@ -68,13 +71,13 @@ struct Settings {
     Vec3f ambient{0, 0, 0}; ///< what `ambientLight` gives
     float sampleClamp = 0.0f; ///< brightest channel that a camera sample may have; 0: no limit
     std::uint32_t seed = 1;
-    std::string integrator = "shade"; ///< "shade": the materials' shade; "path": sample/transfer
+    std::string integrator = "shade"; ///< a name of integrate/integrators.h
 };
 
 struct Scene {
     std::string file; ///< for messages
     Camera camera;
-    Film film;
+    FilmSettings film;
     Settings settings;
     std::vector<Mesh> meshes;
     std::vector<Shader> materials;

@@ -47,20 +47,38 @@ PreparedMaterial prepare(Shader const& shader)
 
 } // namespace
 
-PreparedScene::PreparedScene(Scene const& scene_)
-    : scene(scene_)
-    , rays(scene_)
+PreparedScene::PreparedScene(Scene const& scene, BuildProgress const& progress)
+    : scene_(scene)
+    , rays_(scene, progress)
 {
-    for (Shader const& shader : scene.materials)
-        materials.push_back(prepare(shader));
+    for (Shader const& shader : scene_.materials)
+        materials_.push_back(prepare(shader));
 }
 
-void PreparedScene::fillAttributes(SurfacePoint const& s, ShadeState& state) const
+void PreparedScene::materialChanged(std::size_t index)
 {
-    PreparedMaterial const& material = materialOf(s);
+    bool const wasClear = (materials_[index].entryPoints & kTransmission) != 0;
+    materials_[index] = prepare(scene_.materials[index]);
+    if (((materials_[index].entryPoints & kTransmission) != 0) != wasClear)
+        rays_.rebuildInstances({});
+}
+
+void PreparedScene::instancesChanged(BuildProgress const& progress)
+{
+    rays_.rebuildInstances(progress);
+}
+
+void PreparedScene::meshesChanged(BuildProgress const& progress)
+{
+    rays_ = RayScene(scene_, progress);
+}
+
+void PreparedScene::fillAttributes(SurfacePoint const& s, PreparedMaterial const& material,
+                                   ShadeState& state) const
+{
     if (material.attributes.empty())
         return;
-    Mesh const& mesh = scene.meshes[static_cast<std::size_t>(scene.instances[s.instance].mesh)];
+    Mesh const& mesh = scene_.meshes[static_cast<std::size_t>(scene_.instances[s.instance].mesh)];
     auto const& corner = mesh.triangles[s.triangle];
     float const w = 1.0f - s.u - s.v;
     auto const deliver = [&](auto const& values, auto missing, std::size_t offset) {

@@ -23,19 +23,40 @@ struct PreparedMaterial {
     bool scatters() const { return (entryPoints & kSample) && (entryPoints & kTransfer); }
 };
 
-struct PreparedScene {
-    explicit PreparedScene(Scene const& scene);
+/// Holds on to the scene's own data, which must outlive it. What is changed there between two
+/// renderings is told by the functions below; each renews what stands on it and nothing else. A
+/// parameter's value, the camera, the film and the settings are read where they stand and need no
+/// telling.
+class PreparedScene {
+public:
+    /// Throws std::bad_alloc, or Cancelled when `progress` says so.
+    explicit PreparedScene(Scene const& scene, BuildProgress const& progress = {});
 
+    /// The shader of material `index` is another one.
+    void materialChanged(std::size_t index);
+    /// Instances stand elsewhere, are more or fewer, or have another material or mesh.
+    void instancesChanged(BuildProgress const& progress = {});
+    /// Meshes are others. Renews all that stands on them.
+    void meshesChanged(BuildProgress const& progress = {});
+
+    Scene const& scene() const { return scene_; }
+    RayScene const& rays() const { return rays_; }
+    EnvironmentShader const* environment() const
+    {
+        return scene_.environment ? scene_.environment->environment() : nullptr;
+    }
     PreparedMaterial const& materialOf(SurfacePoint const& s) const
     {
-        return materials[static_cast<std::size_t>(scene.instances[s.instance].material)];
+        return materials_[static_cast<std::size_t>(scene_.instances[s.instance].material)];
     }
     /// Writes the vertex attributes that the material of `s` declared.
-    void fillAttributes(SurfacePoint const& s, ShadeState& state) const;
+    void fillAttributes(SurfacePoint const& s, PreparedMaterial const& material,
+                        ShadeState& state) const;
 
-    Scene const& scene;
-    RayScene rays;
-    std::vector<PreparedMaterial> materials;
+private:
+    Scene const& scene_;
+    RayScene rays_;
+    std::vector<PreparedMaterial> materials_;
 };
 
 } // namespace zsi::host

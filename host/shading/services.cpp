@@ -1,7 +1,7 @@
 // The services of a shading call. docs/services.md describes them.
-#include "integrate/tracer.h"
 #include "sampling/directions.h"
 #include "shading/noise.h"
+#include "shading/shadingContext.h"
 
 #include <limits>
 
@@ -28,13 +28,13 @@ bool unit(Vec3f& v)
 
 } // namespace
 
-LightSample* Tracer::getLightSamples(int, Vec3f const* P, Vec3f const* normal)
+LightSample* ShadingContext::getLightSamples(int, Vec3f const* P, Vec3f const* normal)
 {
     if (!call_)
         return nullptr;
     LightSample* head = nullptr;
     LightSample** end = &head;
-    for (Light const& light : scene_.scene.lights) {
+    for (Light const& light : scene_.scene().lights) {
         Vec2f const u = light.radius > 0.0f ? sampler_->next2D() : Vec2f(0, 0);
         ShadeState state = call_->state;
         LightSample sample;
@@ -50,9 +50,9 @@ LightSample* Tracer::getLightSamples(int, Vec3f const* P, Vec3f const* normal)
     return head;
 }
 
-Vec3f Tracer::ambientLight(Vec3f const*, Vec3f const*) { return settings_.ambient; }
+Vec3f ShadingContext::ambientLight(Vec3f const*, Vec3f const*) { return settings_.ambient; }
 
-Vec3f Tracer::shadowTransmission(Vec3f const* from, Vec3f const* to)
+Vec3f ShadingContext::shadowTransmission(Vec3f const* from, Vec3f const* to)
 {
     Vec3f direction = *to - *from;
     if (!unit(direction))
@@ -65,10 +65,10 @@ Vec3f Tracer::shadowTransmission(Vec3f const* from, Vec3f const* to)
     return transmit(*from, origin, direction, distance * kShadowEnd);
 }
 
-Vec3f Tracer::transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMax)
+Vec3f ShadingContext::transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMax)
 {
     ++rays_;
-    if (scene_.rays.occluded({origin, direction, tMax}, Visibility::Opaque))
+    if (scene_.rays().occluded({origin, direction, tMax}, Visibility::Opaque))
         return {0, 0, 0};
 
     PathRay ray;
@@ -80,14 +80,13 @@ Vec3f Tracer::transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMax)
     ray.E = E;
     ray.origin = origin;
     if (call_ && E == call_->surface.P)
-        changeMedia(ray, call_->ray.direction, call_->surface,
-                    scene_.materialOf(call_->surface).ior);
+        changeMedia(ray, call_->ray.direction, call_->surface, call_->material.ior);
     Vec3f passed{1, 1, 1};
     for (int i = 0; i < kMaxShadowSurfaces; ++i) {
         Hit hit;
-        if (!scene_.rays.intersect({ray.origin, direction, tMax}, Visibility::Clear, hit))
+        if (!scene_.rays().intersect({ray.origin, direction, tMax}, Visibility::Clear, hit))
             return passed;
-        SurfacePoint const surface = scene_.rays.surface(hit);
+        SurfacePoint const surface = scene_.rays().surface(hit);
         PreparedMaterial const& material = scene_.materialOf(surface);
         {
             Call call(*this, ray, surface);
@@ -109,8 +108,8 @@ Vec3f Tracer::transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMax)
     return {0, 0, 0};
 }
 
-bool Tracer::child(Vec3f const* origin, Vec3f const* direction, float importance, PathRay& ray,
-                   float& scale)
+bool ShadingContext::child(Vec3f const* origin, Vec3f const* direction, float importance,
+                           PathRay& ray, float& scale)
 {
     if (!call_ || !isFinite(*origin) || importance <= 0.0f)
         return false;
@@ -119,7 +118,8 @@ bool Tracer::child(Vec3f const* origin, Vec3f const* direction, float importance
     if (!unit(ray.direction))
         return false;
     ray.E = *origin;
-    ray.origin = start(*origin, ray.direction);
+    ray.ignored = 0;
+    ray.origin = rayStart(*origin, ray.direction);
     ray.depth += 1;
     ray.importance *= importance < 1.0f ? importance : 1.0f;
     scale = 1.0f;
@@ -131,12 +131,12 @@ bool Tracer::child(Vec3f const* origin, Vec3f const* direction, float importance
         ray.importance = kFullImportance;
     }
 
-    changeMedia(ray, call_->ray.direction, call_->surface, scene_.materialOf(call_->surface).ior);
+    changeMedia(ray, call_->ray.direction, call_->surface, call_->material.ior);
     return true;
 }
 
-bool Tracer::continuation(Vec3f const* origin, Vec3f const* direction, float importance,
-                          PathRay& ray)
+bool ShadingContext::continuation(Vec3f const* origin, Vec3f const* direction, float importance,
+                                  PathRay& ray)
 {
     if (!call_ || !isFinite(*origin))
         return false;
@@ -145,52 +145,53 @@ bool Tracer::continuation(Vec3f const* origin, Vec3f const* direction, float imp
     if (!unit(ray.direction))
         return false;
     ray.E = *origin;
-    ray.origin = start(*origin, ray.direction);
+    ray.ignored = 0;
+    ray.origin = rayStart(*origin, ray.direction);
     ray.passes += 1;
     ray.importance *= importance < 1.0f ? maxOf(importance, 0.0f) : 1.0f;
     return true;
 }
 
-Vec3f Tracer::traceContinue(int rayType, Vec3f const* origin, Vec3f const* direction,
-                            float importance)
+Vec3f ShadingContext::traceContinue(int rayType, Vec3f const* origin, Vec3f const* direction,
+                                    float importance)
 {
     PathRay ray;
     if (!continuation(origin, direction, importance, ray))
         return {0, 0, 0};
     ray.type = static_cast<std::uint32_t>(rayType);
-    return rgb(radiance(ray));
+    return rgb(source_.radiance(ray));
 }
 
-Vec4f Tracer::traceThrough(Vec3f const* P, Vec3f const* I, float importance)
+Vec4f ShadingContext::traceThrough(Vec3f const* P, Vec3f const* I, float importance)
 {
     PathRay ray;
     if (!continuation(P, I, importance, ray))
         return {0, 0, 0, 0};
     if (ray.type == kRayCamera)
         ray.type = kRayTransmission;
-    return radiance(ray);
+    return source_.radiance(ray);
 }
 
-Vec3f Tracer::traceReflection(Vec3f const* origin, Vec3f const* direction, float importance)
+Vec3f ShadingContext::traceReflection(Vec3f const* origin, Vec3f const* direction, float importance)
 {
     return traceLobe(origin, direction, 0.0f, 2.0f, importance);
 }
 
-Vec3f Tracer::traceSpecular(Vec3f const* origin, Vec3f const* direction, float spread,
-                            float importance)
+Vec3f ShadingContext::traceSpecular(Vec3f const* origin, Vec3f const* direction, float spread,
+                                    float importance)
 {
     return traceLobe(origin, direction, spread, 2.0f, importance);
 }
 
-Vec3f Tracer::traceRefraction(Vec3f const* origin, Vec3f const* direction, float spread,
-                              float importance)
+Vec3f ShadingContext::traceRefraction(Vec3f const* origin, Vec3f const* direction, float spread,
+                                      float importance)
 {
     // A refracted ray turns by |1 - 1/n| to |n - 1| of the facet's tilt: about a half for glass.
     return traceLobe(origin, direction, spread, 0.5f, importance);
 }
 
-Vec3f Tracer::traceLobe(Vec3f const* origin, Vec3f const* direction, float spread, float turn,
-                        float importance)
+Vec3f ShadingContext::traceLobe(Vec3f const* origin, Vec3f const* direction, float spread,
+                                float turn, float importance)
 {
     Vec3f axis = *direction;
     if (!call_ || !unit(axis))
@@ -206,10 +207,10 @@ Vec3f Tracer::traceLobe(Vec3f const* origin, Vec3f const* direction, float sprea
     if (!child(origin, &axis, importance, ray, scale))
         return {0, 0, 0};
     ray.type = kRayReflection;
-    return rgb(radiance(ray)) * scale;
+    return rgb(source_.radiance(ray)) * scale;
 }
 
-Vec3f Tracer::gatherNormal(Vec3f P, Vec3f N) const
+Vec3f ShadingContext::gatherNormal(Vec3f P, Vec3f N) const
 {
     if (!(P == call_->surface.P))
         return N;
@@ -217,7 +218,7 @@ Vec3f Tracer::gatherNormal(Vec3f P, Vec3f N) const
     return dot(N, Ng) < 0.0f ? -Ng : Ng;
 }
 
-Vec3f Tracer::occlusion(Vec3f const* P, Vec3f const* N, float)
+Vec3f ShadingContext::occlusion(Vec3f const* P, Vec3f const* N, float)
 {
     Vec3f axis = *N;
     if (!call_ || !isFinite(*P) || !unit(axis)) // no normal, no hemisphere to be blocked
@@ -235,7 +236,7 @@ Vec3f Tracer::occlusion(Vec3f const* P, Vec3f const* N, float)
     return open / static_cast<float>(count); // exactly 1 when every ray is free
 }
 
-Vec3f Tracer::indirectDiffuse(Vec3f const* P, Vec3f const* N, float importance)
+Vec3f ShadingContext::indirectDiffuse(Vec3f const* P, Vec3f const* N, float importance)
 {
     Vec3f axis = *N;
     if (!call_ || !unit(axis) || call_->ray.diffuseBounces >= kMaxDiffuseBounces)
@@ -253,12 +254,12 @@ Vec3f Tracer::indirectDiffuse(Vec3f const* P, Vec3f const* N, float importance)
         ray.type = kRayDiffuse;
         ray.diffuseBounces += 1;
         ray.origin = shadowStart(*P, direction);
-        sum += rgb(radiance(ray)) * scale;
+        sum += rgb(source_.radiance(ray)) * scale;
     }
     return sum / static_cast<float>(count);
 }
 
-Vec3f Tracer::start(Vec3f origin, Vec3f direction) const
+Vec3f ShadingContext::rayStart(Vec3f origin, Vec3f direction) const
 {
     if (!call_ || !(origin == call_->surface.P))
         return origin;
@@ -266,20 +267,20 @@ Vec3f Tracer::start(Vec3f origin, Vec3f direction) const
     return offsetPoint(origin, dot(direction, Ng) < 0.0f ? -Ng : Ng);
 }
 
-Vec3f Tracer::shadowStart(Vec3f origin, Vec3f direction) const
+Vec3f ShadingContext::shadowStart(Vec3f origin, Vec3f direction) const
 {
     if (call_ && origin == call_->surface.P && dot(direction, call_->surface.Ng) > 0.0f)
         return offsetPoint(call_->surface.smoothP, call_->surface.Ng);
-    return start(origin, direction);
+    return rayStart(origin, direction);
 }
 
-float Tracer::random() { return sampler_->next(); }
-Vec2f Tracer::random2D() { return sampler_->next2D(); }
-float Tracer::cellNoise1D(float x) { return host::cellNoise1D(x); }
-float Tracer::noise2D(Vec2f const* p) { return host::noise2D(*p); }
-float Tracer::noise3DPoint(Vec3f const* p) { return signedNoise3D(*p); }
-float Tracer::noise3D(Vec4f const* pointAndPhase) { return noise4D(*pointAndPhase); }
-float Tracer::noise3DRecord(Vec3f const* p) { return host::noise3D(*p); }
-Vec3f Tracer::cellNoise3D(Vec3f const* p) { return host::cellNoise3D(*p); }
+float ShadingContext::random() { return sampler_->next(); }
+Vec2f ShadingContext::random2D() { return sampler_->next2D(); }
+float ShadingContext::cellNoise1D(float x) { return host::cellNoise1D(x); }
+float ShadingContext::noise2D(Vec2f const* p) { return host::noise2D(*p); }
+float ShadingContext::noise3DPoint(Vec3f const* p) { return signedNoise3D(*p); }
+float ShadingContext::noise3D(Vec4f const* pointAndPhase) { return noise4D(*pointAndPhase); }
+float ShadingContext::noise3DRecord(Vec3f const* p) { return host::noise3D(*p); }
+Vec3f ShadingContext::cellNoise3D(Vec3f const* p) { return host::cellNoise3D(*p); }
 
 } // namespace zsi::host

@@ -2,10 +2,12 @@
 
 #include "base/error.h"
 
+#include <algorithm>
 #include <bit>
 #include <cmath>
 #include <cstring>
 #include <embree3/rtcore.h>
+#include <new>
 #include <tbb/task_arena.h>
 
 namespace zsi::host {
@@ -13,6 +15,7 @@ namespace {
 
 using DeviceHandle = std::unique_ptr<RTCDeviceTy, decltype(&rtcReleaseDevice)>;
 using SceneHandle = std::unique_ptr<RTCSceneTy, decltype(&rtcReleaseScene)>;
+using GeometryHandle = std::unique_ptr<RTCGeometryTy, decltype(&rtcReleaseGeometry)>;
 
 struct PreparedInstance {
     Mesh const* mesh;
@@ -55,34 +58,106 @@ RTCRayHit embreeRay(Ray const& ray)
     return r;
 }
 
-SceneHandle newScene(RTCDevice device)
-{
-    SceneHandle scene(rtcNewScene(device), rtcReleaseScene);
-    // Watertight at shared edges; the quality build is repaid by every ray.
-    rtcSetSceneFlags(scene.get(), RTC_SCENE_FLAG_ROBUST);
-    rtcSetSceneBuildQuality(scene.get(), RTC_BUILD_QUALITY_HIGH);
-    return scene;
-}
-
-SceneHandle buildMesh(RTCDevice device, Mesh const& mesh)
-{
-    SceneHandle scene = newScene(device);
-    if (!mesh.triangles.empty()) {
-        RTCGeometry const geometry = rtcNewGeometry(device, RTC_GEOMETRY_TYPE_TRIANGLE);
-        // Embree owns and pads its copies, so that the mesh may lie in memory as it likes.
-        std::size_t const vertices = mesh.positions.size() * sizeof(Vec3f);
-        std::memcpy(rtcSetNewGeometryBuffer(geometry, RTC_BUFFER_TYPE_VERTEX, 0, RTC_FORMAT_FLOAT3,
-                                            sizeof(Vec3f), mesh.positions.size()),
-                    mesh.positions.data(), vertices);
-        std::size_t const indices = mesh.triangles.size() * sizeof(mesh.triangles[0]);
-        std::memcpy(rtcSetNewGeometryBuffer(geometry, RTC_BUFFER_TYPE_INDEX, 0, RTC_FORMAT_UINT3,
-                                            sizeof(mesh.triangles[0]), mesh.triangles.size()),
-                    mesh.triangles.data(), indices);
-        rtcCommitGeometry(geometry);
-        rtcAttachGeometry(scene.get(), geometry);
-        rtcReleaseGeometry(geometry);
+/// What goes wrong while structures are built, and who may end it. Embree reports both by calling
+/// back and by null results; `check` turns them into exceptions.
+class Build {
+public:
+    Build(RTCDevice device, BuildProgress const& progress, double triangles)
+        : device_(device)
+        , progress_(progress)
+        , triangles_(triangles)
+    {
     }
-    rtcCommitScene(scene.get());
+
+    SceneHandle newScene() const
+    {
+        SceneHandle scene(rtcNewScene(device_), rtcReleaseScene);
+        check(scene != nullptr);
+        // Watertight at shared edges; the quality build is repaid by every ray.
+        rtcSetSceneFlags(scene.get(), RTC_SCENE_FLAG_ROBUST);
+        rtcSetSceneBuildQuality(scene.get(), RTC_BUILD_QUALITY_HIGH);
+        return scene;
+    }
+
+    GeometryHandle newGeometry(RTCGeometryType type) const
+    {
+        GeometryHandle geometry(rtcNewGeometry(device_, type), rtcReleaseGeometry);
+        check(geometry != nullptr);
+        return geometry;
+    }
+
+    /// A copy of `data` that Embree owns and pads, so that the mesh may lie in memory as it likes.
+    template <class Element>
+    void copyToBuffer(RTCGeometry geometry, RTCBufferType type, RTCFormat format,
+                      std::vector<Element> const& data) const
+    {
+        void* const buffer =
+            rtcSetNewGeometryBuffer(geometry, type, 0, format, sizeof(Element), data.size());
+        check(buffer != nullptr);
+        std::memcpy(buffer, data.data(), data.size() * sizeof(Element));
+    }
+
+    /// `triangles` lie below the scene.
+    void commit(RTCScene scene, std::size_t triangles)
+    {
+        share_ = static_cast<double>(triangles) / std::max(1.0, triangles_);
+        rtcSetSceneProgressMonitorFunction(scene, onProgress, this);
+        rtcCommitScene(scene);
+        rtcSetSceneProgressMonitorFunction(scene, nullptr, nullptr);
+        if (cancelled_) {
+            rtcGetDeviceError(device_); // forgets it
+            throw Cancelled();
+        }
+        check(true);
+        done_ += share_;
+    }
+
+    void check(bool result) const
+    {
+        switch (rtcGetDeviceError(device_)) {
+        case RTC_ERROR_NONE:
+            if (result)
+                return;
+            [[fallthrough]];
+        case RTC_ERROR_OUT_OF_MEMORY:
+            throw std::bad_alloc();
+        case RTC_ERROR_CANCELLED:
+            throw Cancelled();
+        default:
+            throw InputError("the acceleration structure cannot be built");
+        }
+    }
+
+private:
+    static bool onProgress(void* self, double done)
+    {
+        auto& build = *static_cast<Build*>(self);
+        if (build.progress_
+            && !build.progress_(minOf(1.0f, static_cast<float>(build.done_ + build.share_ * done))))
+            build.cancelled_ = true;
+        return !build.cancelled_;
+    }
+
+    RTCDevice device_;
+    BuildProgress const& progress_;
+    double triangles_; ///< of all scenes to be committed
+    double done_ = 0, share_ = 0;
+    bool cancelled_ = false;
+};
+
+SceneHandle buildMesh(Build& build, Mesh const& mesh)
+{
+    SceneHandle scene = build.newScene();
+    if (!mesh.triangles.empty()) {
+        GeometryHandle const geometry = build.newGeometry(RTC_GEOMETRY_TYPE_TRIANGLE);
+        build.copyToBuffer(geometry.get(), RTC_BUFFER_TYPE_VERTEX, RTC_FORMAT_FLOAT3,
+                           mesh.positions);
+        build.copyToBuffer(geometry.get(), RTC_BUFFER_TYPE_INDEX, RTC_FORMAT_UINT3, mesh.triangles);
+        rtcCommitGeometry(geometry.get());
+        rtcAttachGeometry(scene.get(), geometry.get());
+        build.check(true);
+    }
+    build.commit(scene.get(), mesh.triangles.size());
     return scene;
 }
 
@@ -96,75 +171,93 @@ Value interpolate(std::vector<Value> const& values, std::array<std::uint32_t, 3>
 } // namespace
 
 struct RayScene::Impl {
+    Scene const& scene;
     DeviceHandle device;
     std::vector<SceneHandle> meshes;
     SceneHandle all, opaque, clear;
     std::vector<PreparedInstance> instances;
 
-    Impl()
-        : device(rtcNewDevice(nullptr), rtcReleaseDevice)
+    explicit Impl(Scene const& scene_)
+        : scene(scene_)
+        , device(rtcNewDevice(nullptr), rtcReleaseDevice)
         , all(nullptr, rtcReleaseScene)
         , opaque(nullptr, rtcReleaseScene)
         , clear(nullptr, rtcReleaseScene)
     {
         if (!device)
             throw InputError("the ray tracing device cannot be created");
-        all = newScene(device.get());
-        opaque = newScene(device.get());
-        clear = newScene(device.get());
     }
-
-    explicit Impl(Scene const& scene);
 
     RTCScene visible(Visibility v) const
     {
         return (v == Visibility::All ? all : v == Visibility::Clear ? clear : opaque).get();
     }
 
-    void attach(Instance const& instance, std::uint32_t index, bool isClear)
+    void buildMeshes(BuildProgress const& progress)
     {
-        RTCGeometry const geometry = rtcNewGeometry(device.get(), RTC_GEOMETRY_TYPE_INSTANCE);
-        rtcSetGeometryInstancedScene(geometry,
+        double triangles = 0;
+        for (Mesh const& mesh : scene.meshes)
+            triangles += static_cast<double>(mesh.triangles.size());
+        Build build(device.get(), progress, triangles);
+        for (Mesh const& mesh : scene.meshes)
+            meshes.push_back(buildMesh(build, mesh));
+    }
+
+    void buildInstances(BuildProgress const& progress)
+    {
+        Build build(device.get(), progress, 3.0 * static_cast<double>(scene.instances.size()));
+        all = build.newScene();
+        opaque = build.newScene();
+        clear = build.newScene();
+        instances.clear();
+        for (std::size_t i = 0; i < scene.instances.size(); ++i) {
+            Instance const& instance = scene.instances[i];
+            PreparedInstance prepared{&scene.meshes[static_cast<std::size_t>(instance.mesh)],
+                                      instance.objectToWorld, Mat3f::identity()};
+            // A flattened instance has no inside and no inverse; rays do not meet it.
+            if (normalMatrix(instance.objectToWorld, prepared.normalToWorld))
+                attach(build, instance, static_cast<std::uint32_t>(i));
+            instances.push_back(prepared);
+        }
+        for (RTCScene const s : {all.get(), opaque.get(), clear.get()})
+            build.commit(s, scene.instances.size());
+    }
+
+    void attach(Build& build, Instance const& instance, std::uint32_t index)
+    {
+        GeometryHandle const geometry = build.newGeometry(RTC_GEOMETRY_TYPE_INSTANCE);
+        rtcSetGeometryInstancedScene(geometry.get(),
                                      meshes[static_cast<std::size_t>(instance.mesh)].get());
-        rtcSetGeometryTransform(geometry, 0, RTC_FORMAT_FLOAT4X4_COLUMN_MAJOR,
+        rtcSetGeometryTransform(geometry.get(), 0, RTC_FORMAT_FLOAT4X4_COLUMN_MAJOR,
                                 instance.objectToWorld.m);
-        rtcCommitGeometry(geometry);
-        rtcAttachGeometryByID(all.get(), geometry, index);
-        rtcAttachGeometryByID(isClear ? clear.get() : opaque.get(), geometry, index);
-        rtcReleaseGeometry(geometry);
+        rtcCommitGeometry(geometry.get());
+        Shader const& material = scene.materials[static_cast<std::size_t>(instance.material)];
+        bool const isClear = (material.entryPoints() & kTransmission) != 0;
+        rtcAttachGeometryByID(all.get(), geometry.get(), index);
+        rtcAttachGeometryByID(isClear ? clear.get() : opaque.get(), geometry.get(), index);
+        build.check(true);
     }
 };
 
-RayScene::RayScene(Scene const& scene)
+RayScene::RayScene(Scene const& scene, BuildProgress const& progress)
+    : impl_(std::make_unique<Impl>(scene))
 {
     // One thread builds: the structure, and with it the order of equal hits, is repeatable. The
     // device itself would limit the threads of the whole program, not of the build alone.
-    tbb::task_arena(1).execute([&] { impl_ = std::make_unique<Impl>(scene); });
-}
-
-RayScene::Impl::Impl(Scene const& scene)
-    : Impl()
-{
-    for (Mesh const& mesh : scene.meshes)
-        meshes.push_back(buildMesh(device.get(), mesh));
-    for (std::size_t i = 0; i < scene.instances.size(); ++i) {
-        Instance const& instance = scene.instances[i];
-        PreparedInstance prepared{&scene.meshes[static_cast<std::size_t>(instance.mesh)],
-                                  instance.objectToWorld, Mat3f::identity()};
-        // A flattened instance has no inside and no inverse; rays do not meet it.
-        if (normalMatrix(instance.objectToWorld, prepared.normalToWorld)) {
-            Shader const& material = scene.materials[static_cast<std::size_t>(instance.material)];
-            attach(instance, static_cast<std::uint32_t>(i),
-                   (material.entryPoints() & kTransmission) != 0);
-        }
-        instances.push_back(prepared);
-    }
-    rtcCommitScene(all.get());
-    rtcCommitScene(opaque.get());
-    rtcCommitScene(clear.get());
+    tbb::task_arena(1).execute([&] {
+        impl_->buildMeshes(progress);
+        impl_->buildInstances(progress);
+    });
 }
 
 RayScene::~RayScene() = default;
+RayScene::RayScene(RayScene&&) noexcept = default;
+RayScene& RayScene::operator=(RayScene&&) noexcept = default;
+
+void RayScene::rebuildInstances(BuildProgress const& progress)
+{
+    tbb::task_arena(1).execute([&] { impl_->buildInstances(progress); });
+}
 
 bool RayScene::intersect(Ray const& ray, Visibility visible, Hit& hit) const
 {

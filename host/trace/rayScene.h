@@ -4,6 +4,8 @@
 #include "scene/scene.h"
 
 #include <cstdint>
+#include <exception>
+#include <functional>
 #include <limits>
 #include <memory>
 
@@ -46,12 +48,29 @@ enum class Visibility {
     Clear, ///< materials with one
 };
 
-/// Acceleration structures over a scene, which must outlive this and not change. Queries are
-/// thread-safe and do not allocate.
+/// Thrown when a `BuildProgress` ends the building of an acceleration structure.
+class Cancelled : public std::exception {
+public:
+    char const* what() const noexcept override { return "cancelled"; }
+};
+
+/// Asked now and then while acceleration structures are built; false ends it. `done` of 1, of the
+/// scene's triangles.
+using BuildProgress = std::function<bool(double done)>;
+
+/// Acceleration structures over a scene, which must outlive this. Queries are thread-safe and do
+/// not allocate; they must not overlap with rebuilding.
 class RayScene {
 public:
-    explicit RayScene(Scene const& scene);
+    /// Throws std::bad_alloc when memory runs out, InputError for a scene that cannot be traced and
+    /// Cancelled.
+    explicit RayScene(Scene const& scene, BuildProgress const& progress = {});
     ~RayScene();
+    RayScene(RayScene&&) noexcept;
+    RayScene& operator=(RayScene&&) noexcept;
+
+    /// The scene's instances or their materials have changed, its meshes have not.
+    void rebuildInstances(BuildProgress const& progress);
 
     /// The nearest hit, if any.
     bool intersect(Ray const& ray, Visibility visible, Hit& hit) const;

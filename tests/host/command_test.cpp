@@ -1,6 +1,7 @@
 // The zsi command as a user meets it: what it hands on and how it ends. What the parts below it
 // make of their input is tested there.
 #include "film/imageFile.h"
+#include "render/render.h"
 #include "load/loadScene.h"
 #include "support/hostLibraries.h"
 #include "support/inputError.h"
@@ -119,7 +120,7 @@ TEST_F(Command, RendersTheSceneAndOptionsOverrideIt)
 {
     host::Scene scene = host::loadScene(folder_.path / "scene.json", libraries());
     auto const expected = [&] {
-        host::writePicture(folder_.path / "want.png", host::render(scene, {}), 0);
+        host::writePicture(folder_.path / "want.png", host::render(scene), {});
         return content(folder_.path / "want.png");
     };
     Result const plain = zsi("render scene.json -o a.png");

@@ -1,6 +1,7 @@
 // From a scene file to picture files.
 #include "film/imageFile.h"
 #include "load/loadScene.h"
+#include "render/render.h"
 #include "support/hostLibraries.h"
 #include "support/inputError.h"
 #include "support/temporaryFolder.h"
@@ -23,10 +24,10 @@ TEST(PictureFile, EveryFormatShowsTheScene)
     test::TemporaryFolder const folder;
     fs::path const scenePath = fs::path(ZSI_SOURCE_DIR) / "tests/data/scenes/card.json";
     Scene const scene = loadScene(scenePath, test::libraries());
-    Picture const picture = render(scene, {});
+    Picture const picture = render(scene);
     TextureStore pictures;
     for (char const* name : {"a.exr", "a.hdr", "a.png", "a.jpg"}) {
-        writePicture(folder.path / name, picture, scene.film.exposure);
+        writePicture(folder.path / name, picture, {scene.film.exposure});
         HostTexture2D const* const file = pictures.load2D(folder.path / name, ColorSpace::Auto);
         struct Place {
             Vec2f uv; ///< from the bottom left
@@ -61,8 +62,9 @@ TEST(PictureFile, WhatCannotBeWrittenLeavesNothing)
 
     // A file may have four kilobytes; pixels that do not compress.
     std::mt19937 random;
-    Picture picture{100, 75, std::vector<float>(100 * 75 * 4)};
-    for (float& v : picture.rgba)
+    Picture picture{100, 75, {0, 0, 100, 75}, {{"beauty", {"R", "G", "B", "A"}, {}}}};
+    picture.layers[0].values.resize(100 * 75 * 4);
+    for (float& v : picture.layers[0].values)
         v = static_cast<float>(random() >> 8) * 0x1p-24f;
     auto const before = std::signal(SIGXFSZ, SIG_IGN);
     rlimit limit;
@@ -70,7 +72,7 @@ TEST(PictureFile, WhatCannotBeWrittenLeavesNothing)
     rlimit const small{4096, limit.rlim_max};
     for (char const* name : {"a.exr", "a.hdr", "a.png", "a.jpg"}) {
         setrlimit(RLIMIT_FSIZE, &small);
-        std::string const error = errorOf([&] { writePicture(folder.path / name, picture, 0); });
+        std::string const error = errorOf([&] { writePicture(folder.path / name, picture, {}); });
         setrlimit(RLIMIT_FSIZE, &limit);
         expectContains(error, {name, "cannot be written", "too large"});
     }

@@ -69,7 +69,7 @@ private:
 
 inline Vec4f pixel(host::Picture const& p, int x, int y)
 {
-    float const* c = &p.rgba[static_cast<std::size_t>(y * p.width + x) * 4];
+    float const* c = &p.rgba()[static_cast<std::size_t>(y * p.width() + x) * 4];
     return {c[0], c[1], c[2], c[3]};
 }
 
@@ -181,8 +181,8 @@ private:
 inline Vec4f mean(host::Picture const& p)
 {
     double sum[4] = {};
-    for (std::size_t i = 0; i < p.rgba.size(); ++i)
-        sum[i % 4] += static_cast<double>(p.rgba[i]) / (static_cast<double>(p.rgba.size()) / 4);
+    for (std::size_t i = 0; i < p.rgba().size(); ++i)
+        sum[i % 4] += static_cast<double>(p.rgba()[i]) / (static_cast<double>(p.rgba().size()) / 4);
     return {static_cast<float>(sum[0]), static_cast<float>(sum[1]), static_cast<float>(sum[2]),
             static_cast<float>(sum[3])};
 }

@@ -69,8 +69,8 @@ try {
     options.progress = [](double done) { std::printf("\r%3.0f%%", done * 100); };
     host::RenderReport report;
     host::Picture const picture = host::render(scene, options, &report);
-    host::writePicture(argv[2], picture, scene.film.exposure);
-    std::printf("\n%d x %d, %.2f s\n", picture.width, picture.height, report.seconds);
+    host::writePicture(argv[2], picture, {scene.film.exposure, false});
+    std::printf("\n%d x %d, %.2f s\n", picture.width(), picture.height(), report.seconds);
     return 0;
 } catch (zsi::host::InputError const& error) {
     std::fprintf(stderr, "embed: %s\n", error.what());

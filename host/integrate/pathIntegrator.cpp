@@ -1,5 +1,4 @@
-// Paths by the materials' `sample` and `transfer`.
-#include "integrate/tracer.h"
+#include "integrate/pathIntegrator.h"
 
 #include <algorithm>
 
@@ -17,51 +16,73 @@ Vec3f positive(Vec3f v) { return {maxOf(v.x, 0.0f), maxOf(v.y, 0.0f), maxOf(v.z,
 
 } // namespace
 
-Vec3f Tracer::directLight(Call& call)
+Vec4f PathIntegrator::radiance(PathRay ray)
+{
+    Path path;
+    for (;;) {
+        SurfacePoint surface;
+        Vec4f seen;
+        if (!context_.intersect(ray, surface)) {
+            seen = context_.environment(ray);
+        } else if (context_.scene().materialOf(surface).scatters()) {
+            if (!scatter(ray, surface, path))
+                return withAlpha(path.light, 1.0f);
+            continue;
+        } else if (!context_.shade(ray, surface, seen)) {
+            ShadingContext::passIgnored(ray, surface);
+            continue;
+        }
+        return withAlpha(path.light + path.throughput * rgb(seen), path.straight ? seen.w : 1.0f);
+    }
+}
+
+Vec3f PathIntegrator::directLight(ShadingContext::Call& call)
 {
     ShadeState& state = call.state;
-    PreparedMaterial const& material = scene_.materialOf(call.surface);
+    PreparedMaterial const& material = call.material;
     Vec3f const faced = dot(state.I, state.Ng) <= 0.0f ? state.N : -state.N;
     // Light from behind counts where a surface lets light through.
     Vec3f const sides[2] = {faced, -faced};
     int const count = (material.entryPoints & kTransmission) ? 2 : 1;
     Vec3f sum{0, 0, 0};
     for (int i = 0; i < count; ++i)
-        for (LightSample const* l = getLightSamples(0, &state.P, &sides[i]); l; l = l->next) {
+        for (LightSample const* l = context_.getLightSamples(0, &state.P, &sides[i]); l;
+             l = l->next) {
             state.sampleDirection = l->L;
             state.outBrdf = {0, 0, 0};
             state.sampleCosine = 0.0f;
-            material.shader->transfer(this, state);
+            material.shader->transfer(&context_, state);
             sum += positive(state.outBrdf * maxOf(state.sampleCosine, 0.0f)) * l->color * l->shadow
                 * kPi;
         }
-    return finite(sum);
+    return context_.finite(sum);
 }
 
-bool Tracer::scatter(PathRay& ray, SurfacePoint const& surface, Path& path)
+bool PathIntegrator::scatter(PathRay& ray, SurfacePoint const& surface, Path& path)
 {
-    PreparedMaterial const& material = scene_.materialOf(surface);
     PathRay next = ray;
     {
-        Call call(*this, ray, surface);
+        ShadingContext::Call call(context_, ray, surface);
+        PreparedMaterial const& material = call.material;
         path.light += path.throughput * directLight(call);
 
         ShadeState& state = call.state;
         std::fill_n(state.allowReflection, 3, std::uint8_t(1));
         std::fill_n(state.allowTransmission, 3, std::uint8_t(1));
         state.sampleType = kSampleNone;
-        material.shader->sample(this, state);
+        material.shader->sample(&context_, state);
         if (state.sampleType == kSampleNone)
             return false;
         path.throughput *=
-            positive(finite(state.outBrdf * (state.sampleCosine * state.sampleInvPdf)));
+            positive(context_.finite(state.outBrdf * (state.sampleCosine * state.sampleInvPdf)));
         if (maxComponent(path.throughput) <= 0.0f || !isFinite(state.sampleDirection)
             || !(dot(state.sampleDirection, state.sampleDirection) > 0.0f))
             return false;
 
         next.direction = normalize(state.sampleDirection);
         next.E = surface.P;
-        next.origin = start(surface.P, next.direction);
+        next.ignored = 0;
+        next.origin = context_.rayStart(surface.P, next.direction);
         // Straight on, as if nothing were there; a medium's boundary bends even what it hardly
         // bends.
         if (state.sampleDirection == ray.direction && !material.ior) {
@@ -72,19 +93,20 @@ bool Tracer::scatter(PathRay& ray, SurfacePoint const& surface, Path& path)
             next.type = kRayReflection;
             path.straight = false;
         }
-        changeMedia(next, ray.direction, surface, material.ior ? &state.beyondIor : nullptr);
+        ShadingContext::changeMedia(next, ray.direction, surface,
+                                    material.ior ? &state.beyondIor : nullptr);
     }
     ray = next;
     return survives(ray, path);
 }
 
-bool Tracer::survives(PathRay& ray, Path& path)
+bool PathIntegrator::survives(PathRay const& ray, Path& path)
 {
     float const kept = maxComponent(path.throughput);
     if (ray.depth < kRouletteDepth || kept >= 1.0f)
         return true;
     float const chance = maxOf(kept, 0.05f);
-    if (!(sampler_->next() < chance))
+    if (!(context_.sampler().next() < chance))
         return false;
     path.throughput = path.throughput / chance;
     return true;

@@ -1,0 +1,138 @@
+#include "base/replacedFile.h"
+
+#include "base/error.h"
+
+#include <array>
+#include <atomic>
+#include <cerrno>
+#include <cstring>
+#include <fcntl.h>
+#include <sys/stat.h>
+#include <unistd.h>
+#include <utility>
+
+namespace zsi::host {
+namespace {
+
+/// Names of files being written, for `removeAll`; more at once than are ever written.
+std::array<std::atomic<char const*>, 16> openFiles{};
+static_assert(std::atomic<char const*>::is_always_lock_free);
+
+void remember(char const* name)
+{
+    for (auto& slot : openFiles) {
+        char const* free = nullptr;
+        if (slot.compare_exchange_strong(free, name))
+            return;
+    }
+}
+
+void forget(char const* name)
+{
+    for (auto& slot : openFiles) {
+        char const* expected = name;
+        if (slot.compare_exchange_strong(expected, nullptr))
+            return;
+    }
+}
+
+std::filesystem::path behindLinks(std::filesystem::path file)
+{
+    std::error_code error;
+    for (int links = 0; links < 40 && std::filesystem::is_symlink(file, error); ++links) {
+        std::filesystem::path const target = std::filesystem::read_symlink(file, error);
+        file = target.is_absolute() ? target : file.parent_path() / target;
+    }
+    return file;
+}
+
+} // namespace
+
+ReplacedFile::ReplacedFile(std::filesystem::path const& file)
+    : name_(file)
+    , goal_(behindLinks(file))
+{
+    struct stat there = {};
+    bool const exists = stat(goal_.c_str(), &there) == 0;
+    if (exists && S_ISDIR(there.st_mode))
+        throw InputError(name_.string() + ": cannot be written: it is a folder");
+    if (exists && !S_ISREG(there.st_mode)) {
+        descriptor_ = open(goal_.c_str(), O_WRONLY | O_CLOEXEC);
+        if (descriptor_ < 0)
+            fail(errno);
+        return;
+    }
+    if (exists && access(goal_.c_str(), W_OK) != 0)
+        fail(errno);
+    // A name of its own length, however long the goal's is.
+    temporary_ = goal_.parent_path() / (".zsi-" + std::to_string(getpid()) + "-XXXXXX");
+    std::string name = temporary_.string();
+    descriptor_ = mkostemp(name.data(), O_CLOEXEC);
+    if (descriptor_ < 0) {
+        temporary_.clear();
+        fail(errno);
+    }
+    temporary_ = name;
+    remember(temporary_.c_str());
+    mode_t const mask = umask(0);
+    umask(mask);
+    fchmod(descriptor_, exists ? there.st_mode & 07777 : 0666 & ~mask);
+}
+
+ReplacedFile::~ReplacedFile()
+{
+    if (descriptor_ >= 0)
+        close(descriptor_);
+    if (!temporary_.empty()) {
+        unlink(temporary_.c_str());
+        forget(temporary_.c_str());
+    }
+}
+
+void ReplacedFile::write(std::span<unsigned char const> bytes)
+{
+    while (!bytes.empty()) {
+        ssize_t const n = ::write(descriptor_, bytes.data(), bytes.size());
+        if (n < 0 && errno != EINTR)
+            fail(errno);
+        bytes = bytes.subspan(n > 0 ? static_cast<std::size_t>(n) : 0);
+    }
+}
+
+void ReplacedFile::commit()
+{
+    if (close(std::exchange(descriptor_, -1)) != 0) // some disks tell only now
+        fail(errno);
+    if (temporary_.empty())
+        return;
+    if (rename(temporary_.c_str(), goal_.c_str()) != 0)
+        fail(errno);
+    forget(temporary_.c_str());
+    temporary_.clear();
+}
+
+void ReplacedFile::check(std::filesystem::path const& file)
+{
+    // Opening a pipe would wait for its reader, and closing it again would end him.
+    struct stat there = {};
+    if (stat(file.c_str(), &there) == 0 && !S_ISREG(there.st_mode) && !S_ISDIR(there.st_mode)) {
+        if (access(file.c_str(), W_OK) != 0)
+            throw InputError(file.string() + ": cannot be written: " + std::strerror(errno));
+        return;
+    }
+    ReplacedFile const tried(file);
+}
+
+void ReplacedFile::removeAll() noexcept
+{
+    for (auto const& slot : openFiles)
+        if (char const* const name = slot.load())
+            unlink(name);
+}
+
+void ReplacedFile::fail(int error) const
+{
+    throw InputError(name_.string() + ": cannot be written: " + std::strerror(error));
+}
+
+} // namespace zsi::host

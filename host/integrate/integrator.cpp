@@ -1,0 +1,21 @@
+#include "integrate/integrator.h"
+
+namespace zsi::host {
+
+CameraSample Integrator::sample(Vec3f origin, Vec3f direction, float rasterX, float rasterY,
+                                Sampler& sampler)
+{
+    context_.start(sampler, rasterX, rasterY);
+    PathRay ray;
+    ray.E = ray.origin = origin;
+    ray.direction = direction;
+    std::uint64_t const before = context_.nonFinite();
+    Vec4f const color = radiance(ray);
+    bool const finite = isFinite(rgb(color)) && std::isfinite(color.w);
+    if (!finite && context_.nonFinite() == before)
+        context_.countNonFinite();
+    FirstHit const* const first = context_.firstHit();
+    return {color, finite, first ? &first->surface : nullptr, first ? first->distance : 0.0f};
+}
+
+} // namespace zsi::host

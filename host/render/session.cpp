@@ -1,0 +1,194 @@
+#include "render/session.h"
+
+#include "integrate/integrators.h"
+#include "integrate/layers.h"
+#include "render/cameraRays.h"
+#include "sampling/pixelFilter.h"
+
+#include <array>
+#include <chrono>
+#include <mutex>
+#include <optional>
+#include <tbb/global_control.h>
+#include <tbb/parallel_for.h>
+#include <tbb/task_arena.h>
+
+namespace zsi::host {
+namespace {
+
+/// Pixels and samples of a unit of work: large enough that handing it out costs nothing, small
+/// enough that the last ones end together.
+constexpr int kTile = 16;
+constexpr std::uint32_t kSamples = 16;
+
+/// One rendering of a job: hands out units of work and adds their samples to the film.
+class Rendering {
+public:
+    Rendering(PreparedScene const& scene, Film& film, RenderJob const& job)
+        : scene_(scene)
+        , film_(film)
+        , job_(job)
+        , settings_(scene.scene().settings)
+        , camera_(scene.scene().camera, scene.scene().film)
+        , window_(intersection(job.window, film.window()))
+        , tilesAcross_((window_.width() + kTile - 1) / kTile)
+        , tiles_(tilesAcross_ * ((window_.height() + kTile - 1) / kTile))
+        , units_(static_cast<std::int64_t>(tiles_)
+                 * ((job.samples.end - job.samples.begin + kSamples - 1) / kSamples))
+        , tileLocks_(static_cast<std::size_t>(tiles_))
+    {
+        for (LayerFormat const& format : film.layers())
+            for (LayerKind const& kind : layerKinds())
+                if (kind.format == format)
+                    layers_.push_back(kind.values);
+    }
+
+    /// Works until nothing is left; for one thread.
+    void work()
+    {
+        auto const integrator = makeIntegrator(settings_.integrator, scene_);
+        std::int64_t unit;
+        while (!cancelled() && (unit = next_++) < units_)
+            render(*integrator, unit);
+        std::lock_guard const lock(reportLock_);
+        report_.rays += integrator->context().rays();
+        report_.nonFinite += integrator->context().nonFinite();
+    }
+
+    RenderReport report() const
+    {
+        RenderReport report = report_;
+        report.complete = done_ == units_;
+        return report;
+    }
+
+private:
+    bool cancelled() const { return job_.cancel && job_.cancel->load(std::memory_order_relaxed); }
+
+    void render(Integrator& integrator, std::int64_t unit)
+    {
+        int const tile = static_cast<int>(unit % tiles_);
+        std::uint32_t const first =
+            job_.samples.begin + static_cast<std::uint32_t>(unit / tiles_) * kSamples;
+        SampleRange const samples{first, std::min(first + kSamples, job_.samples.end)};
+        int const left = window_.x0 + tile % tilesAcross_ * kTile;
+        int const top = window_.y0 + tile / tilesAcross_ * kTile;
+        Window const pixels = intersection({left, top, left + kTile, top + kTile}, window_);
+
+        Film part(film_.frameWidth(), film_.frameHeight(), pixels, film_.layers());
+        for (int y = pixels.y0; y < pixels.y1; ++y)
+            for (int x = pixels.x0; x < pixels.x1; ++x)
+                if (!render(integrator, x, y, samples, part))
+                    return;
+        {
+            std::lock_guard const lock(tileLocks_[static_cast<std::size_t>(tile)]);
+            film_.add(part);
+        }
+        std::lock_guard const lock(reportLock_);
+        ++done_;
+        if (job_.tileDone) {
+            std::lock_guard const tileLock(tileLocks_[static_cast<std::size_t>(tile)]);
+            job_.tileDone(pixels, samples);
+        }
+        if (job_.progress)
+            job_.progress(static_cast<double>(done_) / static_cast<double>(units_));
+    }
+
+    /// False when the job was cancelled meanwhile.
+    bool render(Integrator& integrator, int x, int y, SampleRange samples, Film& part) const
+    {
+        Sampler sampler(settings_.seed, x, y);
+        for (std::uint32_t i = samples.begin; i < samples.end; ++i) {
+            if (cancelled())
+                return false;
+            sampler.start(i);
+            Vec2f const offset = filter_.offset(sampler.next2D());
+            float const rasterX = static_cast<float>(x) + 0.5f + offset.x;
+            float const rasterY = static_cast<float>(y) + 0.5f + offset.y;
+            Vec3f origin, direction;
+            camera_.ray(rasterX, rasterY, sampler.next2D(), origin, direction);
+            CameraSample sample = integrator.sample(origin, direction, rasterX, rasterY, sampler);
+            if (!sample.isFinite)
+                continue;
+            sample.color = limited(sample.color);
+            for (std::size_t layer = 0; layer < layers_.size(); ++layer) {
+                std::array<float, 4> values;
+                if (layers_[layer] && layers_[layer](sample, values.data()))
+                    part.add(x, y, layer,
+                             std::span(values).first(film_.layers()[layer].channels.size()));
+            }
+        }
+        return true;
+    }
+
+    Vec4f limited(Vec4f sample) const
+    {
+        float const brightest = maxComponent(rgb(sample));
+        if (!(settings_.sampleClamp > 0.0f) || brightest <= settings_.sampleClamp)
+            return sample;
+        return withAlpha(rgb(sample) * (settings_.sampleClamp / brightest), sample.w);
+    }
+
+    PreparedScene const& scene_;
+    Film& film_;
+    RenderJob const& job_;
+    Settings const& settings_;
+    CameraRays camera_;
+    PixelFilter filter_;
+    Window window_;
+    int tilesAcross_, tiles_;
+    std::int64_t units_; ///< all tiles for the first samples, then all for the next
+    std::vector<bool (*)(CameraSample const&, float*)> layers_;
+    std::vector<std::mutex> tileLocks_;
+    std::atomic<std::int64_t> next_{0};
+    std::mutex reportLock_;
+    std::int64_t done_ = 0;
+    RenderReport report_;
+};
+
+} // namespace
+
+Window windowOf(FilmSettings const& film)
+{
+    Window const frame{0, 0, film.width, film.height};
+    if (!film.crop)
+        return frame;
+    auto const& c = *film.crop;
+    return intersection(frame, {c[0], c[1], c[2], c[3]});
+}
+
+Session::Session(Scene const& scene, BuildProgress const& progress)
+    : prepared_(scene, progress)
+{
+}
+
+Film Session::newFilm() const
+{
+    FilmSettings const& film = scene().film;
+    std::vector<LayerFormat> formats;
+    for (LayerKind const& kind : chooseLayers(film.layers))
+        formats.push_back(kind.format);
+    return Film(film.width, film.height, windowOf(film), std::move(formats));
+}
+
+RenderReport Session::render(Film& film, RenderJob const& job)
+{
+    auto const begin = std::chrono::steady_clock::now();
+    Rendering rendering(prepared_, film, job);
+    // Without it an arena gets no more threads than there are processors.
+    std::optional<tbb::global_control> control;
+    if (job.threads > 0)
+        control.emplace(tbb::global_control::max_allowed_parallelism,
+                        static_cast<std::size_t>(job.threads));
+    tbb::task_arena arena(job.threads > 0 ? job.threads : tbb::task_arena::automatic);
+    arena.execute([&] {
+        tbb::parallel_for(
+            0, arena.max_concurrency(), [&](int) { rendering.work(); }, tbb::simple_partitioner());
+    });
+    RenderReport report = rendering.report();
+    report.seconds =
+        std::chrono::duration<double>(std::chrono::steady_clock::now() - begin).count();
+    return report;
+}
+
+} // namespace zsi::host

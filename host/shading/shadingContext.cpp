@@ -1,0 +1,151 @@
+#include "shading/shadingContext.h"
+
+namespace zsi::host {
+namespace {
+
+// Bounds on rays that never leave by themselves, far above what scenes need.
+constexpr int kMaxPasses = 128;
+constexpr int kMaxIgnoredHits = 1024;
+
+bool isFront(Vec3f I, Vec3f Ng) { return dot(I, Ng) <= 0.0f; }
+
+} // namespace
+
+ShadingContext::Call::Call(ShadingContext& context, PathRay const& ray_,
+                           SurfacePoint const& surface_)
+    : ray(ray_)
+    , surface(surface_)
+    , material(context.scene_.materialOf(surface_))
+    , state(context.record(ray_))
+    , context_(context)
+    , outer_(context.call_)
+    , lightMark_(context.lightRecords_.mark())
+{
+    context.fillSurface(ray, surface, material, state);
+    context.call_ = this;
+    if (ray.type == kRayCamera && !context.hasFirstHit_) {
+        context.firstHit_ = {surface, length(surface.P - ray.E)};
+        context.hasFirstHit_ = true;
+    }
+}
+
+ShadingContext::Call::~Call()
+{
+    context_.lightRecords_.release(lightMark_);
+    context_.call_ = outer_;
+}
+
+ShadingContext::ShadingContext(PreparedScene const& scene, RadianceSource& source)
+    : scene_(scene)
+    , settings_(scene.scene().settings)
+    , source_(source)
+    , maxDepth_(static_cast<std::uint32_t>(settings_.maxDepth > 0 ? settings_.maxDepth : 0))
+{
+}
+
+void ShadingContext::start(Sampler& sampler, float rasterX, float rasterY)
+{
+    sampler_ = &sampler;
+    rasterX_ = rasterX;
+    rasterY_ = rasterY;
+    hasFirstHit_ = false;
+}
+
+bool ShadingContext::intersect(PathRay const& ray, SurfacePoint& surface)
+{
+    ++rays_;
+    if (ray.depth >= maxDepth_ || ray.passes > kMaxPasses || ray.ignored > kMaxIgnoredHits)
+        return false;
+    Hit hit;
+    if (!scene_.rays().intersect({ray.origin, ray.direction}, Visibility::All, hit))
+        return false;
+    surface = scene_.rays().surface(hit);
+    return true;
+}
+
+Vec4f ShadingContext::environment(PathRay const& ray)
+{
+    EnvironmentShader const* const environment = scene_.environment();
+    if (!environment)
+        return {0, 0, 0, 0};
+    ShadeState state = record(ray);
+    environment->shade(this, state);
+    return withAlpha(finite(rgb(state.Ci)), state.Ci.w);
+}
+
+bool ShadingContext::shade(PathRay const& ray, SurfacePoint const& surface, Vec4f& result)
+{
+    bool const hadFirstHit = hasFirstHit_;
+    Call call(*this, ray, surface);
+    call.state.Ci = {0, 0, 0, 1};
+    call.material.shader->shade(this, call.state);
+    if (call.state.discardHit) {
+        hasFirstHit_ = hadFirstHit;
+        return false;
+    }
+    result = call.state.Ci;
+    // A camera sample is left out as a whole; further down what can be saved of it is.
+    if (ray.depth > 0 || ray.passes > 0)
+        result = withAlpha(finite(rgb(result)), std::isfinite(result.w) ? result.w : 1.0f);
+    return true;
+}
+
+void ShadingContext::passIgnored(PathRay& ray, SurfacePoint const& surface)
+{
+    ray.origin =
+        offsetPoint(surface.P, surface.Ng * (dot(ray.direction, surface.Ng) < 0.0f ? -1.0f : 1.0f));
+    ++ray.ignored;
+}
+
+ShadeState ShadingContext::record(PathRay const& ray) const
+{
+    ShadeState state{};
+    state.E = ray.E;
+    state.I = ray.direction;
+    state.rasterX = rasterX_;
+    state.rasterY = rasterY_;
+    state.imageHeight = scene_.scene().film.height;
+    state.incomingIor = state.beyondIor = ray.media.current();
+    state.objectToWorld = Mat4f::identity();
+    state.rayType = ray.type;
+    state.rayDepth = ray.depth;
+    state.maxRayDepth = maxDepth_;
+    return state;
+}
+
+void ShadingContext::fillSurface(PathRay const& ray, SurfacePoint const& s,
+                                 PreparedMaterial const& material, ShadeState& state) const
+{
+    state.P = s.P;
+    state.N = s.N;
+    state.Ng = s.Ng;
+    state.Pref = s.objectP;
+    state.Nref = s.objectN;
+    state.objectToWorld = scene_.scene().instances[s.instance].objectToWorld;
+    if (!isFront(ray.direction, s.Ng))
+        state.beyondIor = ray.media.without(s.instance);
+    else if (material.ior)
+        state.beyondIor = *material.ior;
+    scene_.fillAttributes(s, material, state);
+}
+
+void ShadingContext::changeMedia(PathRay& next, Vec3f arrived, SurfacePoint const& s,
+                                 float const* ior)
+{
+    bool const front = isFront(arrived, s.Ng);
+    bool const inwards = dot(next.direction, s.Ng) < 0.0f;
+    if (front && inwards && ior)
+        next.media.enter(s.instance, *ior);
+    else if (!front && !inwards)
+        next.media.leave(s.instance);
+}
+
+Vec3f ShadingContext::finite(Vec3f v)
+{
+    if (isFinite(v))
+        return v;
+    ++nonFinite_;
+    return {0, 0, 0};
+}
+
+} // namespace zsi::host

@@ -1,0 +1,134 @@
+/// One thread's shading calls: the record that a material gets, and the services behind it.
+#pragma once
+
+#include "light/lightList.h"
+#include "sampling/sampler.h"
+#include "shading/pathRay.h"
+#include "shading/preparedScene.h"
+
+#include <zsi/vecmath.h>
+
+namespace zsi::host {
+
+/// The surface that a camera sample first shows, for layers of the film.
+struct FirstHit {
+    SurfacePoint surface;
+    float distance; ///< from the camera
+};
+
+/// See docs/services.md for what the record holds and what each service does.
+class ShadingContext final : public IShaderAPI {
+public:
+    /// Both must outlive this. `source` answers the rays that services send out.
+    ShadingContext(PreparedScene const& scene, RadianceSource& source);
+
+    /// Begins a camera sample: random numbers come from `sampler`; `rasterX`, `rasterY` are pixels.
+    void start(Sampler& sampler, float rasterX, float rasterY);
+
+    PreparedScene const& scene() const { return scene_; }
+    Sampler& sampler() { return *sampler_; }
+    std::uint64_t rays() const { return rays_; }
+    std::uint64_t nonFinite() const { return nonFinite_; }
+    void countNonFinite() { ++nonFinite_; }
+    /// Of the running sample; null while no surface was shown.
+    FirstHit const* firstHit() const { return hasFirstHit_ ? &firstHit_ : nullptr; }
+
+    // What an integrator is made of.
+
+    /// The surface that the ray meets; false when the environment answers, at the latest where the
+    /// ray has reached its depth.
+    bool intersect(PathRay const& ray, SurfacePoint& surface);
+    /// Colour and alpha of the environment along the ray.
+    Vec4f environment(PathRay const& ray);
+    /// The colour that the material's `shade` gives the hit; false when it discards the hit, which
+    /// is then to be passed (`passIgnored`).
+    bool shade(PathRay const& ray, SurfacePoint const& surface, Vec4f& result);
+    /// The same ray goes on behind the surface as if nothing had been there.
+    static void passIgnored(PathRay& ray, SurfacePoint const& surface);
+    /// `v`, or black when it is not finite, which is counted.
+    Vec3f finite(Vec3f v);
+
+    /// A running call of a material's entry point. Light lists made for it are released with it.
+    class Call {
+    public:
+        Call(ShadingContext& context, PathRay const& ray, SurfacePoint const& surface);
+        ~Call();
+        Call(Call const&) = delete;
+        Call& operator=(Call const&) = delete;
+
+        PathRay const& ray;
+        SurfacePoint const& surface;
+        PreparedMaterial const& material;
+        ShadeState state; ///< inputs filled, results neutral
+
+    private:
+        ShadingContext& context_;
+        Call* outer_;
+        std::size_t lightMark_;
+    };
+
+    /// Where a ray starts that leaves `origin`: moved off the running call's surface where it lies
+    /// on it, any other place as it is.
+    Vec3f rayStart(Vec3f origin, Vec3f direction) const;
+    /// The media of `next`, which leaves `s`, when a ray along `arrived` met it. `ior`: of what
+    /// lies behind the surface, null where it bounds no medium.
+    static void changeMedia(PathRay& next, Vec3f arrived, SurfacePoint const& s, float const* ior);
+
+    LightSample* getLightSamples(int category, Vec3f const* P, Vec3f const* normal) override;
+    Vec3f ambientLight(Vec3f const* P, Vec3f const* N) override;
+    Vec3f shadowTransmission(Vec3f const* from, Vec3f const* to) override;
+    Vec3f traceContinue(int rayType, Vec3f const* origin, Vec3f const* direction,
+                        float importance) override;
+    Vec3f traceReflection(Vec3f const* origin, Vec3f const* direction, float importance) override;
+    Vec4f traceThrough(Vec3f const* P, Vec3f const* I, float importance) override;
+    Vec3f traceSpecular(Vec3f const* origin, Vec3f const* direction, float spread,
+                        float importance) override;
+    Vec3f traceRefraction(Vec3f const* origin, Vec3f const* direction, float spread,
+                          float importance) override;
+    Vec3f occlusion(Vec3f const* P, Vec3f const* N, float importance) override;
+    Vec3f indirectDiffuse(Vec3f const* P, Vec3f const* N, float importance) override;
+    float random() override;
+    Vec2f random2D() override;
+    float cellNoise1D(float x) override;
+    float noise2D(Vec2f const* p) override;
+    float noise3DPoint(Vec3f const* p) override;
+    float noise3D(Vec4f const* pointAndPhase) override;
+    float noise3DRecord(Vec3f const* p) override;
+    Vec3f cellNoise3D(Vec3f const* p) override;
+
+private:
+    ShadeState record(PathRay const& ray) const;
+    void fillSurface(PathRay const& ray, SurfacePoint const& s, PreparedMaterial const& material,
+                     ShadeState& state) const;
+
+    /// A ray from the running call's surface; false when there is none to trace. `scale` makes up
+    /// for the rays that are left out at random.
+    bool child(Vec3f const* origin, Vec3f const* direction, float importance, PathRay& ray,
+               float& scale);
+    bool continuation(Vec3f const* origin, Vec3f const* direction, float importance, PathRay& ray);
+    Vec3f traceLobe(Vec3f const* origin, Vec3f const* direction, float spread, float turn,
+                    float importance);
+    Vec3f shadowStart(Vec3f origin, Vec3f direction) const;
+    Vec3f gatherNormal(Vec3f P, Vec3f N) const;
+    Vec3f transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMax);
+
+    PreparedScene const& scene_;
+    Settings const& settings_;
+    RadianceSource& source_;
+    std::uint32_t maxDepth_;
+    LightRecords lightRecords_;
+    Sampler* sampler_ = nullptr;
+    Call* call_ = nullptr;
+    float rasterX_ = 0.0f, rasterY_ = 0.0f;
+    FirstHit firstHit_ = {};
+    bool hasFirstHit_ = false;
+    std::uint64_t rays_ = 0;
+    std::uint64_t nonFinite_ = 0;
+};
+
+inline bool isFinite(Vec3f v)
+{
+    return std::isfinite(v.x) && std::isfinite(v.y) && std::isfinite(v.z);
+}
+
+} // namespace zsi::host
