@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <cstring>
 #include <fcntl.h>
+#include <fmt/format.h>
 #include <sys/stat.h>
 #include <unistd.h>
 #include <utility>
@@ -50,32 +51,26 @@ std::filesystem::path behindLinks(std::filesystem::path file)
 
 ReplacedFile::ReplacedFile(std::filesystem::path const& file)
     : name_(file)
-    , goal_(behindLinks(file))
 {
     struct stat there = {};
-    bool const exists = stat(goal_.c_str(), &there) == 0;
+    bool const exists = stat(file.c_str(), &there) == 0;
     if (exists && S_ISDIR(there.st_mode))
         throw InputError(name_.string() + ": cannot be written: it is a folder");
     if (exists && !S_ISREG(there.st_mode)) {
-        descriptor_ = open(goal_.c_str(), O_WRONLY | O_CLOEXEC);
+        // By its own name: what /dev/stdout leads to has no other one.
+        descriptor_ = open(file.c_str(), O_WRONLY | O_CLOEXEC);
         if (descriptor_ < 0)
             fail(errno);
         return;
     }
+    goal_ = behindLinks(file);
     if (exists && access(goal_.c_str(), W_OK) != 0)
         fail(errno);
-    // A name of its own length, however long the goal's is.
-    temporary_ = goal_.parent_path() / (".zsi-" + std::to_string(getpid()) + "-XXXXXX");
-    std::string name = temporary_.string();
-    descriptor_ = mkostemp(name.data(), O_CLOEXEC);
-    if (descriptor_ < 0) {
-        temporary_.clear();
-        fail(errno);
-    }
-    temporary_ = name;
-    remember(temporary_.c_str());
+    createTemporary();
     mode_t const mask = umask(0);
     umask(mask);
+    if (exists && fchown(descriptor_, there.st_uid, there.st_gid) != 0)
+        there.st_mode &= 0777u; // not ours to give away, and then not with its owner's rights
     fchmod(descriptor_, exists ? there.st_mode & 07777 : 0666 & ~mask);
 }
 
@@ -87,6 +82,27 @@ ReplacedFile::~ReplacedFile()
         unlink(temporary_.c_str());
         forget(temporary_.c_str());
     }
+}
+
+void ReplacedFile::createTemporary()
+{
+    do {
+        forget(temporary_.c_str());
+        std::uint64_t random = 0;
+        if (getentropy(&random, sizeof(random)) != 0)
+            fail(errno);
+        // A name of its own length, however long the goal's is; remembered before it is there, so
+        // that no signal finds it without.
+        temporary_ = goal_.parent_path() / fmt::format(".zsi-{:016x}", random);
+        remember(temporary_.c_str());
+        descriptor_ = open(temporary_.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC, 0600);
+    } while (descriptor_ < 0 && errno == EEXIST);
+    if (descriptor_ >= 0)
+        return;
+    int const error = errno;
+    forget(temporary_.c_str());
+    temporary_.clear();
+    fail(error);
 }
 
 void ReplacedFile::write(std::span<unsigned char const> bytes)

@@ -7,8 +7,8 @@
 namespace zsi::host {
 
 /// A file to be written as a whole. A regular file, or one that is not there yet, is written beside
-/// its place and renamed, keeps its mode, and a link to it stays a link; a pipe or a device is
-/// written to as it is. All operations throw InputError, "FILE: cannot be written: why".
+/// its place and renamed, keeps its mode and its owner, and a link to it stays a link; a pipe or a
+/// device is written to as it is. All operations throw InputError, "FILE: cannot be written: why".
 class ReplacedFile {
 public:
     /// Opens; throws when there can be no such file.
@@ -28,6 +28,7 @@ public:
     static void removeAll() noexcept;
 
 private:
+    void createTemporary();
     [[noreturn]] void fail(int error) const;
 
     std::filesystem::path name_; ///< as the user said it, for messages

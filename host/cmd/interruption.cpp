@@ -23,7 +23,7 @@ void onSignal(int signal)
     requested = true;
 }
 
-constexpr int kSignals[] = {SIGINT, SIGTERM};
+constexpr int kSignals[] = {SIGINT, SIGTERM, SIGHUP};
 
 } // namespace
 
@@ -54,6 +54,10 @@ std::atomic<bool> const& Interruption::defer()
     return requested;
 }
 
-int Interruption::status() const { return received ? 128 + received : 0; }
+int Interruption::resume()
+{
+    deferred = false;
+    return received ? 128 + received : 0;
+}
 
 } // namespace zsi::cmd

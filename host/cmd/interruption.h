@@ -6,10 +6,9 @@
 
 namespace zsi::cmd {
 
-/// While one lives, SIGINT and SIGTERM end the program with status 128 + signal, without leaving
-/// anything half-written: at once where nothing is under way, at the next occasion in between
-/// `defer` and the end; a second one at once in any case. A signal that was ignored before stays
-/// so. One at a time.
+/// While one lives, SIGINT, SIGTERM and SIGHUP end the program with status 128 + signal, without
+/// leaving anything half-written: at once, but at the next occasion between `defer` and `resume`; a
+/// second one at once in any case. A signal that was ignored before stays so. One at a time.
 class Interruption {
 public:
     Interruption();
@@ -19,11 +18,12 @@ public:
 
     /// From now on a signal only sets the flag that this returns.
     std::atomic<bool> const& defer();
-    /// 0 when there was no signal, else the exit status that it asks for.
-    int status() const;
+    /// From now on a signal ends the program at once again. 0 when there was none meanwhile, else
+    /// the exit status that it asks for.
+    int resume();
 
 private:
-    struct sigaction before_[2];
+    struct sigaction before_[3];
 };
 
 } // namespace zsi::cmd

@@ -129,7 +129,7 @@ int render(Arguments const& arguments, std::string const& shaderPath)
     } catch (host::Cancelled const&) {
         // Told below, as an interruption while rendering is.
     }
-    if (int const status = interruption.status()) {
+    if (int const status = interruption.resume()) {
         std::fputs("zsi: interrupted, no picture written\n", stderr);
         return status;
     }

@@ -52,7 +52,8 @@ Kind kindOf(std::filesystem::path const& file)
 
 [[noreturn]] void fail(std::filesystem::path const& file, std::string const& why)
 {
-    throw InputError(file.string() + ": cannot be written: " + why);
+    throw InputError(file.string() + ": cannot be written: "
+                     + (why.empty() ? "the encoder fails without a reason" : why));
 }
 
 /// The layers as one row of channels a pixel, named as EXR files name them: those of the first

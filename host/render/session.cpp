@@ -1,5 +1,6 @@
 #include "render/session.h"
 
+#include "base/threads.h"
 #include "integrate/integrators.h"
 #include "integrate/layers.h"
 #include "render/cameraRays.h"
@@ -8,10 +9,6 @@
 #include <array>
 #include <chrono>
 #include <mutex>
-#include <optional>
-#include <tbb/global_control.h>
-#include <tbb/parallel_for.h>
-#include <tbb/task_arena.h>
 
 namespace zsi::host {
 namespace {
@@ -47,9 +44,14 @@ public:
     void work()
     {
         auto const integrator = makeIntegrator(settings_.integrator, scene_);
-        std::int64_t unit;
-        while (!cancelled() && (unit = next_++) < units_)
-            render(*integrator, unit);
+        try {
+            std::int64_t unit;
+            while (!cancelled() && (unit = next_++) < units_)
+                render(*integrator, unit);
+        } catch (...) {
+            next_ = units_; // nothing more for the others
+            throw;
+        }
         std::lock_guard const lock(reportLock_);
         report_.rays += integrator->context().rays();
         report_.nonFinite += integrator->context().nonFinite();
@@ -175,16 +177,7 @@ RenderReport Session::render(Film& film, RenderJob const& job)
 {
     auto const begin = std::chrono::steady_clock::now();
     Rendering rendering(prepared_, film, job);
-    // Without it an arena gets no more threads than there are processors.
-    std::optional<tbb::global_control> control;
-    if (job.threads > 0)
-        control.emplace(tbb::global_control::max_allowed_parallelism,
-                        static_cast<std::size_t>(job.threads));
-    tbb::task_arena arena(job.threads > 0 ? job.threads : tbb::task_arena::automatic);
-    arena.execute([&] {
-        tbb::parallel_for(
-            0, arena.max_concurrency(), [&](int) { rendering.work(); }, tbb::simple_partitioner());
-    });
+    onThreads(job.threads, [&] { rendering.work(); });
     RenderReport report = rendering.report();
     report.seconds =
         std::chrono::duration<double>(std::chrono::steady_clock::now() - begin).count();

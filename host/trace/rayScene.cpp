@@ -184,6 +184,8 @@ struct RayScene::Impl {
         , opaque(nullptr, rtcReleaseScene)
         , clear(nullptr, rtcReleaseScene)
     {
+        if (!device && rtcGetDeviceError(nullptr) == RTC_ERROR_OUT_OF_MEMORY)
+            throw std::bad_alloc();
         if (!device)
             throw InputError("the ray tracing device cannot be created");
     }

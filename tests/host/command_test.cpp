@@ -1,8 +1,8 @@
 // The zsi command as a user meets it: what it hands on and how it ends. What the parts below it
 // make of their input is tested there.
 #include "film/imageFile.h"
-#include "render/render.h"
 #include "load/loadScene.h"
+#include "render/render.h"
 #include "support/hostLibraries.h"
 #include "support/inputError.h"
 #include "support/temporaryFolder.h"
@@ -174,6 +174,60 @@ TEST_F(Command, BadCallsEndInOneLineAndLeaveNothing)
         EXPECT_EQ(files(), before_) << call.arguments;
     }
 }
+
+TEST_F(Command, TheOutputIsWhatTheNameLeadsTo)
+{
+    zsi("render scene.json -o want.png");
+    std::string const want = content(folder_.path / "want.png");
+    auto const at = [&](char const* name) { return folder_.path / name; };
+    std::ofstream(at("old.png")) << "old";
+    fs::permissions(at("old.png"), fs::perms(0640));
+    fs::create_symlink("old.png", at("link.png"));
+    fs::create_symlink("/dev/stdout", at("stdout.png"));
+    std::string const longName = std::string(251, 'a') + ".png";
+    zsi("render scene.json -o link.png");
+    EXPECT_TRUE(fs::is_symlink(at("link.png")));
+    EXPECT_EQ(content(at("old.png")), want);
+    EXPECT_EQ(fs::status(at("old.png")).permissions(), fs::perms(0640));
+    EXPECT_TRUE(zsi("render scene.json -o stdout.png").out.starts_with(want));
+    zsi("render scene.json -o " + longName);
+    EXPECT_EQ(content(folder_.path / longName), want);
+    zsi("render scene.json -o pipe.png", "mkfifo pipe.png; cat pipe.png >copy & ");
+    std::system("sleep 0.2"); // until the reader has written what it read
+    EXPECT_EQ(content(at("copy")), want);
+
+    before_ = files();
+    // 4 kB are less than this picture.
+    Result const full =
+        zsi("render scene.json -o a.hdr --size 400x400 --samples 1", "ulimit -f 8;");
+    EXPECT_EQ(full.status, 1);
+    EXPECT_EQ(full.err, "zsi: a.hdr: cannot be written: File too large\n");
+    EXPECT_EQ(files(), before_);
+}
+
+#ifndef __SANITIZE_ADDRESS__ // reserves more than any limit
+TEST_F(Command, WithLittleMemoryThereIsThePictureOrOneLine)
+{
+    zsi("render scene.json -o want.png");
+    int told = 0;
+    // Where the libraries under the host start up, where devices are made, and where it is enough.
+    for (int const megabytes : {470, 490, 540, 600, 620, 640, 900}) {
+        fs::remove(folder_.path / "a.png");
+        Result const r = zsi("render scene.json -o a.png",
+                             "ulimit -v " + std::to_string(megabytes * 1024) + ";");
+        SCOPED_TRACE(std::to_string(megabytes) + " MB: " + r.err);
+        if (r.status == 0) {
+            EXPECT_EQ(content(folder_.path / "a.png"), content(folder_.path / "want.png"));
+            continue;
+        }
+        ++told;
+        EXPECT_TRUE(r.status == 1 && r.err.starts_with("zsi: ")) << r.status;
+        EXPECT_EQ(r.err.find('\n'), r.err.size() - 1);
+        EXPECT_FALSE(fs::exists(folder_.path / "a.png"));
+    }
+    EXPECT_TRUE(told > 0 && told < 7) << told;
+}
+#endif
 
 TEST_F(Command, CtrlCLeavesNothing)
 {
