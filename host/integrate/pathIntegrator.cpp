@@ -22,15 +22,16 @@ Vec4f PathIntegrator::radiance(PathRay ray)
     for (;;) {
         SurfacePoint surface;
         Vec4f seen;
-        if (!context_.intersect(ray, surface)) {
-            seen = context_.environment(ray);
-        } else if (context_.scene().materialOf(surface).scatters()) {
-            if (!scatter(ray, surface, path))
-                return withAlpha(path.light, 1.0f);
-            continue;
-        } else if (!context_.shade(ray, surface, seen)) {
-            ShadingContext::passIgnored(ray, surface);
-            continue;
+        if (context_.intersect(ray, surface, seen)) {
+            if (context_.scene().materialOf(surface).scatters()) {
+                if (!scatter(ray, surface, path))
+                    return withAlpha(path.light, 1.0f);
+                continue;
+            }
+            if (!context_.shade(ray, surface, seen)) {
+                ShadingContext::passIgnored(ray, surface);
+                continue;
+            }
         }
         return withAlpha(path.light + path.throughput * rgb(seen), path.straight ? seen.w : 1.0f);
     }
@@ -46,7 +47,7 @@ Vec3f PathIntegrator::directLight(ShadingContext::Call& call)
     int const count = (material.entryPoints & kTransmission) ? 2 : 1;
     Vec3f sum{0, 0, 0};
     for (int i = 0; i < count; ++i)
-        for (LightSample const* l = context_.getLightSamples(0, &state.P, &sides[i]); l;
+        for (LightSample const* l = context_.lightSamples(state.P, sides[i], !material.ior); l;
              l = l->next) {
             state.sampleDirection = l->L;
             state.outBrdf = {0, 0, 0};
@@ -91,6 +92,11 @@ bool PathIntegrator::scatter(PathRay& ray, SurfacePoint const& surface, Path& pa
         } else {
             next.depth += 1;
             next.type = kRayReflection;
+            next.scatteredAt = surface.P;
+            // What bounds a medium does not say by `transfer` what its `sample` draws.
+            next.lobeDensity = context_.scene().lights().hasSurfaces() && !material.ior
+                ? context_.lobeDensity(next.direction)
+                : std::numeric_limits<float>::infinity();
             path.straight = false;
         }
         ShadingContext::changeMedia(next, ray.direction, surface,

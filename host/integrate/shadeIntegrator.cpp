@@ -6,9 +6,9 @@ Vec4f ShadeIntegrator::radiance(PathRay ray)
 {
     for (;;) {
         SurfacePoint surface;
-        if (!context_.intersect(ray, surface))
-            return context_.environment(ray);
         Vec4f seen;
+        if (!context_.intersect(ray, surface, seen))
+            return seen;
         if (context_.shade(ray, surface, seen))
             return seen;
         ShadingContext::passIgnored(ray, surface);

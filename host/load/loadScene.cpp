@@ -298,9 +298,16 @@ private:
         reader.expectKeys({"mesh", "material", "transform"});
         Instance instance{meshes_.indexOf(reader.at("mesh")),
                           materials_.indexOf(reader.at("material")), Mat4f::identity()};
+        instance.objectToWorld = readPlacing(reader);
+        return instance;
+    }
+
+    /// The key "transform".
+    static Mat4f readPlacing(JsonReader const& reader)
+    {
         auto const transform = reader.find("transform");
         if (!transform)
-            return instance;
+            return Mat4f::identity();
         Mat4f const m = readTransform(*transform);
         if (m.m[3] != 0.0f || m.m[7] != 0.0f || m.m[11] != 0.0f || m.m[15] != 1.0f)
             transform->fail("the last column must be 0, 0, 0, 1 (points are row vectors)");
@@ -308,27 +315,122 @@ private:
         float const volume = dot(cross(x, y), {m.m[8], m.m[9], m.m[10]});
         if (volume == 0.0f || !std::isfinite(volume))
             transform->fail("flattens the mesh: it has no inverse");
-        instance.objectToWorld = m;
-        return instance;
+        return m;
     }
 
     Light readLight(JsonReader const& reader)
     {
-        reader.expectKeys({"class", "position", "target", "axis", "radius", "parameters"});
-        Light light{readShader(reader, kLight), reader.at("position").toVec3f()};
+        auto const kind = reader.find("kind");
+        if (!kind)
+            return readShaderLight(reader);
+        switch (kind->toChoice({"point", "sun", "rectangle", "disc", "mesh"})) {
+        case 0:
+            return readPointLight(reader);
+        case 1:
+            return readSunLight(reader);
+        case 2: {
+            reader.expectKeys({"kind", "position", "target", "axis", "up", "size", "emission"});
+            auto const size = reader.find("size");
+            std::vector<float> const s = size ? readSize(*size, 2) : std::vector<float>(2, 1.0f);
+            return readSurfaceLight(reader, addMesh(planeMesh({s[0], s[1]})), readPose(reader));
+        }
+        case 3: {
+            reader.expectKeys({"kind", "position", "target", "axis", "radius", "emission"});
+            auto const radius = reader.find("radius");
+            return readSurfaceLight(reader, addMesh(discMesh(radius ? radius->toPositive() : 1.0f)),
+                                    readPose(reader));
+        }
+        default:
+            reader.expectKeys({"kind", "mesh", "transform", "emission"});
+            return readSurfaceLight(reader, meshes_.indexOf(reader.at("mesh")),
+                                    readPlacing(reader));
+        }
+    }
+
+    ShaderLight readShaderLight(JsonReader const& reader)
+    {
+        reader.expectKeys({"class", "kind", "position", "target", "axis", "radius", "parameters"});
+        ShaderLight light{readShader(reader, kLight), reader.at("position").toVec3f()};
         if (auto const v = reader.find("radius"))
             light.radius = v->toFloat(0);
-        if (!reader.find("target") && !reader.find("axis"))
-            return light;
-        JsonReader const aim = reader.onlyOf({"target", "axis"});
-        Vec3f axis = aim.toVec3f();
-        if (reader.find("target"))
-            axis = axis - light.position;
-        if (!(length(axis) > 0.0f) || !std::isfinite(length(axis)))
-            aim.fail(reader.find("target") ? "the light stands on its target"
-                                           : "expected a direction that is not 0");
-        light.axis = normalize(axis);
+        if (reader.find("target") || reader.find("axis"))
+            light.axis = readAxis(reader, light.position);
         return light;
+    }
+
+    static PointLight readPointLight(JsonReader const& reader)
+    {
+        reader.expectKeys({"kind", "position", "color", "radius"});
+        PointLight light{reader.at("position").toVec3f()};
+        if (auto const v = reader.find("color"))
+            light.color = v->toVec3f();
+        if (auto const v = reader.find("radius"))
+            light.radius = v->toFloat(0);
+        return light;
+    }
+
+    static SunLight readSunLight(JsonReader const& reader)
+    {
+        reader.expectKeys({"kind", "direction", "angle", "color"});
+        SunLight light;
+        if (auto const v = reader.find("direction"))
+            light.direction = toDirection(*v, v->toVec3f(), "expected a direction that is not 0");
+        if (auto const v = reader.find("angle"))
+            light.angle = v->toFloat(0, 180);
+        if (auto const v = reader.find("color"))
+            light.color = v->toVec3f();
+        return light;
+    }
+
+    /// Adds the instance that shines.
+    SurfaceLight readSurfaceLight(JsonReader const& reader, int mesh, Mat4f const& objectToWorld)
+    {
+        SurfaceLight light{static_cast<int>(scene_.instances.size())};
+        if (auto const v = reader.find("emission"))
+            light.emission = v->toVec3f();
+        scene_.instances.push_back(
+            {mesh, -1, objectToWorld, static_cast<int>(scene_.lights.size())});
+        return light;
+    }
+
+    int addMesh(Mesh mesh)
+    {
+        scene_.meshes.push_back(std::move(mesh));
+        return static_cast<int>(scene_.meshes.size()) - 1;
+    }
+
+    static Vec3f toDirection(JsonReader const& place, Vec3f v, char const* why)
+    {
+        if (!(length(v) > 0.0f) || !std::isfinite(length(v)))
+            place.fail(why);
+        return normalize(v);
+    }
+
+    /// Unit, by a point that it aims at or as it is.
+    static Vec3f readAxis(JsonReader const& reader, Vec3f position)
+    {
+        JsonReader const aim = reader.onlyOf({"target", "axis"});
+        if (reader.find("target"))
+            return toDirection(aim, aim.toVec3f() - position, "the light stands on its target");
+        return toDirection(aim, aim.toVec3f(), "expected a direction that is not 0");
+    }
+
+    /// Turns +z to the axis, by default down, and +y as far as can be to `up`.
+    static Mat4f readPose(JsonReader const& reader)
+    {
+        Vec3f const position = reader.at("position").toVec3f();
+        Vec3f const z = reader.find("target") || reader.find("axis") ? readAxis(reader, position)
+                                                                     : Vec3f(0, 0, -1);
+        auto const given = reader.find("up");
+        Vec3f up = given ? given->toVec3f() : Vec3f(0, 0, 1);
+        if (!(length(cross(up, z)) > 1e-5f)) {
+            if (given)
+                given->fail("up must point across the axis, not along it");
+            up = {0, 1, 0};
+        }
+        Vec3f const x = normalize(cross(up, z)), y = cross(z, x);
+        return {x.x, x.y, x.z, 0, y.x,        y.y,        y.z,        0,
+                z.x, z.y, z.z, 0, position.x, position.y, position.z, 1};
     }
 
     Scene& scene_;

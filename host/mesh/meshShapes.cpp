@@ -87,4 +87,25 @@ Mesh planeMesh(Vec2f size)
     return mesh;
 }
 
+Mesh discMesh(float radius)
+{
+    constexpr std::uint32_t kCorners = 128;
+    constexpr float kStep = 6.28318531f / kCorners;
+    float const r = radius * std::sqrt(kStep / std::sin(kStep));
+    Mesh mesh;
+    mesh.positions.push_back({0, 0, 0});
+    mesh.uv.push_back({0.5f, 0.5f});
+    for (std::uint32_t i = 0; i < kCorners; ++i) {
+        float const c = std::cos(kStep * static_cast<float>(i));
+        float const s = std::sin(kStep * static_cast<float>(i));
+        mesh.positions.push_back({r * c, r * s, 0});
+        mesh.uv.push_back({0.5f + 0.5f * c, 0.5f + 0.5f * s});
+        mesh.triangles.push_back({0, i + 1, (i + 1) % kCorners + 1});
+    }
+    mesh.normals.assign(mesh.positions.size(), {0, 0, 1});
+    mesh.tangents.assign(mesh.positions.size(), {1, 0, 0});
+    mesh.bitangents.assign(mesh.positions.size(), {0, 1, 0});
+    return mesh;
+}
+
 } // namespace zsi::host

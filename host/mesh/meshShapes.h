@@ -16,4 +16,7 @@ Mesh boxMesh(Vec3f size);
 /// A rectangle in the xy plane around the origin, facing +z; u along +x, v along +y.
 Mesh planeMesh(Vec2f size);
 
+/// A disc in the xy plane around the origin, facing +z, of 128 corners and the area of the circle.
+Mesh discMesh(float radius);
+
 } // namespace zsi::host

@@ -8,6 +8,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <variant>
 #include <vector>
 #include <zsi/vecmath.h>
 
@@ -31,16 +32,43 @@ struct Mesh {
 
 struct Instance {
     int mesh; ///< index into Scene::meshes
-    int material; ///< index into Scene::materials
+    int material; ///< index into Scene::materials; not used where `light` is set
     Mat4f objectToWorld; ///< points are row vectors: translation in m[12..14]
+    int light = -1; ///< index into Scene::lights of the SurfaceLight that this is the surface of
 };
 
-struct Light {
+// Lights. A light's colour is irradiance divided by pi: a white diffuse surface that faces a light
+// of colour 1 shows 1. Only surface lights are met by rays.
+
+/// A light of a shader library.
+struct ShaderLight {
     Shader shader;
     Vec3f position;
     Vec3f axis{0, 0, -1}; ///< unit direction it points to
     float radius = 0.0f; ///< > 0: a ball that shadows sample, for soft edges
 };
+
+/// A ball that shines alike in all directions and falls off with the square of the distance.
+struct PointLight {
+    Vec3f position;
+    Vec3f color{1, 1, 1}; ///< that arrives at distance 1
+    float radius = 0.0f;
+};
+
+/// A light so far away that its rays are parallel but for its angle.
+struct SunLight {
+    Vec3f direction{0, 0, 1}; ///< unit, towards it
+    Vec3f color{1, 1, 1}; ///< that arrives
+    float angle = 0.53f; ///< across, degrees
+};
+
+/// An instance that shines from the side that its normals point to; the other side is black.
+struct SurfaceLight {
+    int instance; ///< index into Scene::instances
+    Vec3f emission{1, 1, 1}; ///< radiance
+};
+
+using Light = std::variant<ShaderLight, PointLight, SunLight, SurfaceLight>;
 
 struct Camera {
     Vec3f position{0, -5, 1};
@@ -64,10 +92,10 @@ struct FilmSettings {
 
 struct Settings {
     int samples = 64; ///< per pixel
-    int maxDepth = 6; ///< of specular chains
+    int maxDepth = 64; ///< bends and bounces one after another
     int occlusionSamples = 4; ///< rays of one occlusion query
     int indirectSamples = 1; ///< rays of one indirect-diffuse query at the first hit
-    float occlusionDistance = 0.0f; ///< 0: unlimited
+    float occlusionDistance = 0.0f; ///< reach of an occlusion query; 0: unlimited
     Vec3f ambient{0, 0, 0}; ///< what `ambientLight` gives
     float sampleClamp = 0.0f; ///< brightest channel that a camera sample may have; 0: no limit
     std::uint32_t seed = 1;

@@ -4,6 +4,7 @@
 #include "shading/media.h"
 
 #include <cstdint>
+#include <limits>
 #include <zsi/zsi.h>
 
 namespace zsi::host {
@@ -16,9 +17,13 @@ struct PathRay {
     std::uint32_t depth = 0; ///< bends and bounces before it; going on straight does not count
     int passes = 0; ///< how often it went on straight through a surface
     int ignored = 0; ///< how many hits it passed as if nothing had been there
-    int diffuseBounces = 0;
     float importance = 1.0f; ///< the most that it counts in the picture
     MediumStack media = {};
+    Vec3f scatteredAt{0, 0, 0}; ///< where it was last bent or bounced
+    /// Of the lobe that it was drawn from, per steradian, where the lights were asked as well: what
+    /// of a surface light's emission the ray stands for, and what the light list does, adds up to
+    /// one (balance heuristic; Veach 1997, 9.2.2). Infinite: the ray stands for all of it.
+    float lobeDensity = std::numeric_limits<float>::infinity();
 };
 
 /// Who answers what light comes along a ray that a shading service sends out: the integrator.

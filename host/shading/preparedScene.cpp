@@ -50,6 +50,7 @@ PreparedMaterial prepare(Shader const& shader)
 PreparedScene::PreparedScene(Scene const& scene, BuildProgress const& progress)
     : scene_(scene)
     , rays_(scene, progress)
+    , lights_(scene)
 {
     for (Shader const& shader : scene_.materials)
         materials_.push_back(prepare(shader));
@@ -66,11 +67,13 @@ void PreparedScene::materialChanged(std::size_t index)
 void PreparedScene::instancesChanged(BuildProgress const& progress)
 {
     rays_.rebuildInstances(progress);
+    lightsChanged();
 }
 
 void PreparedScene::meshesChanged(BuildProgress const& progress)
 {
     rays_ = RayScene(scene_, progress);
+    lightsChanged();
 }
 
 void PreparedScene::fillAttributes(SurfacePoint const& s, PreparedMaterial const& material,

@@ -1,6 +1,7 @@
 /// A scene made ready for rendering: acceleration structure and what each material needs.
 #pragma once
 
+#include "light/lights.h"
 #include "trace/rayScene.h"
 
 namespace zsi::host {
@@ -36,11 +37,14 @@ public:
     void materialChanged(std::size_t index);
     /// Instances stand elsewhere, are more or fewer, or have another material or mesh.
     void instancesChanged(BuildProgress const& progress = {});
+    /// Lights are others, or surface lights stand elsewhere.
+    void lightsChanged() { lights_ = LightSet(scene_); }
     /// Meshes are others. Renews all that stands on them.
     void meshesChanged(BuildProgress const& progress = {});
 
     Scene const& scene() const { return scene_; }
     RayScene const& rays() const { return rays_; }
+    LightSet const& lights() const { return lights_; }
     EnvironmentShader const* environment() const
     {
         return scene_.environment ? scene_.environment->environment() : nullptr;
@@ -56,6 +60,7 @@ public:
 private:
     Scene const& scene_;
     RayScene rays_;
+    LightSet lights_;
     std::vector<PreparedMaterial> materials_;
 };
 

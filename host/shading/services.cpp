@@ -10,8 +10,8 @@ namespace {
 
 /// Rays that count less than this are traced with a chance in proportion, and count for more.
 constexpr float kFullImportance = 1.0f / 32.0f;
-/// Further bounces of indirect light add little and cost much.
-constexpr int kMaxDiffuseBounces = 3;
+/// From this depth on that goes for all that count less than 1, so that chains end by themselves.
+constexpr std::uint32_t kRouletteDepth = 3;
 /// A shadow ray that went through so many surfaces is taken for blocked.
 constexpr int kMaxShadowSurfaces = 256;
 /// Shadow segments end a little before their goal, which may be a surface.
@@ -30,15 +30,22 @@ bool unit(Vec3f& v)
 
 LightSample* ShadingContext::getLightSamples(int, Vec3f const* P, Vec3f const* normal)
 {
+    return lightSamples(*P, *normal, true);
+}
+
+LightSample* ShadingContext::lightSamples(Vec3f P, Vec3f normal, bool surfaceLights)
+{
     if (!call_)
         return nullptr;
+    call_->askedLights_ = true;
     LightSample* head = nullptr;
     LightSample** end = &head;
-    for (Light const& light : scene_.scene().lights) {
-        Vec2f const u = light.radius > 0.0f ? sampler_->next2D() : Vec2f(0, 0);
-        ShadeState state = call_->state;
+    LightSet const& lights = scene_.lights();
+    for (std::size_t i = 0; i < lights.size(); ++i) {
+        if (!surfaceLights && std::holds_alternative<SurfaceLight>(lights[i]))
+            continue;
         LightSample sample;
-        if (!askLight(light, lightPoint(light, *P, u), *P, *normal, this, state, sample))
+        if (!ask(i, P, normal, sample))
             continue;
         sample.color = finite(sample.color);
         sample.shadow = finite(sample.shadow);
@@ -50,7 +57,51 @@ LightSample* ShadingContext::getLightSamples(int, Vec3f const* P, Vec3f const* n
     return head;
 }
 
-Vec3f ShadingContext::ambientLight(Vec3f const*, Vec3f const*) { return settings_.ambient; }
+bool ShadingContext::ask(std::size_t light, Vec3f P, Vec3f normal, LightSample& sample)
+{
+    LightSet const& lights = scene_.lights();
+    Vec2f const u = lights.isSpread(light) ? sampler_->next2D() : Vec2f(0, 0);
+    if (auto const* const shader = std::get_if<ShaderLight>(&lights[light])) {
+        ShadeState state = call_->state;
+        return askLight(*shader, pointOfBall(shader->position, shader->radius, P, u), P, normal,
+                        this, state, sample);
+    }
+    std::optional<Arrival> const a = lights.arrival(light, P, normal, u);
+    if (!a)
+        return false;
+    sample = {};
+    sample.L = a->L;
+    sample.color = a->color;
+    sample.weight = minOf(dot(a->L, normal), 1.0f);
+    if (a->density > 0.0f && call_->material.scatters()) {
+        float const lobe = lobeDensity(a->L);
+        if (!std::isinf(lobe))
+            sample.color = sample.color * (a->density / (a->density + lobe));
+    }
+    sample.shadow = a->isFar
+        ? transmit(P, shadowStart(P, a->L), a->L, std::numeric_limits<float>::infinity())
+        : shadowTransmission(&P, &a->to);
+    return true;
+}
+
+float ShadingContext::lobeDensity(Vec3f L)
+{
+    ShadeState state = call_->state;
+    state.sampleDirection = L;
+    state.outBrdf = {0, 0, 0};
+    state.sampleCosine = 0.0f;
+    call_->material.shader->transfer(this, state);
+    float const density = maxComponent(state.outBrdf) * state.sampleCosine;
+    return density > 0.0f && std::isfinite(density) ? density
+                                                    : std::numeric_limits<float>::infinity();
+}
+
+Vec3f ShadingContext::ambientLight(Vec3f const* P, Vec3f const* N)
+{
+    if (call_)
+        call_->gathered_ = {true, *P, *N, settings_.ambient, {0, 0, 0}};
+    return settings_.ambient;
+}
 
 Vec3f ShadingContext::shadowTransmission(Vec3f const* from, Vec3f const* to)
 {
@@ -123,13 +174,18 @@ bool ShadingContext::child(Vec3f const* origin, Vec3f const* direction, float im
     ray.depth += 1;
     ray.importance *= importance < 1.0f ? importance : 1.0f;
     scale = 1.0f;
-    if (ray.importance < kFullImportance) {
-        float const chance = ray.importance / kFullImportance;
+    float const full = ray.depth > kRouletteDepth ? 1.0f : kFullImportance;
+    if (ray.importance < full) {
+        float const chance = ray.importance / full;
         if (!(sampler_->next() < chance))
             return false;
         scale = 1.0f / chance;
-        ray.importance = kFullImportance;
+        ray.importance = full;
     }
+    ray.scatteredAt = *origin;
+    bool const listed = scene_.lights().hasSurfaces() && call_->askedLights_;
+    ray.lobeDensity = listed && call_->material.scatters() ? lobeDensity(ray.direction)
+                                                           : std::numeric_limits<float>::infinity();
 
     changeMedia(ray, call_->ray.direction, call_->surface, call_->material.ior);
     return true;
@@ -207,7 +263,15 @@ Vec3f ShadingContext::traceLobe(Vec3f const* origin, Vec3f const* direction, flo
     if (!child(origin, &axis, importance, ray, scale))
         return {0, 0, 0};
     ray.type = kRayReflection;
+    if (spread > 0.0f)
+        leaveToLightList(ray);
     return rgb(source_.radiance(ray)) * scale;
+}
+
+void ShadingContext::leaveToLightList(PathRay& ray) const
+{
+    if (call_->askedLights_ && !call_->material.scatters())
+        ray.lobeDensity = 0.0f;
 }
 
 Vec3f ShadingContext::gatherNormal(Vec3f P, Vec3f N) const
@@ -223,6 +287,15 @@ Vec3f ShadingContext::occlusion(Vec3f const* P, Vec3f const* N, float)
     Vec3f axis = *N;
     if (!call_ || !isFinite(*P) || !unit(axis)) // no normal, no hemisphere to be blocked
         return {1, 1, 1};
+    // Traced light has been stopped by all that stands in its way already: where a material asks
+    // for the occlusion of ambient and indirect light together, only the ambient part is occluded.
+    Call::Gathered& gathered = call_->gathered_;
+    bool const ofGathered = gathered.pending && gathered.P == *P && gathered.N == *N;
+    if (ofGathered) {
+        gathered.pending = false;
+        if (gathered.ambient == Vec3f(0, 0, 0))
+            return {1, 1, 1};
+    }
     float const tMax = settings_.occlusionDistance > 0.0f ? settings_.occlusionDistance
                                                           : std::numeric_limits<float>::infinity();
     int const count = call_->ray.depth == 0 ? std::max(1, settings_.occlusionSamples) : 1;
@@ -233,13 +306,22 @@ Vec3f ShadingContext::occlusion(Vec3f const* P, Vec3f const* N, float)
         Vec3f const direction = towardsSide(cosineDirection(axis, points[i]), side);
         open += transmit(*P, shadowStart(*P, direction), direction, tMax);
     }
-    return open / static_cast<float>(count); // exactly 1 when every ray is free
+    open = open / static_cast<float>(count); // exactly 1 when every ray is free
+    if (!ofGathered)
+        return open;
+    auto const share = [](float o, float ambient, float indirect) {
+        float const all = ambient + indirect;
+        return all > 0.0f ? (ambient * o + indirect) / all : o;
+    };
+    return {share(open.x, gathered.ambient.x, gathered.indirect.x),
+            share(open.y, gathered.ambient.y, gathered.indirect.y),
+            share(open.z, gathered.ambient.z, gathered.indirect.z)};
 }
 
 Vec3f ShadingContext::indirectDiffuse(Vec3f const* P, Vec3f const* N, float importance)
 {
     Vec3f axis = *N;
-    if (!call_ || !unit(axis) || call_->ray.diffuseBounces >= kMaxDiffuseBounces)
+    if (!call_ || !unit(axis))
         return {0, 0, 0};
     int const count = call_->ray.depth == 0 ? std::max(1, settings_.indirectSamples) : 1;
     Vec3f const side = gatherNormal(*P, axis);
@@ -252,11 +334,16 @@ Vec3f ShadingContext::indirectDiffuse(Vec3f const* P, Vec3f const* N, float impo
         if (!child(P, &direction, importance, ray, scale))
             continue;
         ray.type = kRayDiffuse;
-        ray.diffuseBounces += 1;
+        leaveToLightList(ray);
         ray.origin = shadowStart(*P, direction);
         sum += rgb(source_.radiance(ray)) * scale;
     }
-    return sum / static_cast<float>(count);
+    sum = sum / static_cast<float>(count);
+    Call::Gathered& gathered = call_->gathered_;
+    if (!(gathered.pending && gathered.P == *P && gathered.N == *N))
+        gathered = {true, *P, *N, {0, 0, 0}, {0, 0, 0}};
+    gathered.indirect = sum;
+    return sum;
 }
 
 Vec3f ShadingContext::rayStart(Vec3f origin, Vec3f direction) const

@@ -51,16 +51,42 @@ void ShadingContext::start(Sampler& sampler, float rasterX, float rasterY)
     hasFirstHit_ = false;
 }
 
-bool ShadingContext::intersect(PathRay const& ray, SurfacePoint& surface)
+bool ShadingContext::intersect(PathRay const& ray, SurfacePoint& surface, Vec4f& seen)
 {
     ++rays_;
-    if (ray.depth >= maxDepth_ || ray.passes > kMaxPasses || ray.ignored > kMaxIgnoredHits)
-        return false;
     Hit hit;
-    if (!scene_.rays().intersect({ray.origin, ray.direction}, Visibility::All, hit))
+    if (!scene_.rays().intersect({ray.origin, ray.direction}, Visibility::All, hit)) {
+        seen = environment(ray);
+        return false;
+    }
+    bool const isLight = scene_.scene().instances[hit.instance].light >= 0;
+    seen = {0, 0, 0, 1};
+    if (!isLight
+        && (ray.depth >= maxDepth_ || ray.passes > kMaxPasses || ray.ignored > kMaxIgnoredHits))
         return false;
     surface = scene_.rays().surface(hit);
-    return true;
+    if (!isLight)
+        return true;
+    if (ray.type == kRayCamera && !hasFirstHit_) {
+        firstHit_ = {surface, length(surface.P - ray.E)};
+        hasFirstHit_ = true;
+    }
+    seen = withAlpha(emission(ray, surface), 1.0f);
+    return false;
+}
+
+Vec3f ShadingContext::emission(PathRay const& ray, SurfacePoint const& surface) const
+{
+    auto const light = static_cast<std::size_t>(scene_.scene().instances[surface.instance].light);
+    if (!isFront(ray.direction, surface.Ng) || !(ray.lobeDensity > 0.0f))
+        return {0, 0, 0};
+    Vec3f const emitted = std::get<SurfaceLight>(scene_.lights()[light]).emission;
+    if (std::isinf(ray.lobeDensity))
+        return emitted;
+    float const listed =
+        scene_.lights().surface(light).density(ray.scatteredAt, surface.P, surface.Ng);
+    return std::isinf(listed) ? Vec3f(0, 0, 0)
+                              : emitted * (ray.lobeDensity / (ray.lobeDensity + listed));
 }
 
 Vec4f ShadingContext::environment(PathRay const& ray)

@@ -1,7 +1,6 @@
 /// One thread's shading calls: the record that a material gets, and the services behind it.
 #pragma once
 
-#include "light/lightList.h"
 #include "sampling/sampler.h"
 #include "shading/pathRay.h"
 #include "shading/preparedScene.h"
@@ -35,11 +34,10 @@ public:
 
     // What an integrator is made of.
 
-    /// The surface that the ray meets; false when the environment answers, at the latest where the
-    /// ray has reached its depth.
-    bool intersect(PathRay const& ray, SurfacePoint& surface);
-    /// Colour and alpha of the environment along the ray.
-    Vec4f environment(PathRay const& ray);
+    /// The surface that the ray meets, to be shaded. False where there is nothing to shade; `seen`
+    /// is then what the ray shows: the environment, a light's surface, or black where it has been
+    /// on its way for too long.
+    bool intersect(PathRay const& ray, SurfacePoint& surface, Vec4f& seen);
     /// The colour that the material's `shade` gives the hit; false when it discards the hit, which
     /// is then to be passed (`passIgnored`).
     bool shade(PathRay const& ray, SurfacePoint const& surface, Vec4f& result);
@@ -62,10 +60,26 @@ public:
         ShadeState state; ///< inputs filled, results neutral
 
     private:
+        friend class ShadingContext;
+
+        /// What the last queries for ambient and indirect light brought.
+        struct Gathered {
+            bool pending = false; ///< until the occlusion of that light is asked for
+            Vec3f P, N, ambient, indirect;
+        };
+
         ShadingContext& context_;
+        Gathered gathered_;
+        bool askedLights_ = false;
         Call* outer_;
         std::size_t lightMark_;
     };
+
+    /// Per steradian, how likely the running call's material sends light on towards unit `L`:
+    /// `transfer`, infinite where that gives nothing, since the light list then does neither.
+    float lobeDensity(Vec3f L);
+    /// As the service, for one's own choice of lights.
+    LightSample* lightSamples(Vec3f P, Vec3f normal, bool surfaceLights);
 
     /// Where a ray starts that leaves `origin`: moved off the running call's surface where it lies
     /// on it, any other place as it is.
@@ -97,6 +111,11 @@ public:
     Vec3f cellNoise3D(Vec3f const* p) override;
 
 private:
+    /// Colour and alpha of the environment along the ray.
+    Vec4f environment(PathRay const& ray);
+    /// What a ray sees of the surface light that it met.
+    Vec3f emission(PathRay const& ray, SurfacePoint const& surface) const;
+    bool ask(std::size_t light, Vec3f P, Vec3f normal, LightSample& sample);
     ShadeState record(PathRay const& ray) const;
     void fillSurface(PathRay const& ray, SurfacePoint const& s, PreparedMaterial const& material,
                      ShadeState& state) const;
@@ -108,6 +127,9 @@ private:
     bool continuation(Vec3f const* origin, Vec3f const* direction, float importance, PathRay& ray);
     Vec3f traceLobe(Vec3f const* origin, Vec3f const* direction, float spread, float turn,
                     float importance);
+    /// Where the running call has counted surface lights in its list and cannot tell how much of
+    /// them its lobe stands for, the ray does not see them.
+    void leaveToLightList(PathRay& ray) const;
     Vec3f shadowStart(Vec3f origin, Vec3f direction) const;
     Vec3f gatherNormal(Vec3f P, Vec3f N) const;
     Vec3f transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMax);

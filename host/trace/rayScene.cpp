@@ -233,8 +233,10 @@ struct RayScene::Impl {
         rtcSetGeometryTransform(geometry.get(), 0, RTC_FORMAT_FLOAT4X4_COLUMN_MAJOR,
                                 instance.objectToWorld.m);
         rtcCommitGeometry(geometry.get());
-        Shader const& material = scene.materials[static_cast<std::size_t>(instance.material)];
-        bool const isClear = (material.entryPoints() & kTransmission) != 0;
+        bool const isClear = instance.light < 0
+            && (scene.materials[static_cast<std::size_t>(instance.material)].entryPoints()
+                & kTransmission)
+                != 0;
         rtcAttachGeometryByID(all.get(), geometry.get(), index);
         rtcAttachGeometryByID(isClear ? clear.get() : opaque.get(), geometry.get(), index);
         build.check(true);

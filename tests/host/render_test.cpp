@@ -73,6 +73,7 @@ TEST(Render, ShadowsLieWhereTheLightIsCovered)
         Stage stage;
         stage.lamp({0, 0, 2}).radius = r.radius;
         stage.scene.settings.samples = 64;
+        stage.scene.settings.maxDepth = 1; // what bounces below the card is no shadow's
         stage.card(stage.matte(), 0, 5);
         stage.card(stage.matte(), 1);
         stage.watch({r.x, 0, 0}, {0, 0, 0.5f});
@@ -237,28 +238,115 @@ TEST(Render, AlphaIsWhatStandsBeforeThePlate)
     }
 }
 
-TEST(Render, MirrorsFaceEachOtherUntilTheDepthEnds)
+TEST(Render, ChainsOfRaysEndAtRandomWithoutLoss)
+{
+    // Two cards that face each other glow with 1 and send on what they see: a geometric series, cut
+    // off where the depth ends.
+    struct Row {
+        float kept;
+        int depth, samples;
+        float want, tolerance;
+    };
+    for (Row const& r : {Row{0.5f, 2, 1, 1.75f, 1e-5f}, Row{0.9f, 1, 1, 1.9f, 1e-5f},
+                         Row{0.8f, 1000, 256, 5, 0.1f}, Row{0.01f, 1000, 64, 1.0101f, 0.003f}}) {
+        auto const glow = [&](IShaderAPI* api, ShadeState& s) {
+            Vec3f const back = -s.I;
+            s.Ci = withAlpha(kWhite
+                                 + (s.rayDepth < static_cast<std::uint32_t>(r.depth)
+                                        ? api->traceReflection(&s.P, &back, r.kept)
+                                        : Vec3f(0, 0, 0))
+                                     * r.kept,
+                             1);
+        };
+        Stage stage;
+        stage.scene.settings.maxDepth = r.depth + 1;
+        stage.scene.settings.samples = r.samples;
+        stage.card(stage.probe(glow));
+        stage.card(stage.probe(glow), 2);
+        EXPECT_NEAR(mean(stage.render()).x, r.want, r.tolerance) << r.kept << ' ' << r.depth;
+    }
+}
+
+// Rays that have reached their depth do not look through walls: a closed room is dark.
+TEST(Render, ASealedRoomIsBlack)
+{
+    for (char const* integrator : kIntegrators)
+        for (int const depth : {1, 3, 64}) {
+            Stage stage;
+            stage.sky(kWhiteSky, kWhite);
+            stage.scene.settings.integrator = integrator;
+            stage.scene.settings.maxDepth = depth;
+            stage.scene.settings.samples = 16;
+            stage.add(host::boxMesh({4, 4, 4}), stage.matte(), {0, 0, 0});
+            stage.watch({0, 0, -2}, {0, 0, 3});
+            EXPECT_EQ(mean(stage.render()).x, 0.0f) << integrator << depth;
+        }
+}
+
+// A white floor with a white wall around it, whose light the sky alone brings: what stands in the
+// way of indirect light darkens it once, by rays, not once more by the occlusion that goes with it.
+TEST(Render, IndirectLightIsOccludedOnce)
+{
+    float const tops[] = {0.5f, 2.0f};
+    for (float const top : tops) {
+        Vec4f seen[2];
+        for (int i = 0; i < 2; ++i) {
+            Stage stage;
+            stage.sky(kWhiteSky);
+            stage.scene.settings.integrator = kIntegrators[i];
+            stage.scene.settings.samples = 64;
+            stage.card(stage.matte(), 0, 2);
+            for (int side = 0; side < 4; ++side) {
+                float const x = side == 0 ? 1.05f : side == 1 ? -1.05f : 0;
+                float const y = side == 2 ? 1.05f : side == 3 ? -1.05f : 0;
+                stage.add(host::boxMesh({side < 2 ? 0.1f : 2.2f, side < 2 ? 2.2f : 0.1f, top}), 0,
+                          {x, y, top / 2});
+            }
+            stage.watch({0, 0, 0}, {0, 0, 3});
+            seen[i] = mean(stage.render());
+        }
+        EXPECT_NEAR(seen[0].x / seen[1].x, 1, 0.02f) << top;
+        // Albedo 1: nothing is lost between walls, all light that comes in goes out again.
+        EXPECT_NEAR(seen[1].x, 1, 0.03f) << top;
+    }
+}
+
+TEST(Render, SurfaceLightsAreSeenAndLightTheirSurroundings)
 {
     struct Row {
-        char const* integrator;
-        float tint;
-        int depth, samples;
-        float want, tolerance; ///< relative; 4 standard errors where rays end at random
+        char const* why;
+        host::Mesh mesh;
+        Vec3f at;
+        float want; ///< radiance 1 over the projected solid angle / pi
     };
-    // At the depth limit the sky answers, which is 1. Rays whose weight is low are traced with a
-    // chance p and count 1/p: over n rays the relative error is sqrt((1/p - 1)/n).
-    for (Row const& r : {Row{"shade", 1, 3, 1, 0.92f * 0.92f * 0.92f, 1e-5f},
-                         Row{"shade", 0.1f, 4, 4096, std::pow(0.092f, 4.0f), 0.17f},
-                         Row{"path", 0.5f, 6, 4096, std::pow(0.5f, 6.0f), 0.065f}}) {
-        Stage stage;
-        stage.sky(kWhiteSky);
-        stage.scene.settings.integrator = r.integrator;
-        stage.scene.settings.maxDepth = r.depth;
-        stage.scene.settings.samples = r.samples;
-        stage.card(stage.mirror(r.tint));
-        stage.card(stage.mirror(r.tint), 2);
-        EXPECT_NEAR(mean(stage.render()).x / r.want, 1, r.tolerance) << r.integrator << r.depth;
-    }
+    float const x = 0.5f;
+    for (Row const& r :
+         {Row{"disc of radius 1 at height 2: sin^2", host::discMesh(1), {0, 0, 2}, 0.2f},
+          Row{"square, four corner rectangles (Howell, configuration B-4)",
+              host::planeMesh({2, 2}),
+              {0, 0, 2},
+              4 / 3.14159265f * (x / std::sqrt(1 + x * x) * std::atan(x / std::sqrt(1 + x * x)))},
+          Row{"ball of radius 1/2 at distance 2", host::sphereMesh(0.5f, 64), {0, 0, 2}, 0.0625f}})
+        for (char const* integrator : kIntegrators) {
+            Stage stage;
+            stage.scene.settings.integrator = integrator;
+            stage.scene.settings.samples = 256;
+            stage.scene.settings.maxDepth = 2;
+            stage.card(stage.matte());
+            stage.add(r.mesh, -1, r.at);
+            host::Instance& shining = stage.scene.instances.back();
+            if (r.mesh.positions.size() < 200) // flat: faces down
+                shining.objectToWorld.m[5] = shining.objectToWorld.m[10] = -1;
+            shining.light = 0;
+            stage.scene.lights.push_back(host::SurfaceLight{1, kWhite});
+            stage.watch({0, 0, 0}, {0, 0, 0.5f});
+            EXPECT_NEAR(mean(stage.render()).x, r.want, 0.015f * r.want) << r.why << integrator;
+            stage.watch(r.at, {0, 0, -1});
+            expectNear(stage.middle(), {1, 1, 1, 1}, 0, "seen from below");
+            stage.watch(r.at + Vec3f(0, 0, 1), {0, 0, 1});
+            if (r.mesh.positions.size() < 200)
+                expectNear(stage.middle(), {0, 0, 0, 1}, 0, "black from behind");
+        }
 }
 
 TEST(Render, BrokenResultsAreCountedAndStayAlone)

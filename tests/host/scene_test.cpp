@@ -184,7 +184,7 @@ TEST_F(SceneFile, ValuesReachTheParameters)
     float const c = std::sqrt(0.75f);
     expectNear(numbers(value<Mat3f>(b, "uvMatrix")), {c, 0.5f, 0, -0.5f, c, 0, 0, 0, 1});
     EXPECT_EQ(value<Mat4f>(b, "matrix").m[12], 13.0f);
-    expectNear(numbers(scene.lights[0].axis), {0, 0, -1});
+    expectNear(numbers(std::get<ShaderLight>(scene.lights[0]).axis), {0, 0, -1});
     EXPECT_EQ(scene.settings.seed, 4294967295u);
     EXPECT_EQ(scene.settings.integrator, "path");
 }

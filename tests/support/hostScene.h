@@ -1,8 +1,8 @@
 /// Small scenes in memory, of things whose light is known.
 #pragma once
 
-#include "render/render.h"
 #include "mesh/meshShapes.h"
+#include "render/render.h"
 #include "support/hostLibraries.h"
 
 #include <cmath>
@@ -102,12 +102,12 @@ struct Stage {
                                   {"backgroundColor", background}});
     }
     /// Neither distance nor angle dims it.
-    host::Light& lamp(Vec3f position, Vec3f color = kWhite)
+    host::ShaderLight& lamp(Vec3f position, Vec3f color = kWhite)
     {
-        scene.lights.push_back(
-            {make("voPointLight", {{"color", color}, {"attenuationFactors", Vec3f(1e9f, 1, 0)}}),
-             position});
-        return scene.lights.back();
+        scene.lights.push_back(host::ShaderLight{
+            make("voPointLight", {{"color", color}, {"attenuationFactors", Vec3f(1e9f, 1, 0)}}),
+            position});
+        return std::get<host::ShaderLight>(scene.lights.back());
     }
 
     // Materials; each gives its index.

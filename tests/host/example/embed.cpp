@@ -44,7 +44,7 @@ host::Scene makeScene(host::ShaderLibraries const& libraries)
     small.m[0] = small.m[5] = 0.4f;
     scene.instances = {{0, 0, Mat4f::identity()}, {0, 0, small}};
 
-    host::Light lamp{libraries.create("voPointLight"), {1, -1, 4}};
+    host::ShaderLight lamp{libraries.create("voPointLight"), {1, -1, 4}};
     lamp.radius = 0.1f;
     lamp.shader.set("color", Vec3f(1, 1, 1));
     lamp.shader.set("attenuationFactors", Vec3f(20, 2, 0));
