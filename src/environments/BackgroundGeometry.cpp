@@ -12,13 +12,13 @@ Vec3f BackgroundGeometry::bumpedNormal(IShaderAPI* api, ShadeState const& state)
 {
     if (bumpMode == kMapNone || bumpScale == 0.0f || !bumpTexture.texture)
         return state.N;
-    BumpPlacement placement{bumpMode,     bumpTextureMatrix,        bumpTextureMatrixInverse,
-                            bumpUVMatrix, attribute_tangent(state), attribute_bitangent(state)};
+    MappedChannel const bump{bumpMode,          kBlack,      bumpTexture, bumpTextureMatrix,
+                             bumpAngularRepeat, bumpUVMatrix};
+    BumpPlacement placement{bump, bumpTextureMatrixInverse, attribute_tangent(state),
+                            attribute_bitangent(state)};
     // Box axes by the reference normal; the picture's are chosen by the world normal.
     Vec4f const texel =
-        f_evalMapping(api, state, bumpMode, {}, bumpTexture, bumpTextureMatrix, bumpAngularRepeat,
-                      state.Pref, state.Nref, false, attribute_uv(state), placement.boxAxes,
-                      placement.tangentU, placement.tangentV, bumpUVMatrix);
+        evalChannel(api, state, bump, state.Nref, attribute_uv(state), placement.axes);
     return bendNormal(placement, texel, bumpScale, state.N, state.objectToWorld);
 }
 
@@ -62,12 +62,12 @@ Vec3f BackgroundGeometry::receivedLight(IShaderAPI* api, ShadeState const& state
 /// environment and the rest to the blurred one.
 Vec3f BackgroundGeometry::reflections(IShaderAPI* api, ShadeState const& state, Vec3f n) const
 {
-    Vec3i boxAxes;
-    Vec3f tangentU, tangentV;
+    MappedAxes axes;
     Vec3f const reflectivity =
-        rgb(f_evalMapping(api, state, specularMode, specularColor, specularTexture,
-                          specularTextureMatrix, specularAngularRepeat, state.Pref, state.N, false,
-                          attribute_uv(state), boxAxes, tangentU, tangentV, specularUVMatrix));
+        rgb(evalChannel(api, state,
+                        {specularMode, specularColor, specularTexture, specularTextureMatrix,
+                         specularAngularRepeat, specularUVMatrix},
+                        state.N, attribute_uv(state), axes));
     if (reflectivity == kBlack)
         return reflectivity;
 
@@ -98,12 +98,11 @@ void BackgroundGeometry::shade(IShaderAPI* api, ShadeState& state) const
         state.discardHit = 1;
         return;
     }
-    Vec3i boxAxes;
-    Vec3f tangentU, tangentV;
-    Vec4f const picture =
-        f_evalMapping(api, state, diffuseMode, diffuseColor, diffuseTexture, diffuseTextureMatrix,
-                      diffuseAngularRepeat, state.Pref, state.N, false, attribute_uv(state),
-                      boxAxes, tangentU, tangentV, diffuseUVMatrix);
+    MappedAxes axes;
+    Vec4f const picture = evalChannel(api, state,
+                                      {diffuseMode, diffuseColor, diffuseTexture,
+                                       diffuseTextureMatrix, diffuseAngularRepeat, diffuseUVMatrix},
+                                      state.N, attribute_uv(state), axes);
     constexpr float kCutOut = 0.05f; // alpha below it is no surface
     if (kCutOut > picture.w) {
         state.discardHit = 1;

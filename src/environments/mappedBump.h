@@ -7,36 +7,34 @@ namespace zsi {
 
 /// How a normal map lies on the surface.
 struct BumpPlacement {
-    int mode; ///< a MappingMode; kMapUv to kMapAngular bend the normal
-    Mat4f const& textureMatrix;
+    MappedChannel const& channel; ///< modes kMapUv to kMapAngular bend the normal
     Mat4f const& textureMatrixInverse;
-    Mat3f const& uvMatrix;
     Vec3f tangent, bitangent; ///< object space, along rising uv
-    Vec3i boxAxes{0, 1, 2}; ///< these three as the mapping wrote them
-    Vec3f tangentU{0.0f, 0.0f, 0.0f}, tangentV{0.0f, 0.0f, 0.0f};
+    MappedAxes axes{}; ///< as the mapping wrote them
 };
 
 /// Directions of rising u and v of the map, object space, any length: turns and mirrorings of the
 /// transforms count, repeats do not make a bump steeper.
 inline void bumpAxes(BumpPlacement const& b, Vec3f& u, Vec3f& v)
 {
-    float const* const m = b.textureMatrix.m;
+    float const* const m = b.channel.textureMatrix.m;
+    float const* const uv = b.channel.uvMatrix.m;
     auto const column = [m](int axis) { return Vec3f(m[axis], m[4 + axis], m[8 + axis]); };
-    switch (b.mode) {
+    switch (b.channel.mode) {
     case kMapUv:
-        u = b.uvMatrix.m[0] * b.tangent + b.uvMatrix.m[3] * b.bitangent;
-        v = b.uvMatrix.m[1] * b.tangent + b.uvMatrix.m[4] * b.bitangent;
+        u = uv[0] * b.tangent + uv[3] * b.bitangent;
+        v = uv[1] * b.tangent + uv[4] * b.bitangent;
         break;
     case kMapAngular: {
         // The angle runs from y to x, against tangentU.
         Mat3f const toObject(b.textureMatrixInverse);
-        u = transformDirection(toObject, -b.tangentU);
-        v = transformDirection(toObject, b.tangentV);
+        u = transformDirection(toObject, -b.axes.tangentU);
+        v = transformDirection(toObject, b.axes.tangentV);
         break;
     }
     case kMapBox:
-        u = column(b.boxAxes.x);
-        v = column(b.boxAxes.y);
+        u = column(b.axes.box.x);
+        v = column(b.axes.box.y);
         break;
     default:
         u = column(0);
@@ -50,7 +48,7 @@ inline void bumpAxes(BumpPlacement const& b, Vec3f& u, Vec3f& v)
 inline Vec3f bendNormal(BumpPlacement const& b, Vec4f texel, float amount, Vec3f const& N,
                         Mat4f const& objectToWorld)
 {
-    if (b.mode < kMapUv || b.mode > kMapAngular)
+    if (b.channel.mode < kMapUv || b.channel.mode > kMapAngular)
         return N;
     Vec3f u, v;
     bumpAxes(b, u, v);

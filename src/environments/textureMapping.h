@@ -30,15 +30,29 @@ constexpr Vec3i boxProjection(Vec3f n)
     return {0, 1, zOverY ? 2 : 1};
 }
 
+/// A channel of a material as its parameters give it.
+struct MappedChannel {
+    int mode; ///< a MappingMode; others look up (0, 0)
+    Vec3f color; ///< of kMapColor
+    TextureSampler2D const& texture;
+    Mat4f const&
+        textureMatrix; ///< position to texture space (row vectors), kMapPlanar to kMapAngular
+    float angularRepeat; ///< repeats of the picture around the axis, kMapAngular
+    Mat3f const& uvMatrix; ///< transform of uv, kMapUv
+};
+
+/// How a projecting mode laid the picture, in texture space.
+struct MappedAxes {
+    Vec3i box{0, 1, 2}; ///< written by kMapBox, as `boxProjection` says
+    /// Written by kMapAngular: against the direction of rising u, unit unless on the axis; and
+    /// along rising v.
+    Vec3f tangentU{0.0f, 0.0f, 0.0f}, tangentV{0.0f, 0.0f, 0.0f};
+};
+
 /// The mapping itself; shaders have it as `f_evalMapping` through the structures below.
 ///
-/// textureMatrix: from `position` to texture space (row vectors), kMapPlanar to kMapAngular.
-/// uvMatrix: transform of `uv`, kMapUv. angularRepeat: repeats of the picture around the axis.
 /// planarBox: kMapBox projects along z whatever the normal.
 /// alphaAsColor: the texel's alpha in all four channels, where a texture is read.
-/// boxAxes: written by kMapBox, as `boxProjection` says. tangentU, tangentV: written by
-/// kMapAngular, in texture space: against the direction of rising u, unit unless on the axis; and
-/// along rising v. A mode beyond these looks up (0, 0).
 inline Vec4f evalMapping(int mode, bool planarBox, Vec3f const& color,
                          TextureSampler2D const& texture, Mat4f const& textureMatrix,
                          float angularRepeat, Vec3f const& position, Vec3f const& normal,
@@ -89,6 +103,14 @@ struct TextureMappingFunctions {
         return evalMapping(mode, false, color, texture, textureMatrix, angularRepeat, position,
                            normal, alphaAsColor, uv, boxAxes, tangentU, tangentV, uvMatrix);
     }
+    /// A channel at a hit. normal: chooses the axis of a box.
+    Vec4f evalChannel(IShaderAPI* api, ShadeState const& state, MappedChannel const& c,
+                      Vec3f const& normal, Vec2f const& uv, MappedAxes& axes) const
+    {
+        return f_evalMapping(api, state, c.mode, c.color, c.texture, c.textureMatrix,
+                             c.angularRepeat, state.Pref, normal, false, uv, axes.box,
+                             axes.tangentU, axes.tangentV, c.uvMatrix);
+    }
 };
 
 /// The variant with a switch: with `triplanarXY` the box is planar, along z.
@@ -102,6 +124,14 @@ struct TriplanarMappingFunctions {
         return evalMapping(mode, triplanarXY, color, texture, textureMatrix, angularRepeat,
                            position, normal, alphaAsColor, uv, boxAxes, tangentU, tangentV,
                            uvMatrix);
+    }
+    /// A channel at a hit.
+    Vec4f evalChannel(IShaderAPI* api, ShadeState const& state, MappedChannel const& c,
+                      bool triplanarXY, bool alphaAsColor, Vec2f const& uv, MappedAxes& axes) const
+    {
+        return f_evalMapping(api, state, c.mode, triplanarXY, c.color, c.texture, c.textureMatrix,
+                             c.angularRepeat, state.Pref, state.Nref, alphaAsColor, uv, axes.box,
+                             axes.tangentU, axes.tangentV, c.uvMatrix);
     }
 };
 

@@ -81,50 +81,50 @@ ShadeState hitAt(test::Random& random, float leastCosine)
     return s;
 }
 
+/// Red of the transmission; the diffuse map has alpha 1/4 and colour 0.1, the mask map 0.5 and
+/// alpha 0.75.
 TEST(MarlowLegacy, ShadowRaysKeepWhatMaskAndTransparencyLeave)
 {
-    test::Random random;
-    for (int i = 0; i < 1000; ++i) {
-        MarlowLegacy s; // as made: highlights and reflection count nothing here
-        test::ScriptedHost host;
-        ShadeState state = test::randomHit(random, i % 2);
-        Vec4f const diffuseTexel = withAlpha(random.color(), random.in(0, 1));
-        Vec4f const maskTexel = withAlpha(random.color(), random.in(0, 1));
-        Picture diffuse([&](Vec2f) { return diffuseTexel; });
-        Picture mask([&](Vec2f) { return maskTexel; });
-        auto const coin = [&] { return random.in(0, 1) < 0.5f; };
-        s.transparencyColor = random.color();
-        s.diffuseColor = random.color();
-        s.maskingColor = random.color();
-        s.transparencyInvert = coin();
-        s.transparencyFromDiffuse = coin();
-        s.transparencyBlocksHighlights = coin();
-        s.reverseNormal = coin();
-        s.maskingInvertTexture = coin();
-        s.maskingFromAlpha = coin();
-        s.diffuseMode = coin() ? 1 : 0;
-        s.maskingMode = i % 3 - 1;
-        bool const bound = coin();
-        if (bound)
+    struct Case {
+        char const* why;
+        bool fromDiffuse, invert;
+        int diffuseMode, maskingMode;
+        bool fromAlpha, invertMask;
+        float want;
+    };
+    constexpr Case kCases[] = {
+        {"as made, 80 % clear", false, false, 0, -1, false, false, 0.8f},
+        {"inverted", false, true, 0, -1, false, false, 0.2f},
+        {"colour of the diffuse", true, false, 0, -1, false, false, 0.3f},
+        {"alpha of its map", true, false, 1, -1, false, false, 0.25f},
+        {"that inverted", true, true, 1, -1, false, false, 0.75f},
+        {"mask: 1 - 0.2 * 0.4", false, false, 0, 0, false, false, 0.92f},
+        {"a plain mask is not inverted", false, false, 0, 0, false, true, 0.92f},
+        {"mask map: 1 - 0.2 * 0.5", false, false, 0, 1, false, false, 0.9f},
+        {"inverted alpha: 1 - 0.2 * 0.75", false, false, 0, 1, true, true, 0.85f},
+        {"both: 1 - 0.25 * 0.25", true, true, 1, 1, true, false, 0.9375f},
+    };
+    Picture diffuse([](Vec2f) { return Vec4f(0.1f, 0.1f, 0.1f, 0.25f); });
+    Picture mask([](Vec2f) { return Vec4f(0.5f, 0.5f, 0.5f, 0.75f); });
+    for (Case const& c : kCases)
+        for (bool reversed : {false, true}) {
+            MarlowLegacy s; // as made: highlights and reflection count nothing here
+            test::ScriptedHost host;
+            ShadeState state = test::plainHit();
+            s.diffuseColor = {0.3f, 0, 0};
+            s.maskingColor = {0.6f, 0, 0};
+            s.transparencyFromDiffuse = c.fromDiffuse;
+            s.transparencyInvert = c.invert;
+            s.transparencyBlocksHighlights = s.reverseNormal = reversed;
+            s.diffuseMode = c.diffuseMode;
             s.diffuseTexture.texture = &diffuse;
-        s.maskingTexture.texture = &mask;
-        s.transmission(&host, state);
-        for (int c = 0; c < 3; ++c) {
-            double t = axis(s.transparencyColor, c);
-            if (s.transparencyFromDiffuse)
-                t = s.diffuseMode == 0 ? axis(s.diffuseColor, c) : bound ? d(diffuseTexel.w) : 0;
-            if (s.transparencyInvert)
-                t = 1 - t;
-            double m = 0;
-            if (s.maskingMode == 0)
-                m = axis(s.maskingColor, c); // a colour is not inverted
-            if (s.maskingMode == 1) {
-                m = s.maskingFromAlpha ? d(maskTexel.w) : axis(rgb(maskTexel), c);
-                m = s.maskingInvertTexture ? 1 - m : m;
-            }
-            ASSERT_NEAR(axis(state.transmissionColor, c), 1 - (1 - t) * (1 - m), 1e-6);
+            s.maskingMode = c.maskingMode;
+            s.maskingTexture.texture = &mask;
+            s.maskingFromAlpha = c.fromAlpha;
+            s.maskingInvertTexture = c.invertMask;
+            s.transmission(&host, state);
+            EXPECT_NEAR(state.transmissionColor.x, c.want, 1e-6) << c.why;
         }
-    }
 }
 
 TEST(MarlowLegacy, PaneAbsorbsAlongTheWayInsideAndBodyBends)
@@ -219,6 +219,147 @@ TEST(MarlowLegacy, LightsShadeAsTransferSays)
             ASSERT_NEAR(axis(got, c), axis(want, c), 1e-4 * axis(want, c) + 1e-6);
     }
     EXPECT_GT(lit, 1000);
+}
+
+/// A white lobe of any width sends out all light: to paths and lights by its integral, to traced
+/// rays ray by ray, and mirrored rays that no light reaches weigh the same. All are spread alike.
+TEST(MarlowLegacy, OneEnergyAndOneShapeForOneLobe)
+{
+    test::Random random;
+    for (float const width : {0.03f, 0.3f, 0.85f, 1.0f})
+        for (float const cosine : {1.0f, 0.6f, 0.2f, 0.05f})
+            for (int kind : {0, 1, 2}) { // a highlight; a reflection with and without lights
+                Legacy l;
+                MarlowLegacy& s = l.shader;
+                s.specularREG = {0, width, 1};
+                s.surfaceRoughness = width;
+                (kind ? s.reflectivityColor : s.specularColor) = {1, 1, 1};
+                s.reflectLight = kind == 1;
+                float const sine = std::sqrt(1 - cosine * cosine);
+                l.state.I = {sine, 0, -cosine};
+                std::fill_n(l.state.allowReflection, 3, std::uint8_t(1));
+                auto const map = test::MirrorMap{d(width), d(width), {-d(sine), 0, d(cosine)}};
+                auto const transfer = [&](test::Vec3d dir) {
+                    l.state.sampleDirection = test::toFloat(dir);
+                    s.transfer(&l.host, l.state);
+                    return d(l.state.outBrdf.x);
+                };
+                l.host.onTrace = [&](Vec3f, Vec3f dir) {
+                    return grey(dir.z); // brighter upwards
+                };
+                constexpr int kDraws = 1500;
+                double traced = 0, sampled = 0;
+                for (int i = 0; i < kDraws; ++i) {
+                    for (float& x : l.host.randoms = std::vector<float>(48))
+                        x = random.in(0, 0.9999f);
+                    l.host.randomCalls = 0;
+                    traced += d(l.shade().x) / kDraws;
+                    s.sample(&l.host, l.state);
+                    if (kind == 2) {
+                        EXPECT_EQ(l.state.sampleType, kSampleStraight);
+                        EXPECT_EQ(l.state.outBrdf.x, 1.0f);
+                        sampled += d(l.state.sampleDirection.z) / kDraws;
+                    }
+                }
+                // Four standard errors; the cosine of a lobe deviates by 0.3 at most.
+                constexpr double kNoise = 4 * 0.3 / 38;
+                if (kind < 2) {
+                    // What albedoTables.h interpolates is within 1.2 %.
+                    EXPECT_NEAR(test::hemisphere(map, 100, transfer), 1, 0.013) << width << cosine;
+                    EXPECT_NEAR(
+                        test::hemisphere(map, 300,
+                                         [&](test::Vec3d dir) { return dir.z * transfer(dir); }),
+                        traced, kNoise + 0.013)
+                        << width << ' ' << cosine;
+                } else {
+                    EXPECT_EQ(transfer({-d(l.state.I.x), 0, d(cosine)}), 0) << "no light";
+                    EXPECT_NEAR(sampled, traced, 1.5 * kNoise) << width << ' ' << cosine;
+                }
+                l.whiteRoom();
+                expectColor(l.shade(), {1, 1, 1}, 1, "white room", 1e-6f);
+            }
+}
+
+/// The true surface leans 40 degrees to the bent one: nothing below either is lit or proposed.
+TEST(MarlowLegacy, NothingIsLitBelowTheTrueSurface)
+{
+    test::Random random;
+    Legacy l;
+    MarlowLegacy& s = l.shader;
+    s.specularColor = {0.5f, 0.5f, 0.5f};
+    s.specularREG = {0, 0.5f, 1};
+    s.reflectivityColor = {0.3f, 0.3f, 0.3f};
+    s.surfaceRoughness = 0.5f;
+    std::fill_n(l.state.allowReflection, 3, std::uint8_t(1));
+    int below = 0, accepted = 0;
+    for (int i = 0; i < 4000; ++i) {
+        s.faceLight = i % 2;
+        s.reflectLight = i % 4 < 2;
+        bool const back = i % 8 < 4;
+        l.state.I = normalize(Vec3f(-0.6f, 0, back ? 1.0f : -1.0f));
+        l.state.Ng = {0.6427876f, 0, 0.7660444f};
+        for (float& x : l.host.randoms = std::vector<float>(64))
+            x = random.in(0, 0.9999f);
+        s.sample(&l.host, l.state);
+        if (l.state.sampleType == kSampleMixture) {
+            Vec3f const dir = l.state.sampleDirection;
+            EXPECT_GE(dir.z * dot(dir, l.state.Ng), 0.0f);
+            ++accepted;
+        } else if (l.state.sampleType == kSampleStraight) {
+            EXPECT_GE(dot(l.state.sampleDirection, l.state.Ng) * (back ? -1.0f : 1.0f), 0.0f);
+        }
+        Vec3f const L = l.state.sampleDirection = random.unit();
+        s.transfer(&l.host, l.state);
+        if (L.z * dot(L, l.state.Ng) < 0) {
+            ++below;
+            EXPECT_EQ(l.state.outBrdf, kBlack);
+            l.host.lights.clear();
+            l.host.addLight(L, {1, 1, 1});
+            expectColor(l.shade(), {0, 0, 0}, 1, "light below");
+        }
+    }
+    EXPECT_GT(accepted, 1000);
+    EXPECT_GT(below, 500);
+}
+
+TEST(MarlowLegacy, RaysThatGatherLightSeeWideHighlightsAndMattMirrors)
+{
+    Legacy l;
+    MarlowLegacy& s = l.shader;
+    s.diffuseColor = {0, 0, 0};
+    s.specularColor = {0.5f, 0.5f, 0.5f};
+    s.specularREG = {0, 0.02f, 1};
+    s.reflectivityColor = {0.25f, 0.25f, 0.25f};
+    l.host.onIndirect = [](Vec3f, Vec3f) { return Vec3f(4, 4, 4); };
+    l.host.addLight({0, 0.1f, 0.995f}, {1, 1, 1});
+    l.state.rayType = kRayDiffuse;
+    float const narrow = l.shade().x;
+    EXPECT_EQ(l.host.count("traceSpecular"), 0);
+    s.specularREG.y = 0.3f;
+    EXPECT_EQ(l.shade().x, narrow);
+    s.specularREG.y = 0.4f;
+    EXPECT_NE(l.shade().x, narrow);
+    l.host.lights.clear();
+    EXPECT_NEAR(l.shade().x, 4 * 0.75f, 1e-6f);
+}
+
+TEST(MarlowLegacy, BumpLeansByItsDepth)
+{
+    Picture bump([](Vec2f) { return Vec4f(1, 0.5f, 1, 1); }); // 45 degrees towards rising u
+    Legacy l;
+    l.shader.bumpMode = 1;
+    l.shader.bumpTexture.texture = &bump;
+    l.shader.bumpUVMatrix = Mat3f::identity();
+    test::setAttribute(l.state, 16, Vec3f(1, 0, 0));
+    test::setAttribute(l.state, 28, Vec3f(0, 1, 0));
+    for (float const depth : {1.0f, 2.0f, -0.5f, 0.0f})
+        for (bool reversed : {false, true}) {
+            l.shader.bumpDepth = depth;
+            l.shader.reverseNormal = reversed;
+            l.shade();
+            Vec3f const want = normalize(Vec3f(depth, 0, reversed ? -1.0f : 1.0f));
+            EXPECT_LT(length(l.host.calls[0].vectors[1] - want), 1e-6f) << depth;
+        }
 }
 
 TEST(MarlowLegacy, ReceivesLightsAndTheirTintedShadow)

@@ -2,7 +2,6 @@
 #include "materials/legacy/MarlowLegacy.h"
 
 #include "materials/physical/shared/facedNormal.h"
-#include "materials/physical/shared/safeReflect.h"
 #include "materials/physical/shared/shadingFrame.h"
 
 #include <limits>
@@ -34,26 +33,26 @@ MarlowLegacy::Lit MarlowLegacy::lights(IShaderAPI* api, ShadeState const& state,
 {
     Lit lit{kBlack, kBlack};
     Vec3f const fullShadow = shadowColor * shadowIntensity + grey(1.0f - shadowIntensity);
-    float const gain[3] = {specularLightGainValue, specular2LightGainValue, 1.0f};
     for (int side = 0; side < (faceLight ? 2 : 1); ++side) {
         Vec3f const n = side == 0 ? at.n() : -at.n();
-        float const up = side == 0 ? 1.0f : -1.0f;
-        Vec3f const v(at.v.x, at.v.y, up * at.v.z);
         LightSample const* s = api->getLightSamples(kLightCategory, &state.P, &n);
         for (; s; s = s->next) {
-            Vec3f l = toLocal(at.frame, s->L);
-            l.z *= up;
-            if (faceLight && !(l.z > 0.0f)) // the other side counts it
+            if (faceLight && !(dot(n, s->L) > 0.0f)) // the other side counts it
                 continue;
             Vec3f const shadow = fullShadow * (kWhite - s->shadow) + s->shadow;
             Vec3f const light = s->color * shadow * s->weight;
-            if (light == kBlack)
+            Vec3f const l = toLocal(at.frame, s->L);
+            if (light == kBlack || !at.clears(l))
                 continue;
             lit.diffuse += light;
-            for (int i = 0; i < 3; ++i)
-                if (!(layers.lobe[i].part == kBlack))
-                    lit.glossy +=
-                        light * layers.lobe[i].part * (gain[i] * kPi * layers.lobe[i].value(v, l));
+            auto const add = [&](GlossyLobe const& lobe, float gain) {
+                if (!(lobe.albedo == kBlack))
+                    lit.glossy += light * lobe.albedo * (gain * kPi * lobe.value(l));
+            };
+            add(layers.highlight[0], specularLightGainValue);
+            add(layers.highlight[1], specular2LightGainValue);
+            if (layers.mirrorsLights)
+                add(layers.reflection, 1.0f);
         }
     }
     return lit;
@@ -86,26 +85,28 @@ Vec3f MarlowLegacy::diffuseSurroundings(IShaderAPI* api, ShadeState const& state
 Vec3f MarlowLegacy::mirrored(IShaderAPI* api, ShadeState const& state, Surface const& at,
                              Layers const& layers, Vec3f const& open) const
 {
-    Vec3f const highlights = layers.lobe[0].part + layers.lobe[1].part;
-    Vec3f const reflection = layers.shares.reflection;
+    Vec3f const highlights = layers.albedo.highlight[0] + layers.albedo.highlight[1];
+    Vec3f const reflection = layers.albedo.reflection;
     if (highlights == kBlack && reflection == kBlack)
         return kBlack;
-    Vec3f const Ng = dot(state.I, state.Ng) > 0.0f ? -state.Ng : state.Ng;
-    Vec3f const upper = at.v.z < 0.0f ? -at.n() : at.n();
-    Vec3f const r = f_safe_reflect(api, state, state.I, Ng, upper);
-    // A ray that gathers light would carry the image of a lamp as a speck: it sees a matt surface.
-    auto const seen = [&](float width, Vec3f const& weight) {
+    Vec3f const& facing = at.facing();
+    Vec3f const mirror = mirrorDirection(api, state, at, {});
+    auto const seen = [&](GlossyLobe const& lobe, Vec3f const& weight) {
         float const importance = maxComponent(weight);
-        return weight
-            * (state.rayType == kRayDiffuse ? api->indirectDiffuse(&state.P, &upper, importance)
-                                            : api->traceSpecular(&state.P, &r, width, importance));
+        // A ray that gathers light would carry the image of a lamp as a speck: it sees a matt
+        // surface.
+        if (state.rayType == kRayDiffuse)
+            return weight * api->indirectDiffuse(&state.P, &facing, importance);
+        // A ray of the lobe itself: the host is left nothing to spread.
+        Vec3f const r = lobe.albedo == kBlack ? mirror : mirrorDirection(api, state, at, lobe);
+        return weight * api->traceSpecular(&state.P, &r, 0.0f, importance);
     };
 
     Vec3f sum = kBlack;
     bool const blurred = IBLSpecMode >= 0 && specularIBLCube.texture;
     if (blurred && !(highlights == kBlack)) {
         Vec3f const light =
-            gradeChannel(globalIbl(*this, specularIBLCube, r),
+            gradeChannel(globalIbl(*this, specularIBLCube, mirror),
                          {specularIBLChannelContrastPivot, specularIBLChannelContrastValue,
                           specularIBLChannelGainColor, specularIBLChannelGainSource,
                           specularIBLChannelGainValue, specularIBLChannelSatValue});
@@ -115,16 +116,16 @@ Vec3f MarlowLegacy::mirrored(IShaderAPI* api, ShadeState const& state, Surface c
                             specularIBLGainColor, specularIBLGainSource, specularIBLGainValue});
     }
     if (!blurred || IBLSpecMode > 0) {
-        for (int i = 0; i < 2; ++i)
-            if (!(layers.lobe[i].part == kBlack))
-                sum += seen(layers.lobe[i].width, layers.lobe[i].part);
+        for (GlossyLobe const& lobe : layers.highlight)
+            if (!(lobe.albedo == kBlack))
+                sum += seen(lobe, lobe.albedo);
     }
 
     if (reflection == kBlack)
         return sum;
     if (useReflectionCubeIBL && reflectionCubeIBL.texture) {
         Vec3f const light =
-            gradeChannel(globalIbl(*this, reflectionCubeIBL, r),
+            gradeChannel(globalIbl(*this, reflectionCubeIBL, mirror),
                          {reflectIBLChannelContrastPivot, reflectIBLChannelContrastValue,
                           reflectIBLChannelGainColor, reflectIBLChannelGainSource,
                           reflectIBLChannelGainValue, reflectIBLChannelSatValue});
@@ -135,14 +136,14 @@ Vec3f MarlowLegacy::mirrored(IShaderAPI* api, ShadeState const& state, Surface c
                             .gainSource = reflectIBLGainSource,
                             .gain = reflectIBLGainValue});
     }
-    return sum + seen(surfaceRoughness, reflection);
+    return sum + seen(layers.reflection, reflection);
 }
 
 /// Everything but what comes from behind.
 Vec3f MarlowLegacy::opaquePart(IShaderAPI* api, ShadeState const& state, Surface const& at,
                                Layers const& layers) const
 {
-    Vec3f const base = layers.shares.base * layers.diffuse;
+    Vec3f const base = layers.albedo.base * layers.diffuse;
     if (unlitSurface)
         return base;
     Vec3f const open = f_calcAmbientOcclusion(api, state, 1.0f);
@@ -160,29 +161,28 @@ Vec3f MarlowLegacy::opaquePart(IShaderAPI* api, ShadeState const& state, Surface
 
 void MarlowLegacy::shade(IShaderAPI* api, ShadeState& state) const
 {
-    Vec3f const removed = saturate(mask(api, state));
-    if (removed == kWhite) {
+    Vec3f const masked = saturate(mask(api, state));
+    if (masked == kWhite) {
         state.discardHit = 1;
         return;
     }
-    Vec3f const kept = kWhite - removed;
-    Vec3f through = removed; // what is seen straight behind
+    Vec3f const coverage = kWhite - masked;
+    Vec3f through = masked; // what is seen straight behind
     Vec3f color;
     if (showNormalsOnly) {
-        color = kept * facingColor(state, reverseNormal, faceForward, faceLight);
+        color = coverage * facingColor(state, reverseNormal, faceForward, faceLight);
     } else if (showAmbientOnly) {
-        color = kept * grey(minComponent(f_calcAmbientOcclusion(api, state, 1.0f)));
+        color = coverage * grey(minComponent(f_calcAmbientOcclusion(api, state, 1.0f)));
     } else {
         Surface const at = surface(api, state);
         Layers const layers = layersAt(api, state, at);
-        color = kept * opaquePart(api, state, at, layers);
-        Vec3f const clear = kept * layers.shares.clear;
+        color = coverage * opaquePart(api, state, at, layers);
+        Vec3f const clear = coverage * layers.albedo.transmission;
         if (!bends()) {
-            through += clear * paneTransmittance(api, state, minOf(std::fabs(at.v.z), 1.0f));
+            through += clear * paneTransmittance(api, state, minOf(at.v.z, 1.0f));
         } else if (!(clear == kBlack)) {
-            Vec3f const T = refracted(api, state, at.v.z < 0.0f ? -at.n() : at.n());
-            color +=
-                clear * api->traceRefraction(&state.P, &T, surfaceRoughness, maxComponent(clear));
+            Vec3f const T = refractedDirection(api, state, at);
+            color += clear * api->traceRefraction(&state.P, &T, 0.0f, maxComponent(clear));
         }
     }
     float alpha = 1.0f;

@@ -3,6 +3,7 @@
 #include "environments/channelGrading.h"
 #include "environments/textureMapping.h"
 #include "materials/legacy/glossyLobe.h"
+#include "materials/legacy/layerAlbedo.h"
 #include "materials/physical/shared/ambientOcclusion.h"
 #include "materials/physical/shared/masking.h"
 
@@ -149,24 +150,34 @@ public:
                                float distance) const;
 
 private:
-    /// Where and how a hit is looked at.
+    /// Where and how a hit is looked at. Local directions have z on the viewer's side of the
+    /// normal.
     struct Surface {
-        SLArray<Vec3f> frame; ///< about the bent normal, which may face away from the viewer
+        SLArray<Vec3f> frame; ///< about the bent normal, turned to the viewer
         Vec3f v; ///< direction to the viewer, local
+        Vec3f ng; ///< true normal on the side of the frame's, local
+        bool behind; ///< the viewer is behind the bent normal
 
-        Vec3f const& n() const { return frame[2]; }
+        Vec3f const& facing() const { return frame[2]; }
+        Vec3f n() const { return behind ? -frame[2] : frame[2]; }
+        /// Whether l, local, is on one side of the surface by both normals.
+        bool clears(Vec3f l) const { return !(l.z * dot(ng, l) < 0.0f); }
     };
     /// What a hit consists of, before the mask.
     struct Layers {
         Vec3f diffuse; ///< colour of the base
-        SurfaceShares shares;
-        GlossyLobe lobe[3]; ///< two highlights; what reflectLight makes of the reflection
+        LayerAlbedo albedo;
+        GlossyLobe highlight[2];
+        GlossyLobe reflection; ///< none where it is not blurred: a plain mirror
+        bool mirrorsLights; ///< the reflection is one more highlight
     };
     struct Lit {
         Vec3f diffuse, glossy;
     };
 
     // marlowChannels.cpp: what the parameters and textures say at a hit.
+    Vec4f channel(IShaderAPI* api, ShadeState const& state, MappedChannel const& c,
+                  bool alphaAsColor = false) const;
     Vec3f mask(IShaderAPI* api, ShadeState const& state) const;
     Vec3f transparency(IShaderAPI* api, ShadeState const& state) const;
     Vec4f diffuse(IShaderAPI* api, ShadeState const& state, bool alphaAsColor) const;
@@ -174,7 +185,7 @@ private:
     Surface surface(IShaderAPI* api, ShadeState const& state) const;
     Layers layersAt(IShaderAPI* api, ShadeState const& state, Surface const& at) const;
     bool bends() const;
-    Vec3f refracted(IShaderAPI* api, ShadeState const& state, Vec3f facing) const;
+    bool blurs(Surface const& at) const;
     Vec3f paneTransmittance(IShaderAPI* api, ShadeState const& state, float cosine) const;
 
     // MarlowLegacy.cpp: what is seen.
@@ -187,8 +198,11 @@ private:
     Vec3f opaquePart(IShaderAPI* api, ShadeState const& state, Surface const& at,
                      Layers const& layers) const;
 
-    // marlowPaths.cpp: the same for paths.
-    Vec3f scattered(Layers const& layers, Vec3f v, Vec3f l) const;
+    // marlowPaths.cpp: where light goes on.
+    Vec3f mirrorDirection(IShaderAPI* api, ShadeState const& state, Surface const& at,
+                          GlossyLobe const& lobe) const;
+    Vec3f refractedDirection(IShaderAPI* api, ShadeState const& state, Surface const& at) const;
+    Vec3f scattered(Surface const& at, Layers const& layers, Vec3f l) const;
 };
 
 } // namespace zsi

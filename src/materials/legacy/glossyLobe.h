@@ -1,7 +1,7 @@
 /// Highlights: what three numbers make of them, and their lobes.
 #pragma once
 
-#include "materials/legacy/surfaceShares.h"
+#include "materials/legacy/facetAlbedo.h"
 #include "materials/physical/shared/fresnel.h"
 #include "materials/physical/shared/ggx.h"
 
@@ -30,37 +30,56 @@ struct Highlight {
     float strength(float cosine) const { return gain * schlick(1.0f - rollOff, cosine); }
 };
 
-/// Facets of one width that mirror `part` of the light. Directions are local, unit; below the
-/// surface there is nothing.
-struct GlossyLobe {
-    float width = 1.0f; ///< kLeastWidth..1
-    Vec3f part{0.0f, 0.0f, 0.0f};
+/// Facets of one width seen along a direction. What single bounces lose between facets is given
+/// back in their shape, so that the lobe sends out `albedo` of the light whatever its width:
+/// Turquin 2019, "Practical Multiple Scattering Compensation for Microfacet Models".
+///
+/// Directions are local to the viewer's side, unit; below the surface there is nothing.
+class GlossyLobe {
+public:
+    Vec3f albedo = kBlack; ///< black: no lobe, and nothing else is set
 
-    /// Scattering value for part 1, without the cosine, 1/sr. Its integral with the cosine is at
-    /// most 1.
-    float value(Vec3f v, Vec3f l) const
+    GlossyLobe() = default;
+    /// v: above the surface. width: kLeastWidth to 1.
+    GlossyLobe(float width, Vec3f v, Vec3f albedo_)
+        : albedo(albedo_)
+        , facets_{width, width}
+        , v_(v)
+        , stretchedV_(facets_.stretched(v))
+        , compensation_(1.0f / lobeAlbedo(width, v.z))
     {
-        if (!(v.z > 0.0f && l.z > 0.0f))
+    }
+
+    /// Scattering value for albedo 1, without the cosine, 1/sr. Its integral with the cosine is 1.
+    float value(Vec3f l) const
+    {
+        if (!(l.z > 0.0f))
             return 0.0f;
-        AnisotropicGgx const facets{width, width};
-        Vec3f const h = v + l;
-        return facets.density(h, dot(h, h))
-            * AnisotropicGgx::visibility(v.z, facets.stretched(v), l.z, facets.stretched(l));
+        Vec3f const h = v_ + l;
+        return compensation_ * facets_.density(h, dot(h, h))
+            * AnisotropicGgx::visibility(v_.z, stretchedV_, l.z, facets_.stretched(l));
     }
-    /// A direction and, for any direction, the density of these, 1/sr. u: in [0, 1). v above the
-    /// surface; the direction need not be.
-    Vec3f sample(Vec3f v, Vec2f u) const
+    /// A direction and, for any direction, the density of these, 1/sr. u: in [0, 1). The direction
+    /// need not be above the surface.
+    Vec3f sample(Vec2f u) const { return facets_.mirrorVisible(v_, stretchedV_, u); }
+    float density(Vec3f l) const
     {
-        AnisotropicGgx const facets{width, width};
-        return facets.mirrorVisible(v, facets.stretched(v), u);
+        Vec3f const h = v_ + l;
+        return AnisotropicGgx::reflectedDensity(facets_.density(h, dot(h, h)), v_.z, stretchedV_);
     }
-    float density(Vec3f v, Vec3f l) const
+    /// How much of a sampled direction other facets leave, 0..1: taken as often as this, directions
+    /// are distributed as value times cosine.
+    float unmasked(Vec3f l) const
     {
-        AnisotropicGgx const facets{width, width};
-        Vec3f const h = v + l;
-        return AnisotropicGgx::reflectedDensity(facets.density(h, dot(h, h)), v.z,
-                                                facets.stretched(v));
+        if (!(l.z > 0.0f))
+            return 0.0f;
+        return l.z * (v_.z + stretchedV_) / (v_.z * facets_.stretched(l) + l.z * stretchedV_);
     }
+
+private:
+    AnisotropicGgx facets_{1.0f, 1.0f};
+    Vec3f v_{0.0f, 0.0f, 1.0f};
+    float stretchedV_ = 1.0f, compensation_ = 1.0f;
 };
 
 } // namespace zsi

@@ -3,9 +3,7 @@
 #include "materials/legacy/MarlowLegacy.h"
 #include "materials/legacy/curveFresnel.h"
 #include "materials/physical/shared/facedNormal.h"
-#include "materials/physical/shared/safeReflect.h"
 #include "materials/physical/shared/shadingFrame.h"
-#include "runtime/builtins.h"
 
 namespace zsi {
 namespace {
@@ -15,11 +13,8 @@ namespace {
 /// Space Regularization for Holistic and Robust Light Transport".
 constexpr float kGatheredWidth = 0.3f;
 
-/// What the mapping tells beside the colour, for channels that do not ask.
-struct Projection {
-    Vec3i boxAxes{0, 1, 2};
-    Vec3f tangentU{0.0f, 0.0f, 0.0f}, tangentV{0.0f, 0.0f, 0.0f};
-};
+/// Below it, mirrored and refracted light is not blurred.
+constexpr float kSmooth = 0.005f;
 
 } // namespace
 
@@ -30,43 +25,44 @@ Vec3f MarlowLegacy::f_beersUnabsorbedRGB(IShaderAPI*, ShadeState const&, Vec3f a
     return {left(absorbance.x), left(absorbance.y), left(absorbance.z)};
 }
 
+Vec4f MarlowLegacy::channel(IShaderAPI* api, ShadeState const& state, MappedChannel const& c,
+                            bool alphaAsColor) const
+{
+    MappedAxes axes;
+    return evalChannel(api, state, c, triplanarXY, alphaAsColor, attribute_uv(state), axes);
+}
+
 /// 1 removes the surface.
 Vec3f MarlowLegacy::mask(IShaderAPI* api, ShadeState const& state) const
 {
-    Projection p;
-    Vec3f const m = rgb(f_evalMapping(api, state, maskingMode, triplanarXY, maskingColor,
-                                      maskingTexture, maskingTextureMatrix, maskingAngularRepeat,
-                                      state.Pref, state.Nref, maskingFromAlpha, attribute_uv(state),
-                                      p.boxAxes, p.tangentU, p.tangentV, maskingUVMatrix));
+    Vec3f const m = rgb(channel(api, state,
+                                {maskingMode, maskingColor, maskingTexture, maskingTextureMatrix,
+                                 maskingAngularRepeat, maskingUVMatrix},
+                                maskingFromAlpha));
     return maskingInvertTexture && maskingMode > 0 ? grey(1.0f) - m : m;
 }
 
 Vec4f MarlowLegacy::diffuse(IShaderAPI* api, ShadeState const& state, bool alphaAsColor) const
 {
-    Projection p;
-    return f_evalMapping(api, state, diffuseMode, triplanarXY, diffuseColor, diffuseTexture,
-                         diffuseTextureMatrix, diffuseAngularRepeat, state.Pref, state.Nref,
-                         alphaAsColor, attribute_uv(state), p.boxAxes, p.tangentU, p.tangentV,
-                         diffuseUVMatrix);
+    return channel(api, state,
+                   {diffuseMode, diffuseColor, diffuseTexture, diffuseTextureMatrix,
+                    diffuseAngularRepeat, diffuseUVMatrix},
+                   alphaAsColor);
 }
 
 /// 1 is clear.
 Vec3f MarlowLegacy::transparency(IShaderAPI* api, ShadeState const& state) const
 {
-    Vec3f t;
-    if (transparencyFromDiffuse) {
-        t = rgb(diffuse(api, state, diffuseTexture.texture != nullptr));
-    } else {
-        Projection p;
-        t = rgb(f_evalMapping(
-            api, state, transparencyMode, triplanarXY, transparencyColor, transparencyTexture,
-            transparencyTextureMatrix, transparencyAngularRepeat, state.Pref, state.Nref, false,
-            attribute_uv(state), p.boxAxes, p.tangentU, p.tangentV, transparencyUVMatrix));
-    }
+    Vec3f const t =
+        rgb(transparencyFromDiffuse ? diffuse(api, state, diffuseTexture.texture != nullptr)
+                                    : channel(api, state,
+                                              {transparencyMode, transparencyColor,
+                                               transparencyTexture, transparencyTextureMatrix,
+                                               transparencyAngularRepeat, transparencyUVMatrix}));
     return transparencyInvert ? grey(1.0f) - t : t;
 }
 
-/// Share that is mirrored. cosine: of the viewer, 0..1.
+/// Albedo of the reflection. cosine: of the viewer, 0..1.
 Vec3f MarlowLegacy::reflectance(float cosine) const
 {
     if (unlitSurface || reflectivityColor == kBlack)
@@ -81,48 +77,53 @@ MarlowLegacy::Surface MarlowLegacy::surface(IShaderAPI* api, ShadeState const& s
 {
     Vec3f n = facedNormal(state, reverseNormal, false);
     if (bumpMode > kMapColor && bumpDepth != 0.0f && bumpTexture.texture) {
-        BumpPlacement placement{bumpMode,     bumpTextureMatrix,        bumpTextureMatrixInverse,
-                                bumpUVMatrix, attribute_tangent(state), attribute_bitangent(state)};
+        MappedChannel const bump{bumpMode,          kBlack,      bumpTexture, bumpTextureMatrix,
+                                 bumpAngularRepeat, bumpUVMatrix};
+        BumpPlacement placement{bump, bumpTextureMatrixInverse, attribute_tangent(state),
+                                attribute_bitangent(state)};
         Vec4f const texel =
-            f_evalMapping(api, state, bumpMode, triplanarXY, {}, bumpTexture, bumpTextureMatrix,
-                          bumpAngularRepeat, state.Pref, state.Nref, false, attribute_uv(state),
-                          placement.boxAxes, placement.tangentU, placement.tangentV, bumpUVMatrix);
+            evalChannel(api, state, bump, triplanarXY, false, attribute_uv(state), placement.axes);
         n = bendNormal(placement, texel, bumpDepth, n, state.objectToWorld);
     }
     if (faceForward && dot(state.Ng, state.I) > 0.0f)
         n = -n;
-    Surface at{frameAbout(n), {}};
+    bool const behind = dot(n, state.I) > 0.0f;
+    Surface at{frameAbout(behind ? -n : n), {}, {}, behind};
     at.v = toLocal(at.frame, -state.I);
+    at.ng = toLocal(at.frame, dot(at.facing(), state.Ng) < 0.0f ? -state.Ng : state.Ng);
     return at;
 }
 
 MarlowLegacy::Layers MarlowLegacy::layersAt(IShaderAPI* api, ShadeState const& state,
                                             Surface const& at) const
 {
-    Layers l{rgb(diffuse(api, state, false)), {}, {}};
+    Layers l{rgb(diffuse(api, state, false)), {}, {}, {}, false};
     Vec3f const clear = saturate(transparency(api, state));
-    Vec3f part[2] = {kBlack, kBlack};
-    float const cosine = minOf(std::fabs(at.v.z), 1.0f);
-    if (!unlitSurface) {
-        Highlight const first(specularREG), second(specular2REG);
-        Projection p;
-        Vec3f const color = rgb(f_evalMapping(
-            api, state, specularMode, triplanarXY, specularColor, specularTexture,
-            specularTextureMatrix, specularAngularRepeat, state.Pref, state.Nref, false,
-            attribute_uv(state), p.boxAxes, p.tangentU, p.tangentV, specularUVMatrix));
-        part[0] = saturate(color * first.strength(cosine));
-        part[1] = saturate(specular2Color * second.strength(cosine));
-        l.lobe[0].width = first.width;
-        l.lobe[1].width = second.width;
+    float const cosine = minOf(at.v.z, 1.0f);
+    // Lights in front of a surface seen from behind reach its base alone.
+    bool const glossy = !unlitSurface && at.v.z > 0.0f && (!at.behind || faceLight);
+    Highlight const first(specularREG), second(specular2REG);
+    Vec3f highlight[2] = {kBlack, kBlack};
+    if (glossy) {
+        Vec3f const color =
+            rgb(channel(api, state,
+                        {specularMode, specularColor, specularTexture, specularTextureMatrix,
+                         specularAngularRepeat, specularUVMatrix}));
+        highlight[0] = saturate(color * first.strength(cosine));
+        highlight[1] = saturate(specular2Color * second.strength(cosine));
     }
-    l.shares = shareOut(reflectance(cosine), clear, part[0], part[1], transparencyBlocksHighlights);
-    for (int i = 0; i < 2; ++i)
-        l.lobe[i].part = l.shares.highlight[i];
-    if (reflectLight)
-        l.lobe[2] = {lobeWidth(surfaceRoughness), l.shares.reflection};
-    if (state.rayType == kRayDiffuse)
-        for (GlossyLobe& lobe : l.lobe)
-            lobe.width = maxOf(lobe.width, kGatheredWidth);
+    l.albedo = layerAlbedo(reflectance(cosine), clear, highlight[0], highlight[1],
+                           transparencyBlocksHighlights);
+    l.mirrorsLights = glossy && reflectLight;
+
+    float const leastWidth = state.rayType == kRayDiffuse ? kGatheredWidth : kLeastWidth;
+    auto const lobe = [&](float width, Vec3f const& albedo) {
+        return albedo == kBlack ? GlossyLobe() : GlossyLobe(maxOf(width, leastWidth), at.v, albedo);
+    };
+    l.highlight[0] = lobe(first.width, l.albedo.highlight[0]);
+    l.highlight[1] = lobe(second.width, l.albedo.highlight[1]);
+    if (l.mirrorsLights || blurs(at))
+        l.reflection = lobe(lobeWidth(surfaceRoughness), l.albedo.reflection);
     return l;
 }
 
@@ -132,18 +133,10 @@ bool MarlowLegacy::bends() const
     return refractiveIndex > 0.0f && refractiveIndex != 1.0f && !(simulatedThickness > 0.0f);
 }
 
-/// Direction into or out of the body, not unit; mirrored at total reflection. facing: the facet's
-/// normal on the viewer's side, unit.
-Vec3f MarlowLegacy::refracted(IShaderAPI* api, ShadeState const& state, Vec3f facing) const
+/// Whether mirrored and refracted light is blurred.
+bool MarlowLegacy::blurs(Surface const& at) const
 {
-    bool const leaving = dot(state.I, reverseNormal ? -state.Ng : state.Ng) > 0.0f;
-    float const eta =
-        leaving ? refractiveIndex / state.beyondIor : state.incomingIor / refractiveIndex;
-    Vec3f const T = sl_lib_refract(state.I, facing, eta);
-    if (!(T == kBlack))
-        return T;
-    Vec3f const Ng = dot(state.I, state.Ng) > 0.0f ? -state.Ng : state.Ng;
-    return f_safe_reflect(api, state, state.I, Ng, facing);
+    return std::fabs(surfaceRoughness) > kSmooth && at.v.z > 0.0f;
 }
 
 /// What the simulated pane leaves of the light that crosses it. cosine: of the ray outside, 0..1.

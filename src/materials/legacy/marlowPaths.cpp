@@ -1,21 +1,25 @@
-// The legacy material for path tracers: the layers of `shade`, drawn one at a time.
+// Where the legacy material sends light on: the layers of `shade`, drawn one at a time.
 #include "materials/legacy/MarlowLegacy.h"
 #include "materials/physical/shared/materialSkeleton.h"
 #include "materials/physical/shared/safeReflect.h"
 #include "materials/physical/shared/shadingFrame.h"
+#include "runtime/builtins.h"
 
 namespace zsi {
 namespace {
 
 constexpr Vec3f kWhite(1.0f, 1.0f, 1.0f);
 
-/// Below it, mirrored and refracted paths are not blurred.
-constexpr float kSmooth = 0.005f;
-
 /// How often a layer of this weight is drawn, before the sum of all is scaled to 1.
-float chanceOf(Vec3f weight)
+float probability(Vec3f weight)
 {
     return saturate(weight.x) + saturate(weight.y) + saturate(weight.z);
+}
+
+/// True normal on the viewer's side.
+Vec3f facedNg(ShadeState const& state)
+{
+    return dot(state.I, state.Ng) > 0.0f ? -state.Ng : state.Ng;
 }
 
 bool isFinite(Vec3f v) { return std::isfinite(v.x) && std::isfinite(v.y) && std::isfinite(v.z); }
@@ -37,30 +41,71 @@ struct Event {
 
 } // namespace
 
-/// Scattering value of base and lobes, without cosine and mask.
-Vec3f MarlowLegacy::scattered(Layers const& layers, Vec3f v, Vec3f l) const
+/// Direction that the surface mirrors into the viewer's, world space, above the true surface: drawn
+/// as the lobe scatters, or without a lobe the plain mirror direction.
+Vec3f MarlowLegacy::mirrorDirection(IShaderAPI* api, ShadeState const& state, Surface const& at,
+                                    GlossyLobe const& lobe) const
 {
-    if (unlitSurface)
-        return kBlack;
-    if (faceLight && l.z < 0.0f) {
-        v.z = -v.z;
-        l.z = -l.z;
+    Vec3f const ng = facedNg(state);
+    constexpr int kMostDraws = 16; // seen from above, the widest lobe takes 3 in the mean
+    for (int i = 0; i < kMostDraws && !(lobe.albedo == kBlack); ++i) {
+        Vec3f const l = lobe.sample(api->random2D());
+        Vec3f const direction = toWorld(at.frame, l);
+        if (api->random() < lobe.unmasked(l) && dot(direction, ng) > 0.0f)
+            return direction;
     }
-    if (!(l.z > 0.0f))
+    return f_safe_reflect(api, state, state.I, ng, at.facing());
+}
+
+/// Direction into or out of the body, not unit; mirrored at total reflection.
+Vec3f MarlowLegacy::refractedDirection(IShaderAPI* api, ShadeState const& state,
+                                       Surface const& at) const
+{
+    // Blurred by the facets that the viewer sees. What they mask of each other is not taken away.
+    Vec3f facet = at.facing();
+    if (blurs(at)) {
+        float const width = lobeWidth(surfaceRoughness);
+        AnisotropicGgx const facets{width, width};
+        Vec3f const l = facets.mirrorVisible(at.v, facets.stretched(at.v), api->random2D());
+        facet = toWorld(at.frame, normalize(at.v + l));
+    }
+    bool const leaving = dot(state.I, reverseNormal ? -state.Ng : state.Ng) > 0.0f;
+    float const eta =
+        leaving ? refractiveIndex / state.beyondIor : state.incomingIor / refractiveIndex;
+    Vec3f const ng = facedNg(state);
+    Vec3f const T = sl_lib_refract(state.I, facet, eta);
+    if (T == kBlack)
+        return f_safe_reflect(api, state, state.I, ng, facet);
+    float const height = dot(T, ng);
+    return height > 0.0f ? T - (2.0f * height) * ng : T;
+}
+
+/// Scattering value of base and lobes, without cosine and mask. l: local.
+Vec3f MarlowLegacy::scattered(Surface const& at, Layers const& layers, Vec3f l) const
+{
+    if (unlitSurface || !at.clears(l))
         return kBlack;
-    auto const glossy = [&](GlossyLobe const& lobe) {
-        return lobe.part == kBlack ? kBlack : lobe.part * lobe.value(v, l);
+    float const outside = at.behind ? -l.z : l.z;
+    Vec3f value = kBlack;
+    if (faceLight ? l.z != 0.0f : outside > 0.0f)
+        value = layers.albedo.base * layers.diffuse * kInvPi;
+    auto const add = [&](GlossyLobe const& lobe) {
+        if (!(lobe.albedo == kBlack))
+            value += lobe.albedo * lobe.value(l);
     };
-    return layers.shares.base * layers.diffuse * kInvPi + glossy(layers.lobe[0])
-        + glossy(layers.lobe[1]) + glossy(layers.lobe[2]);
+    add(layers.highlight[0]);
+    add(layers.highlight[1]);
+    if (layers.mirrorsLights)
+        add(layers.reflection);
+    return value;
 }
 
 void MarlowLegacy::transfer(IShaderAPI* api, ShadeState& state) const
 {
     Surface const at = surface(api, state);
     Vec3f const l = toLocal(at.frame, state.sampleDirection);
-    Vec3f const kept = kWhite - saturate(mask(api, state));
-    Vec3f const value = kept * scattered(layersAt(api, state, at), at.v, l);
+    Vec3f const coverage = kWhite - saturate(mask(api, state));
+    Vec3f const value = coverage * scattered(at, layersAt(api, state, at), l);
     state.outBrdf = isFinite(value) ? value : kBlack;
     state.sampleCosine = std::isfinite(l.z) ? std::fabs(l.z) : 0.0f;
 }
@@ -75,34 +120,33 @@ void MarlowLegacy::sample(IShaderAPI* api, ShadeState& state) const
 
     Surface const at = surface(api, state);
     Layers const layers = layersAt(api, state, at);
-    Vec3f const removed = saturate(mask(api, state));
-    Vec3f const kept = kWhite - removed;
-    Vec3f const facing = at.v.z < 0.0f ? -at.n() : at.n();
-    Vec3f const above(at.v.x, at.v.y, std::fabs(at.v.z));
-    float const blur = lobeWidth(surfaceRoughness);
+    Vec3f const masked = saturate(mask(api, state));
+    Vec3f const coverage = kWhite - masked;
 
     // One of: straight on, refracted, mirrored; diffuse and up to three lobes, which are a mixture.
     constexpr int kStraight = 0, kRefracted = 1, kMirrored = 2, kDiffuse = 3, kLobes = 4, kAll = 7;
     Vec3f weight[kAll] = {};
     if (transmits) {
-        Vec3f const clear = kept * layers.shares.clear;
-        weight[kStraight] = removed;
+        Vec3f const clear = coverage * layers.albedo.transmission;
+        weight[kStraight] = masked;
         if (bends())
             weight[kRefracted] = clear;
         else
-            weight[kStraight] += clear * paneTransmittance(api, state, minOf(above.z, 1.0f));
+            weight[kStraight] += clear * paneTransmittance(api, state, minOf(at.v.z, 1.0f));
     }
-    GlossyLobe const(&lobe)[3] = layers.lobe;
+    GlossyLobe const* const lobes[] = {&layers.highlight[0], &layers.highlight[1],
+                                       &layers.reflection};
     if (reflects && !unlitSurface) {
-        if (!reflectLight)
-            weight[kMirrored] = kept * layers.shares.reflection;
-        weight[kDiffuse] = kept * layers.shares.base * layers.diffuse;
-        for (int i = 0; i < 3 && at.v.z > 0.0f; ++i)
-            weight[kLobes + i] = kept * lobe[i].part;
+        weight[kMirrored] = coverage * layers.albedo.reflection;
+        weight[kDiffuse] = coverage * layers.albedo.base * layers.diffuse;
+        for (int i = 0; i < 3; ++i)
+            weight[kLobes + i] = coverage * lobes[i]->albedo;
+        // Either an event of its own or part of the mixture.
+        weight[layers.mirrorsLights ? kMirrored : kLobes + 2] = kBlack;
     }
     float chance[kAll], total = 0.0f;
     for (int i = 0; i < kAll; ++i)
-        total += chance[i] = chanceOf(weight[i]);
+        total += chance[i] = probability(weight[i]);
     if (!(total > 0.0f))
         return;
     float pick = api->random() * total;
@@ -116,36 +160,28 @@ void MarlowLegacy::sample(IShaderAPI* api, ShadeState& state) const
     if (drawn == kStraight) {
         e.direction = state.I;
         e.type = kSampleStraight;
-    } else if (drawn == kRefracted || drawn == kMirrored) {
-        // Blurred by the facets that the viewer sees; what their masks lose is not taken away.
-        Vec3f facet = facing;
-        bool const rough = std::fabs(surfaceRoughness) > kSmooth && above.z > 0.0f;
-        if (rough) {
-            Vec3f const l = GlossyLobe{blur, kBlack}.sample(above, api->random2D());
-            Vec3f const h = normalize(above + l);
-            facet = toWorld({{at.frame[0], at.frame[1], facing}}, h);
-        }
-        if (drawn == kMirrored) {
-            Vec3f const Ng = dot(state.I, state.Ng) > 0.0f ? -state.Ng : state.Ng;
-            e.direction = f_safe_reflect(api, state, state.I, Ng, facet);
-            e.type = kSampleStraight;
-        } else {
-            e.direction = refracted(api, state, facet);
-            e.type = rough ? kSampleRough : kSampleSmooth;
-        }
-        e.direction = normalize(e.direction);
+    } else if (drawn == kRefracted) {
+        e.direction = normalize(refractedDirection(api, state, at));
+        e.type = blurs(at) ? kSampleRough : kSampleSmooth;
+    } else if (drawn == kMirrored) {
+        e.direction = normalize(mirrorDirection(api, state, at, layers.reflection));
+        e.type = kSampleStraight;
     } else {
         Vec2f const u = api->random2D();
-        Vec3f const l =
-            drawn == kDiffuse ? cosineHemisphere(u) : lobe[drawn - kLobes].sample(at.v, u);
+        Vec3f l = drawn == kDiffuse ? cosineHemisphere(u) : lobes[drawn - kLobes]->sample(u);
         if (!(l.z > 0.0f))
             return;
-        float density = chance[kDiffuse] * l.z * kInvPi;
+        if (drawn == kDiffuse && at.behind) // the base faces away
+            l.z = -l.z;
+        if (!at.clears(l))
+            return;
+        float const outside = at.behind ? -l.z : l.z;
+        float density = chance[kDiffuse] * maxOf(outside, 0.0f) * kInvPi;
         for (int i = 0; i < 3; ++i)
-            if (chance[kLobes + i] > 0.0f)
-                density += chance[kLobes + i] * lobe[i].density(at.v, l);
-        e = {toWorld(at.frame, l), kept * scattered(layers, at.v, l), l.z, total / density,
-             kSampleMixture};
+            if (chance[kLobes + i] > 0.0f && l.z > 0.0f)
+                density += chance[kLobes + i] * lobes[i]->density(l);
+        e = {toWorld(at.frame, l), coverage * scattered(at, layers, l), std::fabs(l.z),
+             total / density, kSampleMixture};
     }
     if (e.type != kSampleMixture)
         e.value = weight[drawn] * (total / chance[drawn]);
