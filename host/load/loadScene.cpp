@@ -447,6 +447,8 @@ Scene loadScene(std::filesystem::path const& file, ShaderSource const& shaders)
     scene.file = file.string();
     scene.textures = std::make_shared<TextureStore>();
     Loader(scene, shaders).read(JsonReader(tree));
+    for (std::string const& warning : scene.textures->warnings())
+        scene.warnings.push_back(scene.file + ": " + warning);
     return scene;
 }
 

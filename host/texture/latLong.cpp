@@ -1,5 +1,7 @@
 #include "texture/latLong.h"
 
+#include "texture/areaShares.h"
+
 #include <algorithm>
 #include <cmath>
 #include <zsi/vecmath.h>
@@ -31,50 +33,28 @@ int wrapped(int i, int n)
     return r < 0 ? r + n : r;
 }
 
-/// Share of [a, b) in texel i.
-double overlap(double a, double b, int i)
+void addTo(double* sum, Vec4f const& v, double weight)
 {
-    return std::max(0.0, std::min(b, i + 1.0) - std::max(a, static_cast<double>(i)));
+    sum[0] += weight * static_cast<double>(v.x);
+    sum[1] += weight * static_cast<double>(v.y);
+    sum[2] += weight * static_cast<double>(v.z);
+    sum[3] += weight * static_cast<double>(v.w);
 }
 
-struct Sum {
-    double c[4] = {};
-    double weight = 0;
+Vec4f mean(double const* sum, double weight)
+{
+    auto const m = [&](int c) { return static_cast<float>(sum[c] / weight); };
+    return {m(0), m(1), m(2), m(3)};
+}
 
-    void add(Vec4f const& v, double w)
-    {
-        c[0] += w * static_cast<double>(v.x);
-        c[1] += w * static_cast<double>(v.y);
-        c[2] += w * static_cast<double>(v.z);
-        c[3] += w * static_cast<double>(v.w);
-        weight += w;
-    }
-    Vec4f mean() const
-    {
-        auto const m = [&](int i) { return static_cast<float>(c[i] / weight); };
-        return weight > 0 ? Vec4f(m(0), m(1), m(2), m(3)) : Vec4f(0, 0, 0, 1);
-    }
-};
+double sineOfRow(int y, int height) { return std::sin((y + 0.5) / height * kPiD); }
 
 } // namespace
 
-Vec4f& LatLong::at(int x, int y)
+Vec4f lookupLatLong(TiledPicture const& picture, Vec3f d)
 {
-    return texels[static_cast<std::size_t>(y) * static_cast<std::size_t>(width)
-                  + static_cast<std::size_t>(x)];
-}
-
-Vec4f const& LatLong::at(int x, int y) const { return const_cast<LatLong&>(*this).at(x, y); }
-
-Vec3f LatLong::direction(float column, float row) const
-{
-    float const phi = (column / static_cast<float>(width) - 0.5f) * 2.0f * kPi;
-    float const theta = row / static_cast<float>(height) * kPi;
-    return {std::sin(theta) * std::sin(phi), std::cos(theta), -std::sin(theta) * std::cos(phi)};
-}
-
-Vec4f LatLong::lookup(Vec3f d) const
-{
+    TiledPicture::Level const& level = picture.level(0);
+    int const width = level.width, height = level.height;
     // Scaled first, so that no square leaves the range of a float.
     float const largest = maxOf(std::fabs(d.x), maxOf(std::fabs(d.y), std::fabs(d.z)));
     d = largest > 0.0f ? d / largest : Vec3f(0, 1, 0);
@@ -95,108 +75,138 @@ Vec4f LatLong::lookup(Vec3f d) const
         }
         y = std::clamp(y, 0, height - 1);
         for (int i = 0; i < 4; ++i)
-            sum = sum + at(wrapped(x + i, width), y) * (wx.w[i] * wy.w[j]);
+            sum = sum + picture.texel(level, wrapped(x + i, width), y) * (wx.w[i] * wy.w[j]);
     }
     return sum;
 }
 
-void evenOutPoles(LatLong& picture)
+void evenOutRow(Vec4f* row, int y, int width, int height)
 {
-    int const w = picture.width;
-    for (int y = 0; y < picture.height; ++y) {
-        double const sine = std::sin((y + 0.5) / picture.height * kPiD);
-        bool const atPole = y == 0 || y == picture.height - 1;
-        double const span = atPole ? w : std::min<double>(w, 1.0 / sine);
-        if (span < 1.05)
-            continue;
-        // Mean over `span` texels around each, from running sums of the row laid out three times.
-        std::vector<Sum> before(static_cast<std::size_t>(3 * w) + 1);
-        for (int i = 0; i < 3 * w; ++i) {
-            Sum next = before[static_cast<std::size_t>(i)];
-            next.add(picture.at(i % w, y), 1.0);
-            before[static_cast<std::size_t>(i) + 1] = next;
-        }
-        auto const upTo = [&](double x) { // integral over [0, x)
-            auto const i = static_cast<std::size_t>(x);
-            Sum s = before[i];
-            s.add(picture.at(static_cast<int>(i) % w, y), x - static_cast<double>(i));
-            return s;
-        };
-        std::vector<Vec4f> row(static_cast<std::size_t>(w));
-        for (int x = 0; x < w; ++x) {
-            double const centre = w + x + 0.5;
-            Sum const a = upTo(centre - span / 2), b = upTo(centre + span / 2);
-            Sum s;
-            for (int c = 0; c < 4; ++c)
-                s.c[c] = b.c[c] - a.c[c];
-            s.weight = b.weight - a.weight;
-            row[static_cast<std::size_t>(x)] = s.mean();
-        }
-        if (atPole)
-            std::fill(row.begin(), row.end(), row[0]);
-        std::copy(row.begin(), row.end(), &picture.at(0, y));
+    bool const atPole = y == 0 || y == height - 1;
+    double const span = atPole ? width : std::min<double>(width, 1.0 / sineOfRow(y, height));
+    if (span < 1.05)
+        return;
+    // Mean over `span` texels around each, from running sums.
+    auto const n = static_cast<std::size_t>(width);
+    std::vector<double> before(4 * (n + 1));
+    for (std::size_t x = 0; x < n; ++x) {
+        std::copy_n(&before[4 * x], 4, &before[4 * x + 4]);
+        addTo(&before[4 * x + 4], row[x], 1.0);
     }
+    double const* const around = &before[4 * n];
+    auto const upTo = [&](double x, double sign, double* sum) { // from column 0 to x, either side
+        double const turns = std::floor(x / width);
+        auto const i = std::min(static_cast<std::size_t>(x - turns * width), n - 1);
+        double const part = x - turns * width - static_cast<double>(i);
+        for (std::size_t c = 0; c < 4; ++c)
+            sum[c] += sign
+                * (turns * around[c] + before[4 * i + c] * (1 - part)
+                   + before[4 * i + 4 + c] * part);
+    };
+    std::vector<Vec4f> even(n);
+    for (std::size_t x = 0; x < n; ++x) {
+        double const centre = static_cast<double>(x) + 0.5;
+        double sum[4] = {};
+        upTo(centre + span / 2, 1, sum);
+        upTo(centre - span / 2, -1, sum);
+        even[x] = mean(sum, span);
+    }
+    if (atPole)
+        std::fill(even.begin(), even.end(), even[0]);
+    std::copy(even.begin(), even.end(), row);
 }
 
-LatLong reduced(LatLong const& picture, int width)
+LatLongReduction::LatLongReduction(int width, int height, int reducedWidth)
+    : width_(width)
+    , height_(height)
+    , result_(reducedWidth, std::max(1, reducedWidth / 2))
+    , narrow_(static_cast<std::size_t>(reducedWidth))
+    , sums_(4 * narrow_.size())
 {
-    if (picture.width <= width)
-        return picture;
-    LatLong small(width, std::max(1, width / 2));
-    double const sx = static_cast<double>(picture.width) / small.width;
-    double const sy = static_cast<double>(picture.height) / small.height;
-    for (int y = 0; y < small.height; ++y)
-        for (int x = 0; x < small.width; ++x) {
-            Sum sum;
-            for (int j = static_cast<int>(y * sy); j < picture.height && j < (y + 1) * sy; ++j) {
-                double const sine = std::sin((j + 0.5) / picture.height * kPiD);
-                double const wy = overlap(y * sy, (y + 1) * sy, j) * sine;
-                for (int i = static_cast<int>(x * sx); i < picture.width && i < (x + 1) * sx; ++i)
-                    sum.add(picture.at(i, j), wy * overlap(x * sx, (x + 1) * sx, i));
-            }
-            small.at(x, y) = sum.mean();
-        }
-    return small;
 }
 
-LatLong blurred(LatLong const& picture, float halfAngle)
+void LatLongReduction::addRow(int y, Vec4f const* texels)
 {
-    double const angle = std::clamp(static_cast<double>(halfAngle), 0.0, kPiD / 2);
-    if (angle < 2 * kPiD / picture.width)
-        return picture; // less than a texel
+    auto const fromX = static_cast<std::size_t>(width_), toX = narrow_.size();
+    std::fill(narrow_.begin(), narrow_.end(), Vec4f(0, 0, 0, 0));
+    for (std::size_t x = 0; x < fromX; ++x)
+        forAreaShares(x, fromX, toX, [&](std::size_t i, float share) {
+            narrow_[i] = narrow_[i] + texels[x] * share;
+        });
+
+    auto const row = static_cast<std::size_t>(y);
+    auto const fromY = static_cast<std::size_t>(height_);
+    auto const toY = static_cast<std::size_t>(result_.height);
+    double const sine = sineOfRow(y, height_);
+    forAreaShares(row, fromY, toY, [&](std::size_t j, float share) {
+        double const weight = static_cast<double>(share) * sine;
+        for (std::size_t i = 0; i < toX; ++i)
+            addTo(&sums_[4 * i], narrow_[i], weight);
+        weight_ += weight;
+        if (!endsArea(j, row, fromY, toY))
+            return;
+        for (std::size_t i = 0; i < toX; ++i)
+            result_.row(static_cast<int>(j))[i] = mean(&sums_[4 * i], weight_);
+        std::fill(sums_.begin(), sums_.end(), 0.0);
+        weight_ = 0;
+    });
+}
+
+bool blurShows(float halfAngle, int width)
+{
+    return static_cast<double>(halfAngle) >= 2 * kPiD / width;
+}
+
+int blurSourceWidth(float halfAngle, int width)
+{
     // Six source texels to the half-angle resolve the weight, three resolve the result.
-    LatLong const source = reduced(picture, std::max(64, static_cast<int>(12 * kPiD / angle)));
-    int const width = std::min(picture.width, std::max(64, static_cast<int>(6 * kPiD / angle)));
-    LatLong result(width, std::max(1, width / 2));
+    auto const resolved = static_cast<int>(12 * kPiD / static_cast<double>(halfAngle));
+    return std::max(64, std::min(resolved, width)) / 2 * 2;
+}
 
+LatLong blurred(LatLong const& source, float halfAngle)
+{
+    double const angle = std::min(static_cast<double>(halfAngle), kPiD / 2);
+    LatLong result(source.width / 2, std::max(1, source.height / 2));
     double const cosLimit = std::cos(angle);
+    std::vector<double> sums, weights;
     for (int y = 0; y < result.height; ++y) {
         double const theta = (y + 0.5) / result.height * kPiD;
         int const first =
             std::max(0, static_cast<int>(std::floor((theta - angle) / kPiD * source.height)));
         int const last =
             std::min(source.height - 1, static_cast<int>((theta + angle) / kPiD * source.height));
-        for (int x = 0; x < result.width; ++x) {
-            double const column = (x + 0.5) / result.width * source.width;
-            Sum sum;
-            for (int j = first; j <= last; ++j) {
-                double const t = (j + 0.5) / source.height * kPiD;
-                double const cc = std::cos(theta) * std::cos(t), ss = std::sin(theta) * std::sin(t);
-                // cosine of the angle between = cc + ss cos(difference of longitudes)
-                double const reach = std::acos(std::clamp((cosLimit - cc) / ss, -1.0, 1.0));
-                double const columns = reach / (2 * kPiD) * source.width;
-                int const from = static_cast<int>(std::floor(column - columns));
-                int const count = std::min(source.width, static_cast<int>(2 * columns) + 2);
-                for (int i = 0; i < count; ++i) {
-                    double const dphi = (from + i + 0.5 - column) / source.width * 2 * kPiD;
-                    double const weight = cc + ss * std::cos(dphi) - cosLimit;
-                    if (weight > 0)
-                        sum.add(source.at(wrapped(from + i, source.width), j),
-                                weight * std::sin(t));
+        sums.assign(4 * static_cast<std::size_t>(result.width), 0.0);
+        double total = 0;
+        for (int j = first; j <= last; ++j) {
+            double const t = (j + 0.5) / source.height * kPiD;
+            double const cc = std::cos(theta) * std::cos(t), ss = std::sin(theta) * std::sin(t);
+            // cosine of the angle between = cc + ss cos(difference of longitudes)
+            double const reach = std::acos(std::clamp((cosLimit - cc) / ss, -1.0, 1.0));
+            double const columns = reach / (2 * kPiD) * source.width;
+            int const from = static_cast<int>(std::floor(-columns));
+            int const count = std::min(source.width, static_cast<int>(2 * columns) + 2);
+            // The centre of a column of the result is an edge of the source's: one set of weights.
+            weights.clear();
+            for (int i = 0; i < count; ++i) {
+                double const dphi = (from + i + 0.5) / source.width * 2 * kPiD;
+                double const weight =
+                    std::max(0.0, cc + ss * std::cos(dphi) - cosLimit) * std::sin(t);
+                weights.push_back(weight);
+                total += weight;
+            }
+            Vec4f const* const row = source.row(j);
+            for (int x = 0; x < result.width; ++x) {
+                double* const sum = &sums[4 * static_cast<std::size_t>(x)];
+                int column = wrapped(2 * x + 1 + from, source.width);
+                for (double const weight : weights) {
+                    addTo(sum, row[column], weight);
+                    column = column + 1 == source.width ? 0 : column + 1;
                 }
             }
-            result.at(x, y) = sum.mean();
         }
+        for (int x = 0; x < result.width; ++x)
+            result.row(y)[x] = mean(&sums[4 * static_cast<std::size_t>(x)], total);
     }
     return result;
 }

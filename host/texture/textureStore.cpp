@@ -1,52 +1,20 @@
 #include "texture/textureStore.h"
 
-#include "base/error.h"
 #include "texture/latLong.h"
-#include "texture/linearInput.h"
+#include "texture/textureFootprint.h"
 
-#include <OpenImageIO/imagecache.h>
-#include <OpenImageIO/texture.h>
 #include <cmath>
 #include <map>
+#include <system_error>
 #include <zsi/vecmath.h>
 
 namespace zsi::host {
 namespace {
 
-struct TextureSystemDeleter {
-    void operator()(OIIO::TextureSystem* system) const { OIIO::TextureSystem::destroy(system); }
-};
-using TextureSystemPtr = std::unique_ptr<OIIO::TextureSystem, TextureSystemDeleter>;
-
-TextureSystemPtr newTextureSystem()
-{
-    TextureSystemPtr system(OIIO::TextureSystem::create(false));
-    system->attribute("max_memory_MB", 1024.0f);
-    system->attribute("autotile", 64);
-    return system;
-}
-
-/// Channels of a file as RGBA: grey is repeated, alpha is 1 where there is none.
-Vec4f toRgba(float const* c, int channels)
-{
-    switch (channels) {
-    case 1:
-        return {c[0], c[0], c[0], 1.0f};
-    case 2:
-        return {c[0], c[0], c[0], c[1]};
-    case 3:
-        return {c[0], c[1], c[2], 1.0f};
-    default:
-        return {c[0], c[1], c[2], c[3]};
-    }
-}
-
 class Texture2D final : public HostTexture2D {
 public:
-    Texture2D(OIIO::TextureSystem& system, OIIO::TextureSystem::TextureHandle* handle, int channels)
-        : system_(system)
-        , handle_(handle)
-        , channels_(channels < 4 ? channels : 4)
+    explicit Texture2D(TiledPicture picture)
+        : picture_(std::move(picture))
     {
     }
     void reserved0() override { }
@@ -54,23 +22,13 @@ public:
 
     void lookup(Vec4f* result, Vec2f const* uv) const override
     {
-        if (!std::isfinite(uv->x) || !std::isfinite(uv->y))
-            return;
-        OIIO::TextureOpt options;
-        options.swrap = options.twrap = OIIO::TextureOpt::WrapPeriodic;
-        options.interpmode = OIIO::TextureOpt::InterpBilinear;
-        options.mipmode = OIIO::TextureOpt::MipModeNoMIP;
-        float texel[4] = {0, 0, 0, 1};
-        // The contract hands no footprint down; samples of the pixel do the filtering.
-        if (system_.texture(handle_, system_.get_perthread_info(), options, fract(uv->x),
-                            1.0f - fract(uv->y), 0, 0, 0, 0, channels_, texel))
-            *result = toRgba(texel, channels_);
+        if (std::isfinite(uv->x) && std::isfinite(uv->y))
+            *result =
+                picture_.filtered(TextureFootprint::width(), fract(uv->x), 1.0f - fract(uv->y));
     }
 
 private:
-    OIIO::TextureSystem& system_;
-    OIIO::TextureSystem::TextureHandle* handle_;
-    int channels_;
+    TiledPicture picture_;
 };
 
 class Texture1D final : public HostTexture1D {
@@ -100,7 +58,7 @@ private:
 
 class TextureCube final : public HostTextureCube {
 public:
-    explicit TextureCube(LatLong picture)
+    explicit TextureCube(TiledPicture picture)
         : picture_(std::move(picture))
     {
     }
@@ -110,63 +68,77 @@ public:
     void lookup(Vec4f* result, Vec3f const* d) const override
     {
         if (std::isfinite(d->x) && std::isfinite(d->y) && std::isfinite(d->z))
-            *result = picture_.lookup(*d);
+            *result = lookupLatLong(picture_, *d);
     }
 
 private:
-    LatLong picture_;
+    TiledPicture picture_;
 };
 
-bool isSrgb(OIIO::ImageSpec const& spec, ColorSpace space)
-{
-    return space == ColorSpace::Srgb
-        || (space == ColorSpace::Auto && spec.format == OIIO::TypeDesc::UINT8);
-}
-
-[[noreturn]] void fail(std::filesystem::path const& file, std::string const& why)
-{
-    throw InputError(file.string() + ": cannot be read as a picture: " + why);
-}
-
-/// Whether the file is to be decoded from sRGB. Throws InputError when it is no picture.
-bool probe(std::filesystem::path const& file, ColorSpace space)
-{
-    if (!std::filesystem::exists(file))
-        throw InputError(file.string() + ": no such file");
-    auto const input = OIIO::ImageInput::open(file.string());
-    if (!input)
-        fail(file, OIIO::geterror());
-    OIIO::ImageSpec const& spec = input->spec();
-    if (spec.width < 1 || spec.height < 1 || spec.nchannels < 1 || spec.depth > 1 || spec.deep)
-        fail(file, "expected a flat picture");
-    return isSrgb(spec, space);
-}
-
-LatLong readPicture(std::filesystem::path const& file, ColorSpace space)
-{
-    LinearInput input(probe(file, space));
-    OIIO::ImageSpec spec;
-    if (!input.open(file.string(), spec))
-        fail(file, input.geterror());
-    LatLong picture(spec.width, spec.height);
-    std::vector<float> row(static_cast<std::size_t>(spec.width)
-                           * static_cast<std::size_t>(spec.nchannels));
-    for (int y = 0; y < spec.height; ++y) {
-        if (!input.read_native_scanline(0, 0, spec.y + y, spec.z, row.data()))
-            fail(file, input.geterror());
-        for (int x = 0; x < spec.width; ++x)
-            picture.at(x, y) =
-                toRgba(row.data() + std::ptrdiff_t(x) * spec.nchannels, spec.nchannels);
+/// Writes rows of an environment, evened out, as three or four channels.
+class CubeWriter {
+public:
+    CubeWriter(TexelType type, bool alpha, int width, int height, TileMemory& memory)
+        : channels_(alpha ? 4 : 3)
+        , width_(width)
+        , height_(height)
+        , writer_({type, channels_, false, alpha ? 3 : -1}, width, height, false, memory)
+        , row_(static_cast<std::size_t>(width))
+    {
     }
-    return picture;
+    void addRow(int y, Vec4f const* texels)
+    {
+        std::copy_n(texels, row_.size(), row_.begin());
+        evenOutRow(row_.data(), y, width_, height_);
+        values_.clear();
+        for (Vec4f const& v : row_) {
+            values_.insert(values_.end(), {v.x, v.y, v.z});
+            if (channels_ == 4)
+                values_.push_back(v.w);
+        }
+        writer_.addLinearRow(values_.data());
+    }
+    TiledPicture finish() { return writer_.finish(); }
+
+private:
+    int channels_, width_, height_;
+    TiledPictureWriter writer_;
+    std::vector<Vec4f> row_;
+    std::vector<float> values_;
+};
+
+TiledPicture blurredCube(PictureFile& picture, float blur, TileMemory& memory)
+{
+    LatLongReduction reduction(picture.width(), picture.height(),
+                               blurSourceWidth(blur, picture.width()));
+    picture.readLinear([&](int y, Vec4f const* texels) { reduction.addRow(y, texels); });
+    LatLong const result = blurred(reduction.result(), blur);
+    CubeWriter writer(TexelType::Float, true, result.width, result.height, memory);
+    for (int y = 0; y < result.height; ++y)
+        writer.addRow(y, result.row(y));
+    return writer.finish();
+}
+
+TiledPicture sharpCube(PictureFile& picture, TileMemory& memory)
+{
+    // Means of neighbours have finer steps than codes of 8 bits.
+    bool const isFloat = picture.format().type == TexelType::Float;
+    CubeWriter writer(isFloat ? TexelType::Float : TexelType::Half,
+                      picture.format().channels % 2 == 0, picture.width(), picture.height(),
+                      memory);
+    picture.readLinear([&](int y, Vec4f const* texels) { writer.addRow(y, texels); });
+    return writer.finish();
 }
 
 } // namespace
 
 struct TextureStore::Impl {
-    // One cache for each way of reading, so that a file may be used both ways.
-    TextureSystemPtr linear = newTextureSystem();
-    TextureSystemPtr srgb = newTextureSystem();
+    explicit Impl(TextureOptions const& options)
+        : memory(options.cacheBytes)
+    {
+    }
+
+    TileMemory memory; // before the textures, whose tiles lie in it
 
     template <class Texture>
     using Kept = std::map<std::string, std::unique_ptr<Texture>>;
@@ -183,12 +155,19 @@ struct TextureStore::Impl {
         auto const found = kept.find(key);
         if (found != kept.end())
             return found->second.get();
-        return kept.emplace(key, make()).first->second.get();
+        PictureFile picture(file, space);
+        try {
+            return kept.emplace(key, make(picture)).first->second.get();
+        } catch (std::system_error const& error) {
+            picture.fail(error.what());
+        } catch (std::bad_alloc const&) {
+            picture.fail("out of memory");
+        }
     }
 };
 
-TextureStore::TextureStore()
-    : impl_(std::make_unique<Impl>())
+TextureStore::TextureStore(TextureOptions const& options)
+    : impl_(std::make_unique<Impl>(options))
 {
 }
 
@@ -196,28 +175,22 @@ TextureStore::~TextureStore() = default;
 
 HostTexture2D const* TextureStore::load2D(std::filesystem::path const& file, ColorSpace space)
 {
-    return impl_->keep(impl_->textures2D, file, space, "", [&] {
-        bool const srgb = probe(file, space);
-        OIIO::TextureSystem& system = srgb ? *impl_->srgb : *impl_->linear;
-        OIIO::ustring const name(file.string());
-        // A cache of its own per way of reading: each file has one reader.
-        OIIO::ImageCache* const cache = system.imagecache();
-        cache->add_file(name, srgb ? LinearInput::createSrgb : LinearInput::createLinear);
-        OIIO::ImageSpec spec;
-        OIIO::TextureSystem::TextureHandle* const handle = system.get_texture_handle(name);
-        if (!handle || !cache->get_imagespec(name, spec))
-            fail(file, system.geterror());
-        return std::make_unique<Texture2D>(system, handle, spec.nchannels);
+    return impl_->keep(impl_->textures2D, file, space, "", [&](PictureFile& picture) {
+        TiledPictureWriter writer(picture.format(), picture.width(), picture.height(), true,
+                                  impl_->memory);
+        picture.readRows([&](int, std::byte const* texels) { writer.addRow(texels); });
+        return std::make_unique<Texture2D>(writer.finish());
     });
 }
 
 HostTexture1D const* TextureStore::load1D(std::filesystem::path const& file, ColorSpace space)
 {
-    return impl_->keep(impl_->textures1D, file, space, "", [&] {
-        LatLong const picture = readPicture(file, space);
-        std::vector<Vec4f> ramp(static_cast<std::size_t>(picture.width));
-        for (int x = 0; x < picture.width; ++x)
-            ramp[static_cast<std::size_t>(x)] = picture.at(x, picture.height / 2);
+    return impl_->keep(impl_->textures1D, file, space, "", [&](PictureFile& picture) {
+        std::vector<Vec4f> ramp;
+        picture.readLinear([&](int y, Vec4f const* texels) {
+            if (y == picture.height() / 2)
+                ramp.assign(texels, texels + picture.width());
+        });
         return std::make_unique<Texture1D>(std::move(ramp));
     });
 }
@@ -225,12 +198,10 @@ HostTexture1D const* TextureStore::load1D(std::filesystem::path const& file, Col
 HostTextureCube const* TextureStore::loadCube(std::filesystem::path const& file, ColorSpace space,
                                               float blur)
 {
-    return impl_->keep(impl_->cubes, file, space, std::to_string(blur), [&] {
-        LatLong picture = readPicture(file, space);
-        if (blur > 0.0f)
-            picture = blurred(picture, blur);
-        evenOutPoles(picture);
-        return std::make_unique<TextureCube>(std::move(picture));
+    return impl_->keep(impl_->cubes, file, space, std::to_string(blur), [&](PictureFile& picture) {
+        return std::make_unique<TextureCube>(blurShows(blur, picture.width())
+                                                 ? blurredCube(picture, blur, impl_->memory)
+                                                 : sharpCube(picture, impl_->memory));
     });
 }
 
@@ -238,6 +209,17 @@ HostTextureCube const* TextureStore::loadIrradiance(std::filesystem::path const&
                                                     ColorSpace space)
 {
     return loadCube(file, space, 1.57079633f);
+}
+
+std::vector<std::string> TextureStore::warnings() const
+{
+    std::size_t const overflow = impl_->memory.overflow();
+    if (overflow == 0)
+        return {};
+    return {"textures take " + std::to_string((overflow >> 20) + 1)
+            + " MB beyond their limit: no room for a scratch file in "
+            + TileMemory::scratchFolder().string()
+            + "; set TMPDIR to a folder on a disk with room"};
 }
 
 } // namespace zsi::host

@@ -1,27 +1,32 @@
 /// Textures from image files, as shaders see them.
 #pragma once
 
+#include "texture/pictureFile.h"
+
 #include <filesystem>
 #include <memory>
+#include <string>
+#include <vector>
 #include <zsi/zsi.h>
 
 namespace zsi::host {
 
-enum class ColorSpace {
-    Auto, ///< sRGB for 8-bit colour files, linear for float files
-    Linear,
-    Srgb,
+struct TextureOptions {
+    /// Bytes of pictures in memory at a time. What is beyond lies in scratch files in $TMPDIR, else
+    /// in /var/tmp.
+    std::size_t cacheBytes = std::size_t(128) << 20;
 };
 
-/// Owns every texture of a scene; the same file asked for twice is one object. Thread-safe look-ups
-/// through a shared texture cache. All `load` operations throw InputError when the file is missing
-/// or is no image.
+/// Owns every texture of a scene; the same file asked for twice is one object. Look-ups may come
+/// from any number of threads. All `load` operations read the file to its end and throw InputError
+/// that names it when it is missing, no picture, damaged or cut short.
 class TextureStore {
 public:
-    TextureStore();
+    explicit TextureStore(TextureOptions const& options = {});
     ~TextureStore();
 
-    /// v runs upwards: (0, 0) is the lower left corner of the picture. Wraps periodically.
+    /// v runs upwards: (0, 0) is the lower left corner of the picture. Wraps periodically; reads
+    /// smaller levels under a TextureFootprint.
     HostTexture2D const* load2D(std::filesystem::path const& file, ColorSpace space);
     /// A ramp along u at the middle row; clamps.
     HostTexture1D const* load1D(std::filesystem::path const& file, ColorSpace space);
@@ -33,6 +38,9 @@ public:
     /// The same picture convolved with the cosine lobe, divided by pi: what a white diffuse surface
     /// facing a direction shows.
     HostTextureCube const* loadIrradiance(std::filesystem::path const& file, ColorSpace space);
+
+    /// For a user whose pictures did not fit: what to do about it. Empty while all is well.
+    std::vector<std::string> warnings() const;
 
 private:
     struct Impl;

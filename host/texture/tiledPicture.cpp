@@ -1,0 +1,171 @@
+#include "texture/tiledPicture.h"
+
+#include "texture/areaShares.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstring>
+#include <zsi/vecmath.h>
+
+namespace zsi::host {
+namespace {
+
+int wrapped(int i, int n) { return i < 0 ? i + n : i >= n ? i - n : i; }
+
+} // namespace
+
+TiledPicture::TiledPicture(TexelFormat const& format, int width, int height, bool levels,
+                           TileMemory& memory)
+    : codec_(format)
+    , texelBytes_(format.bytes())
+{
+    std::size_t size = 0;
+    for (;; width = std::max(1, width / 2), height = std::max(1, height / 2)) {
+        auto const tiles = [](int n) { return (static_cast<std::size_t>(n) + kTileMask) / kTile; };
+        levels_.push_back({width, height, tiles(width), size});
+        size += tiles(width) * tiles(height) * kTile * kTile * texelBytes_;
+        if (!levels || (width == 1 && height == 1))
+            break;
+    }
+    block_ = memory.allocate(size);
+}
+
+Vec4f TiledPicture::bilinear(Level const& level, float s, float t) const
+{
+    float const x = s * static_cast<float>(level.width) - 0.5f;
+    float const y = t * static_cast<float>(level.height) - 0.5f;
+    float const left = std::floor(x), top = std::floor(y);
+    float const fx = x - left, fy = y - top;
+    int const x0 = wrapped(static_cast<int>(left), level.width);
+    int const x1 = wrapped(static_cast<int>(left) + 1, level.width);
+    int const y0 = wrapped(static_cast<int>(top), level.height);
+    int const y1 = wrapped(static_cast<int>(top) + 1, level.height);
+    Vec4f const above = texel(level, x0, y0) * (1.0f - fx) + texel(level, x1, y0) * fx;
+    Vec4f const below = texel(level, x0, y1) * (1.0f - fx) + texel(level, x1, y1) * fx;
+    return above * (1.0f - fy) + below * fy;
+}
+
+Vec4f TiledPicture::filtered(float width, float s, float t) const
+{
+    Level const& first = levels_.front();
+    float const texels = width * static_cast<float>(std::max(first.width, first.height));
+    if (!(texels > 1.0f))
+        return bilinear(first, s, t);
+    auto const last = static_cast<float>(levels_.size() - 1);
+    float const at = minOf(std::log2(texels), last);
+    float const below = std::floor(at), share = at - below;
+    auto const i = static_cast<std::size_t>(below);
+    Vec4f const fine = bilinear(levels_[i], s, t);
+    if (!(share > 0.0f))
+        return fine;
+    return fine * (1.0f - share) + bilinear(levels_[i + 1], s, t) * share;
+}
+
+/// One level while it is made.
+struct TiledPictureWriter::LevelWriter {
+    TiledPicture::Level level;
+    std::size_t channels;
+    int row = 0; ///< the next
+    std::vector<std::byte> tiles; ///< a row of tiles
+    std::vector<float> sums; ///< means of what has come of the row from the level above
+    std::vector<float> narrow; ///< a row of the level above at this one's width
+    std::vector<std::byte> encoded;
+
+    LevelWriter(TiledPicture::Level const& level_, TexelFormat const& format)
+        : level(level_)
+        , channels(static_cast<std::size_t>(format.channels))
+        , tiles(level.tilesAcross * TiledPicture::kTile * TiledPicture::kTile * format.bytes())
+        , sums(static_cast<std::size_t>(level.width) * channels)
+        , narrow(sums.size())
+        , encoded(sums.size() * format.channelBytes())
+    {
+    }
+
+    /// `narrow` from a row of `width` texels: means over area.
+    void makeNarrow(float const* values, int width)
+    {
+        auto const from = static_cast<std::size_t>(width);
+        auto const to = static_cast<std::size_t>(level.width);
+        if (from == 2 * to) {
+            for (std::size_t x = 0; x < to; ++x)
+                for (std::size_t c = 0; c < channels; ++c)
+                    narrow[x * channels + c] =
+                        0.5f * (values[2 * x * channels + c] + values[(2 * x + 1) * channels + c]);
+            return;
+        }
+        std::fill(narrow.begin(), narrow.end(), 0.0f);
+        for (std::size_t i = 0; i < from; ++i)
+            forAreaShares(i, from, to, [&](std::size_t x, float share) {
+                for (std::size_t c = 0; c < channels; ++c)
+                    narrow[x * channels + c] += share * values[i * channels + c];
+            });
+    }
+};
+
+TiledPictureWriter::TiledPictureWriter(TexelFormat const& format, int width, int height,
+                                       bool levels, TileMemory& memory)
+    : picture_(format, width, height, levels, memory)
+{
+    for (TiledPicture::Level const& level : picture_.levels_)
+        writers_.emplace_back(level, format);
+    linear_.resize(writers_.front().sums.size());
+}
+
+TiledPictureWriter::~TiledPictureWriter() = default;
+
+void TiledPictureWriter::addRow(std::byte const* texels)
+{
+    LevelWriter const& first = writers_.front();
+    if (writers_.size() > 1)
+        picture_.codec_.decode(texels, static_cast<std::size_t>(first.level.width), linear_.data());
+    add(0, texels, linear_.data());
+}
+
+void TiledPictureWriter::addLinearRow(float const* values)
+{
+    LevelWriter& first = writers_.front();
+    picture_.codec_.encode(values, static_cast<std::size_t>(first.level.width),
+                           first.encoded.data());
+    add(0, first.encoded.data(), values);
+}
+
+void TiledPictureWriter::add(std::size_t index, std::byte const* texels, float const* values)
+{
+    LevelWriter& writer = writers_[index];
+    TiledPicture::Level const& level = writer.level;
+    std::size_t const bytes = picture_.texelBytes_;
+    auto const row = static_cast<std::size_t>(writer.row++);
+    auto const width = static_cast<std::size_t>(level.width);
+    constexpr std::size_t kTile = TiledPicture::kTile;
+    for (std::size_t x = 0; x < width; x += kTile)
+        std::memcpy(writer.tiles.data() + (x + row % kTile) * kTile * bytes, texels + x * bytes,
+                    std::min(kTile, width - x) * bytes);
+    if (row % kTile == kTile - 1 || writer.row == level.height)
+        picture_.block_->write(level.offset + row / kTile * writer.tiles.size(),
+                               writer.tiles.data(), writer.tiles.size());
+
+    if (index + 1 == writers_.size())
+        return;
+    LevelWriter& next = writers_[index + 1];
+    next.makeNarrow(values, level.width);
+    auto const from = static_cast<std::size_t>(level.height);
+    auto const to = static_cast<std::size_t>(next.level.height);
+    forAreaShares(row, from, to, [&](std::size_t y, float share) {
+        for (std::size_t i = 0; i < next.sums.size(); ++i)
+            next.sums[i] += share * next.narrow[i];
+        if (!endsArea(y, row, from, to))
+            return; // more of it is to come
+        picture_.codec_.encode(next.sums.data(), static_cast<std::size_t>(next.level.width),
+                               next.encoded.data());
+        add(index + 1, next.encoded.data(), next.sums.data());
+        std::fill(next.sums.begin(), next.sums.end(), 0.0f);
+    });
+}
+
+TiledPicture TiledPictureWriter::finish()
+{
+    picture_.block_->seal();
+    return std::move(picture_);
+}
+
+} // namespace zsi::host
