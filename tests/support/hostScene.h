@@ -6,6 +6,7 @@
 #include "support/hostLibraries.h"
 
 #include <cmath>
+#include <cstring>
 #include <functional>
 #include <memory>
 #include <string>
@@ -39,32 +40,46 @@ inline Sky const kWhiteSky([](Vec3f) { return kWhite; });
 
 using EntryPointFunction = std::function<void(IShaderAPI*, ShadeState&)>;
 
-/// Entry points as functions; bounds a medium like glass where `ior` is not 0.
+/// A material whose entry points are functions; those that are not set are not declared. Bounds a
+/// medium like glass where `ior` is not 0. Reads every attribute.
 class Probe final : public MaterialShader {
 public:
-    Probe(EntryPointFunction shade, EntryPointFunction transmission, float ior)
-        : u_ior(ior)
-        , shade_(std::move(shade))
-        , transmission_(std::move(transmission))
-    {
-    }
+    struct Attributes {
+        Vec2f uv, uv1;
+        Vec3f tangent, bitangent;
+        Vec4f color;
+    };
+    EntryPointFunction onShade, onTransmission, onTransfer, onSample;
+    float u_ior = 0.0f;
+
     void registerShader(IShaderManager* manager) override
     {
-        manager->declareEntryPoints(this, kShade | (transmission_ ? kTransmission : 0));
+        manager->declareEntryPoints(this,
+                                    (onShade ? kShade : 0) | (onTransmission ? kTransmission : 0)
+                                        | (onTransfer ? kTransfer : 0) | (onSample ? kSample : 0));
         if (u_ior > 0.0f)
             manager->registerFloat(this, "u_ior", &u_ior);
+        manager->registerAttribute(this, kAttributeVec2f, "uv", 0);
+        manager->registerAttribute(this, kAttributeVec2f, "uv1", 8);
+        manager->registerAttribute(this, kAttributeVec3f, "tangent", 16);
+        manager->registerAttribute(this, kAttributeVec3f, "bitangent", 28);
     }
     void copy(IShaderBase const*) override { }
-    void shade(IShaderAPI* api, ShadeState& state) const override { shade_(api, state); }
+    void shade(IShaderAPI* api, ShadeState& state) const override { onShade(api, state); }
     void transmission(IShaderAPI* api, ShadeState& state) const override
     {
-        transmission_(api, state);
+        onTransmission(api, state);
     }
+    void transfer(IShaderAPI* api, ShadeState& state) const override { onTransfer(api, state); }
+    void sample(IShaderAPI* api, ShadeState& state) const override { onSample(api, state); }
 
-    float u_ior;
-
-private:
-    EntryPointFunction shade_, transmission_;
+    template <class Value>
+    static Value attribute(ShadeState const& s, std::size_t offset)
+    {
+        Value value;
+        std::memcpy(&value, s.attributes + offset, sizeof value);
+        return value;
+    }
 };
 
 inline Vec4f pixel(host::Picture const& p, int x, int y)
@@ -123,9 +138,13 @@ struct Stage {
     }
     int probe(EntryPointFunction shade, EntryPointFunction transmission = {}, float ior = 0.0f)
     {
-        return material(host::Shader(
-            "probe", std::make_unique<Probe>(std::move(shade), std::move(transmission), ior)));
+        auto p = std::make_unique<Probe>();
+        p->onShade = std::move(shade);
+        p->onTransmission = std::move(transmission);
+        p->u_ior = ior;
+        return probe(std::move(p));
     }
+    int probe(std::unique_ptr<Probe> p) { return material(host::Shader("probe", std::move(p))); }
     /// Nothing but a white diffuse layer.
     int matte(bool withOcclusion = false)
     {
