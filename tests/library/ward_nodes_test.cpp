@@ -40,9 +40,9 @@ TEST(NoiseNode, BlendsByTheNoiseValueBetweenTheThresholds)
     for (Case const& c : kCases) {
         test::ScriptedHost host;
         host.onNoise = [&](Vec4f) { return c.noise; };
-        Vec4f const got = NoiseFunctions().f_Noise(
-            &host, test::plainHit(), {0, 0}, {0, 0, 0}, {0, 1, 0.25f, 0}, {1, 0, 0.75f, 1}, c.low,
-            c.high, Mat4f::identity(), 1, c.levels, 0, c.type);
+        Vec4f const got =
+            f_Noise(&host, test::plainHit(), {0, 0}, {0, 0, 0}, {0, 1, 0.25f, 0}, {1, 0, 0.75f, 1},
+                    c.low, c.high, Mat4f::identity(), 1, c.levels, 0, c.type);
         EXPECT_FLOAT_EQ(got.x, c.want) << c.why;
         EXPECT_FLOAT_EQ(got.y, 1 - c.want) << c.why;
         EXPECT_FLOAT_EQ(got.z, 0.25f + 0.5f * c.want) << c.why;
@@ -61,8 +61,8 @@ TEST(NoiseNode, AsksForPlacedOctavesAndComesToAnEnd)
     auto const run = [&](float size, float levels) {
         asked.clear();
         constexpr Mat4f kColumns(1, 2, 3, 0, 4, 5, 6, 0, 7, 8, 9, 0, 10, 20, 30, 1);
-        NoiseFunctions().f_Noise(&host, test::plainHit(), {5, 6}, {1, 10, 100}, {}, {}, 0, 1,
-                                 kColumns, size, levels, 0.75f, 1);
+        f_Noise(&host, test::plainHit(), {5, 6}, {1, 10, 100}, {}, {}, 0, 1, kColumns, size, levels,
+                0.75f, 1);
     };
     run(2, 2);
     ASSERT_EQ(asked.size(), 2u);
@@ -80,10 +80,12 @@ TEST(NoiseNode, AsksForPlacedOctavesAndComesToAnEnd)
     }
 }
 
-TileParameters wall(float columns, float rows, float gapX, float gapY)
+struct Wall : TileShape {
+    Mat4f xform = Mat4f::identity();
+};
+Wall wall(float columns, float rows, float gapX, float gapY)
 {
-    TileParameters t;
-    t.xform = Mat4f::identity();
+    Wall t;
     t.horizontalCount = columns - gapX; // so that whole cells fill the square
     t.verticalCount = rows - gapY;
     t.horizontalGap = gapX;
@@ -91,10 +93,9 @@ TileParameters wall(float columns, float rows, float gapX, float gapY)
     return t;
 }
 
-Vec4f tileAt(test::ScriptedHost& host, TileParameters const& t, Vec2f uv, Vec2f footprint = {0, 0})
+Vec4f tileAt(test::ScriptedHost& host, Wall const& t, Vec2f uv, Vec2f footprint = {0, 0})
 {
-    return TileFunctions().f_Tile(&host, test::plainHit(), uv, {0, 0, 0}, kBrick, kMortar, t,
-                                  footprint);
+    return f_Tile(&host, test::plainHit(), uv, {0, 0, 0}, kBrick, kMortar, t, t.xform, footprint);
 }
 float redOf(Vec4f c) { return (c.x - kMortar.x) / (kBrick.x - kMortar.x); }
 
@@ -107,7 +108,7 @@ TEST(TileNode, EndsAtTheSquareUnlessItRepeats)
 {
     test::ScriptedHost host;
     test::giveNoise(host);
-    TileParameters t = wall(4, 6, 0.1f, 0.2f);
+    Wall t = wall(4, 6, 0.1f, 0.2f);
     t.colorVariance = 0.8f;
     t.randomShift = 0.4f;
     constexpr Vec4f kNothing(0, 0, 0, 0);
@@ -144,7 +145,7 @@ TEST(TileNode, EndsAtTheSquareUnlessItRepeats)
 TEST(TileNode, MortarIsTheBoxAverageOverTheFootprint)
 {
     test::ScriptedHost host;
-    TileParameters t = wall(5, 5, 0.08f, 0.15f);
+    Wall t = wall(5, 5, 0.08f, 0.15f);
     t.lineShift = -0.5f; // no bond: the pattern is a product of two axes
     constexpr float kMean = (1 - 2 * 0.08f) * (1 - 2 * 0.15f);
     test::Random random;
@@ -176,7 +177,7 @@ TEST(TileNode, HolesTakeTheirShareOfBricks)
     test::ScriptedHost host;
     test::giveNoise(host);
     constexpr int kSide = 60;
-    TileParameters t = wall(kSide, kSide, 0.1f, 0.1f);
+    Wall t = wall(kSide, kSide, 0.1f, 0.1f);
     t.edgeRoughness = 0.5f;
     t.colorVariance = 0.2f;
     struct Case {
@@ -205,7 +206,7 @@ TEST(TileNode, RoughEdgesAreDisplacedAndNothingElse)
 {
     test::ScriptedHost host;
     host.onNoise = [](Vec4f) { return 1.0f; }; // as far up and right as it goes
-    TileParameters t = wall(4, 4, 0.1f, 0.1f);
+    Wall t = wall(4, 4, 0.1f, 0.1f);
     t.lineShift = -0.5f;
     // Cells of a quarter, mortar for 0.025 at their ends.
     struct Case {

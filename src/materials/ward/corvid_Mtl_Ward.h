@@ -1,6 +1,6 @@
 #pragma once
 
-#include "materials/ward/wardFunctions.h"
+#include "materials/ward/wardMaterial.h"
 
 namespace zsi {
 
@@ -13,13 +13,11 @@ namespace zsi {
     TANGENT_ATTRIBUTES(P, U, A) \
     WARD_CHANNELS(P, U, A)
 
-class corvid_Mtl_Ward final : public MaterialShader, public WardFunctions<corvid_Mtl_Ward> {
-public:
-    SHADER(corvid_Mtl_Ward, kWardEntryPoints, WARD)
-    void shade(IShaderAPI* api, ShadeState& state) const override;
-    void transmission(IShaderAPI* api, ShadeState& state) const override;
-    void transfer(IShaderAPI* api, ShadeState& state) const override;
-    void sample(IShaderAPI* api, ShadeState& state) const override;
+struct WardFields : MaterialShader {
+    SHADER(WardFields, kWardEntryPoints, WARD)
 };
+extern template class WardMaterial<WardFields>;
+
+class corvid_Mtl_Ward final : public WardMaterial<WardFields> { };
 
 } // namespace zsi

@@ -2,6 +2,17 @@
 
 namespace zsi {
 
-WARD_VARIANT_DEFINITIONS(corvid_Mtl_Ward_5592d496)
+Vec4f WardFields_5592d496::normal0_map(NetworkSite const& at) const
+{
+    return BITMAP_VALUE(at, _ward_normal0_map);
+}
+
+Vec4f WardFields_5592d496::diffuse_color(NetworkSite const& at) const
+{
+    return NOISE_VALUE(at, _ward_diffuse_color, BITMAP_VALUE(at, _ward_diffuse_color_Noise_color1),
+                       BITMAP_VALUE(at, _ward_diffuse_color_Noise_color2));
+}
+
+template class WardMaterial<WardFields_5592d496>;
 
 } // namespace zsi

@@ -4,19 +4,22 @@
 
 namespace zsi {
 
-namespace network {
-struct Ward_5592d496 : NoNetwork {
-    using normal0_map = Bitmap<0>;
-    using diffuse_color = Noise<3, Bitmap<1>, Bitmap<2>>;
-};
-} // namespace network
-
 /// Ward surface whose diffuse colour is two pictures blended by a noise, with a picture as bump.
-class corvid_Mtl_Ward_5592d496 final
-    : public WardVariant<corvid_Mtl_Ward_5592d496, network::Ward_5592d496>,
-      public NoiseFunctions {
-public:
-    WARD_VARIANT_ENTRY_POINTS
+#define WARD_5592D496(P, U, A)                       \
+    WARD_VARIANT_FRONT(P, U, A)                      \
+    BITMAP_ROWS(U, _ward_normal0_map)                \
+    BITMAP_ROWS(U, _ward_diffuse_color_Noise_color1) \
+    BITMAP_ROWS(U, _ward_diffuse_color_Noise_color2) \
+    NOISE_ROWS(U, _ward_diffuse_color)               \
+    WARD_VARIANT_BACK(P, U, A)
+
+struct WardFields_5592d496 : MaterialShader {
+    SHADER(WardFields_5592d496, kWardEntryPoints, WARD_5592D496)
+    Vec4f normal0_map(NetworkSite const& at) const;
+    Vec4f diffuse_color(NetworkSite const& at) const;
 };
+extern template class WardMaterial<WardFields_5592d496>;
+
+class corvid_Mtl_Ward_5592d496 final : public WardMaterial<WardFields_5592d496> { };
 
 } // namespace zsi

@@ -4,17 +4,18 @@
 
 namespace zsi {
 
-namespace network {
-struct Ward_5ba0bfff : NoNetwork {
-    using normal0_map = PlainNoise<0>;
-};
-} // namespace network
-
 /// Ward surface with a bump of noise: hammered, cast or rippled.
-class corvid_Mtl_Ward_5ba0bfff final
-    : public WardVariant<corvid_Mtl_Ward_5ba0bfff, network::Ward_5ba0bfff> {
-public:
-    WARD_VARIANT_ENTRY_POINTS
+#define WARD_5BA0BFFF(P, U, A)             \
+    WARD_VARIANT_FRONT(P, U, A)            \
+    COLOR_NOISE_ROWS(U, _ward_normal0_map) \
+    WARD_VARIANT_BACK(P, U, A)
+
+struct WardFields_5ba0bfff : MaterialShader {
+    SHADER(WardFields_5ba0bfff, kWardEntryPoints, WARD_5BA0BFFF)
+    Vec4f normal0_map(NetworkSite const& at) const;
 };
+extern template class WardMaterial<WardFields_5ba0bfff>;
+
+class corvid_Mtl_Ward_5ba0bfff final : public WardMaterial<WardFields_5ba0bfff> { };
 
 } // namespace zsi

@@ -4,19 +4,22 @@
 
 namespace zsi {
 
-namespace network {
-struct Ward_82261344 : NoNetwork {
-    using cutout_map = Bitmap<0>;
-    using diffuse_color = Noise<1, Bitmap<2>, Bitmap<3>>;
-};
-} // namespace network
-
 /// Ward surface whose diffuse colour is two pictures blended by a noise, cut out by a picture.
-class corvid_Mtl_Ward_82261344 final
-    : public WardVariant<corvid_Mtl_Ward_82261344, network::Ward_82261344>,
-      public NoiseFunctions {
-public:
-    WARD_VARIANT_ENTRY_POINTS
+#define WARD_82261344(P, U, A)                       \
+    WARD_VARIANT_FRONT(P, U, A)                      \
+    BITMAP_ROWS(U, _ward_cutout_map)                 \
+    NOISE_ROWS(U, _ward_diffuse_color)               \
+    BITMAP_ROWS(U, _ward_diffuse_color_Noise_color1) \
+    BITMAP_ROWS(U, _ward_diffuse_color_Noise_color2) \
+    WARD_VARIANT_BACK(P, U, A)
+
+struct WardFields_82261344 : MaterialShader {
+    SHADER(WardFields_82261344, kWardEntryPoints, WARD_82261344)
+    Vec4f cutout_map(NetworkSite const& at) const;
+    Vec4f diffuse_color(NetworkSite const& at) const;
 };
+extern template class WardMaterial<WardFields_82261344>;
+
+class corvid_Mtl_Ward_82261344 final : public WardMaterial<WardFields_82261344> { };
 
 } // namespace zsi

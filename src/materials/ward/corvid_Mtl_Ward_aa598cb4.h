@@ -4,19 +4,24 @@
 
 namespace zsi {
 
-namespace network {
-struct Ward_aa598cb4 : NoNetwork {
-    using normal0_map = Noise<2, Bitmap<0>, Bitmap<1>>;
-    using diffuse_color = Noise<5, Bitmap<3>, Bitmap<4>>;
-};
-} // namespace network
-
 /// Ward surface whose diffuse colour and bump are each two pictures blended by a noise.
-class corvid_Mtl_Ward_aa598cb4 final
-    : public WardVariant<corvid_Mtl_Ward_aa598cb4, network::Ward_aa598cb4>,
-      public NoiseFunctions {
-public:
-    WARD_VARIANT_ENTRY_POINTS
+#define WARD_AA598CB4(P, U, A)                       \
+    WARD_VARIANT_FRONT(P, U, A)                      \
+    BITMAP_ROWS(U, _ward_normal0_map_Noise_color1)   \
+    BITMAP_ROWS(U, _ward_normal0_map_Noise_color2)   \
+    NOISE_ROWS(U, _ward_normal0_map)                 \
+    BITMAP_ROWS(U, _ward_diffuse_color_Noise_color1) \
+    BITMAP_ROWS(U, _ward_diffuse_color_Noise_color2) \
+    NOISE_ROWS(U, _ward_diffuse_color)               \
+    WARD_VARIANT_BACK(P, U, A)
+
+struct WardFields_aa598cb4 : MaterialShader {
+    SHADER(WardFields_aa598cb4, kWardEntryPoints, WARD_AA598CB4)
+    Vec4f normal0_map(NetworkSite const& at) const;
+    Vec4f diffuse_color(NetworkSite const& at) const;
 };
+extern template class WardMaterial<WardFields_aa598cb4>;
+
+class corvid_Mtl_Ward_aa598cb4 final : public WardMaterial<WardFields_aa598cb4> { };
 
 } // namespace zsi

@@ -4,20 +4,26 @@
 
 namespace zsi {
 
-namespace network {
-struct Ward_b9aac246 : NoNetwork {
-    using normal0_map = Bitmap<0>;
-    using diffuse_color = Noise<5, Tile<6, Bitmap<1>, Bitmap<2>>, Tile<7, Bitmap<3>, Bitmap<4>>>;
-};
-} // namespace network
-
 /// Ward surface of two kinds of brickwork of pictures, blended by a noise, with a picture as bump.
-class corvid_Mtl_Ward_b9aac246 final
-    : public WardVariant<corvid_Mtl_Ward_b9aac246, network::Ward_b9aac246>,
-      public NoiseFunctions,
-      public TileFunctions {
-public:
-    WARD_VARIANT_ENTRY_POINTS
+#define WARD_B9AAC246(P, U, A)                                        \
+    WARD_VARIANT_FRONT(P, U, A)                                       \
+    BITMAP_ROWS(U, _ward_normal0_map)                                 \
+    BITMAP_ROWS(U, _ward_diffuse_color_Noise_color1_Tile_brickColor)  \
+    BITMAP_ROWS(U, _ward_diffuse_color_Noise_color1_Tile_mortarColor) \
+    BITMAP_ROWS(U, _ward_diffuse_color_Noise_color2_Tile_brickColor)  \
+    BITMAP_ROWS(U, _ward_diffuse_color_Noise_color2_Tile_mortarColor) \
+    NOISE_ROWS(U, _ward_diffuse_color)                                \
+    TILE_ROWS(U, _ward_diffuse_color_Noise_color1)                    \
+    TILE_ROWS(U, _ward_diffuse_color_Noise_color2)                    \
+    WARD_VARIANT_BACK(P, U, A)
+
+struct WardFields_b9aac246 : MaterialShader {
+    SHADER(WardFields_b9aac246, kWardEntryPoints, WARD_B9AAC246)
+    Vec4f normal0_map(NetworkSite const& at) const;
+    Vec4f diffuse_color(NetworkSite const& at) const;
 };
+extern template class WardMaterial<WardFields_b9aac246>;
+
+class corvid_Mtl_Ward_b9aac246 final : public WardMaterial<WardFields_b9aac246> { };
 
 } // namespace zsi

@@ -4,18 +4,20 @@
 
 namespace zsi {
 
-namespace network {
-struct Ward_ccb3a2e6 : NoNetwork {
-    using diffuse_color = Noise<0, Bitmap<1>, Bitmap<2>>;
-};
-} // namespace network
-
 /// Ward surface whose diffuse colour is two pictures blended by a noise.
-class corvid_Mtl_Ward_ccb3a2e6 final
-    : public WardVariant<corvid_Mtl_Ward_ccb3a2e6, network::Ward_ccb3a2e6>,
-      public NoiseFunctions {
-public:
-    WARD_VARIANT_ENTRY_POINTS
+#define WARD_CCB3A2E6(P, U, A)                       \
+    WARD_VARIANT_FRONT(P, U, A)                      \
+    NOISE_ROWS(U, _ward_diffuse_color)               \
+    BITMAP_ROWS(U, _ward_diffuse_color_Noise_color1) \
+    BITMAP_ROWS(U, _ward_diffuse_color_Noise_color2) \
+    WARD_VARIANT_BACK(P, U, A)
+
+struct WardFields_ccb3a2e6 : MaterialShader {
+    SHADER(WardFields_ccb3a2e6, kWardEntryPoints, WARD_CCB3A2E6)
+    Vec4f diffuse_color(NetworkSite const& at) const;
 };
+extern template class WardMaterial<WardFields_ccb3a2e6>;
+
+class corvid_Mtl_Ward_ccb3a2e6 final : public WardMaterial<WardFields_ccb3a2e6> { };
 
 } // namespace zsi

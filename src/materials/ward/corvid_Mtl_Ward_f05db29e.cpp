@@ -2,6 +2,18 @@
 
 namespace zsi {
 
-WARD_VARIANT_DEFINITIONS(corvid_Mtl_Ward_f05db29e)
+Vec4f WardFields_f05db29e::normal0_map(NetworkSite const& at) const
+{
+    return BITMAP_VALUE(at, _ward_normal0_map);
+}
+
+Vec4f WardFields_f05db29e::diffuse_color(NetworkSite const& at) const
+{
+    return TILE_VALUE(at, _ward_diffuse_color,
+                      BITMAP_VALUE(at, _ward_diffuse_color_Tile_brickColor),
+                      BITMAP_VALUE(at, _ward_diffuse_color_Tile_mortarColor));
+}
+
+template class WardMaterial<WardFields_f05db29e>;
 
 } // namespace zsi

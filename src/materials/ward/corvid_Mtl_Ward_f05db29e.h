@@ -4,19 +4,22 @@
 
 namespace zsi {
 
-namespace network {
-struct Ward_f05db29e : NoNetwork {
-    using normal0_map = Bitmap<0>;
-    using diffuse_color = Tile<1, Bitmap<2>, Bitmap<3>>;
-};
-} // namespace network
-
 /// Ward surface of brickwork: pictures for bricks and mortar, and one as bump.
-class corvid_Mtl_Ward_f05db29e final
-    : public WardVariant<corvid_Mtl_Ward_f05db29e, network::Ward_f05db29e>,
-      public TileFunctions {
-public:
-    WARD_VARIANT_ENTRY_POINTS
+#define WARD_F05DB29E(P, U, A)                           \
+    WARD_VARIANT_FRONT(P, U, A)                          \
+    BITMAP_ROWS(U, _ward_normal0_map)                    \
+    TILE_ROWS(U, _ward_diffuse_color)                    \
+    BITMAP_ROWS(U, _ward_diffuse_color_Tile_brickColor)  \
+    BITMAP_ROWS(U, _ward_diffuse_color_Tile_mortarColor) \
+    WARD_VARIANT_BACK(P, U, A)
+
+struct WardFields_f05db29e : MaterialShader {
+    SHADER(WardFields_f05db29e, kWardEntryPoints, WARD_F05DB29E)
+    Vec4f normal0_map(NetworkSite const& at) const;
+    Vec4f diffuse_color(NetworkSite const& at) const;
 };
+extern template class WardMaterial<WardFields_f05db29e>;
+
+class corvid_Mtl_Ward_f05db29e final : public WardMaterial<WardFields_f05db29e> { };
 
 } // namespace zsi

@@ -56,10 +56,9 @@ float blendWeight(float v, float low, float high)
 
 } // namespace
 
-Vec4f NoiseFunctions::f_Noise(IShaderAPI* api, ShadeState const&, Vec2f, Vec3f p, Vec4f color1,
-                              Vec4f color2, float thresholdLow, float thresholdHigh,
-                              Mat4f const& xform, float size, float levels, float phase,
-                              int type) const
+Vec4f f_Noise(IShaderAPI* api, ShadeState const&, Vec2f, Vec3f p, Vec4f color1, Vec4f color2,
+              float thresholdLow, float thresholdHigh, Mat4f const& xform, float size, float levels,
+              float phase, int type)
 {
     Vec3f const placed = transformPoint(xform, p);
     Vec3f const q = size != 0.0f ? placed / size : placed;

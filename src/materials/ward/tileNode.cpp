@@ -73,10 +73,10 @@ float variation(float random, float spread)
 
 } // namespace
 
-Vec4f TileFunctions::f_Tile(IShaderAPI* api, ShadeState const&, Vec2f uv, Vec3f, Vec4f brickColor,
-                            Vec4f mortarColor, TileParameters const& tile, Vec2f footprint) const
+Vec4f f_Tile(IShaderAPI* api, ShadeState const&, Vec2f uv, Vec3f, Vec4f brickColor,
+             Vec4f mortarColor, TileShape const& tile, Mat4f const& xform, Vec2f footprint)
 {
-    Vec3f const placed = transformPoint(tile.xform, {uv.x, uv.y, 1.0f});
+    Vec3f const placed = transformPoint(xform, {uv.x, uv.y, 1.0f});
     float s = placed.x;
     float t = placed.y;
     if (!intoSquare(s, tile.repeatX) || !intoSquare(t, tile.repeatY))
@@ -112,9 +112,8 @@ Vec4f TileFunctions::f_Tile(IShaderAPI* api, ShadeState const&, Vec2f uv, Vec3f,
     if (fract(rows * 0.5f) > 0.5f)
         columns += tile.lineShift + 0.5f;
 
-    Mat4f const& m = tile.xform;
-    float const ds = std::fabs(m.m[0]) * footprint.x + std::fabs(m.m[4]) * footprint.y;
-    float const dt = std::fabs(m.m[1]) * footprint.x + std::fabs(m.m[5]) * footprint.y;
+    float const ds = std::fabs(xform.m[0]) * footprint.x + std::fabs(xform.m[4]) * footprint.y;
+    float const dt = std::fabs(xform.m[1]) * footprint.x + std::fabs(xform.m[5]) * footprint.y;
     float mask = brickCoverage(fract(columns), tile.horizontalGap, ds / std::fabs(cellWidth))
         * brickCoverage(fract(rows), tile.verticalGap, dt / std::fabs(cellHeight));
 

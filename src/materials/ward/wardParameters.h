@@ -5,6 +5,8 @@
 
 namespace zsi {
 
+inline constexpr int kWardEntryPoints = kShade | kTransmission | kTransfer | kSample;
+
 /// The channels, 90 rows. A scalar map is read in its red channel; where a map is on, it times its
 /// amount replaces the plain value. Transforms take the uv attribute to map coordinates.
 #define WARD_CHANNELS(P, U, A)                                                                    \
