@@ -2,12 +2,24 @@
 
 #include "materials/physical/paintLobe.h"
 #include "materials/physical/shared/indirectDiffuse.h"
-#include "materials/physical/shared/lightFade.h"
 #include "materials/physical/shared/proceduralNormal.h"
 #include "materials/physical/shared/textureChannel.h"
 #include "runtime/builtins.h"
 
+#include <optional>
+
 namespace zsi {
+namespace {
+
+constexpr PaintLayers kAllLayers{true, true, true};
+
+} // namespace
+
+/// A drawn direction: value, cosine on the base and reciprocal density.
+struct corvid_Mtl_MetallicPaint::Event {
+    Vec3f direction, value;
+    float cosine, invPdf;
+};
 
 void corvid_Mtl_MetallicPaint::f_computeShadingFrame(IShaderAPI* api, ShadeState const& state,
                                                      Vec3f const& P, Vec3f const& N,
@@ -23,7 +35,7 @@ void corvid_Mtl_MetallicPaint::f_computeShadingFrame(IShaderAPI* api, ShadeState
 /// Orthonormal frames of the lobes. Where the peel turns the coat away from the viewer, it is
 /// taken as level: a silhouette has no black rim.
 PaintFrames corvid_Mtl_MetallicPaint::frames(IShaderAPI* api, ShadeState const& state,
-                                             Vec3f const& Nf) const
+                                             Vec3f const& Nf, Vec3f const& V) const
 {
     PaintFrames f;
     f_computeShadingFrame(api, state, state.P, Nf, Mat3f(state.objectToWorld), f.base, f.coat);
@@ -34,7 +46,7 @@ PaintFrames corvid_Mtl_MetallicPaint::frames(IShaderAPI* api, ShadeState const& 
         f.coat = {{kBlack, kBlack, normalize(f.coat[2])}};
         orthonormalTangent(f.coat);
         constexpr float kLeastCosine = 0.01f;
-        if (dot(f.coat[2], -state.I) > kLeastCosine)
+        if (dot(f.coat[2], V) > kLeastCosine)
             return f;
     }
     f.coat = f.base;
@@ -43,25 +55,34 @@ PaintFrames corvid_Mtl_MetallicPaint::frames(IShaderAPI* api, ShadeState const& 
 
 FlakeFootprint corvid_Mtl_MetallicPaint::footprint(IShaderAPI* api, ShadeState const& state) const
 {
-    FlakeRecipe const flakes{u_flakeSize, saturate(u_flakeDensity), saturate(u_flakeSpread),
-                             saturate(u_flakeRoughValue, 0.01f, 1.0f)};
-    // Gathered light has no pixel that could show flakes.
-    if (flakes.density == 0.0f || !(flakes.size > 0.0f) || state.rayType == kRayDiffuse)
+    constexpr float kLeastDensity = 1e-6f;
+    FlakeRecipe flakes{u_flakeSize, saturate(u_flakeDensity), saturate(u_flakeSpread),
+                       saturate(u_flakeRoughValue, 0.01f, 1.0f)};
+    if (flakes.density < kLeastDensity)
+        flakes.density = 0.0f;
+    // Of all rays but the camera's the record tells neither width nor way so far: they may be any
+    // lobe's, and see the flakes' mean.
+    bool const camera = state.rayType == kRayCamera && state.rayDepth == 0;
+    if (flakes.density == 0.0f || !(flakes.size > 0.0f) || !camera)
         return FlakeFootprint(flakes);
     // Flakes stick to the object and have their size in the world.
     float const* m = state.objectToWorld.m;
     Vec3f const axes[3] = {{m[0], m[1], m[2]}, {m[4], m[5], m[6]}, {m[8], m[9], m[10]}};
     float const scale =
         std::sqrt((dot(axes[0], axes[0]) + dot(axes[1], axes[1]) + dot(axes[2], axes[2])) / 3.0f);
-    Vec3f const p = state.Pref * (scale / flakes.size);
-    // The record has no ray differentials: a pixel is taken as 1/1000 rad from the ray's origin,
-    // some 1000 pixels across a usual view, stretched along the surface at grazing angles.
-    constexpr float kPixelAngle = 0.001f, kLeastCosine = 0.05f;
-    float const width = length(state.P - state.E) * kPixelAngle / flakes.size;
+    // The record has no field of view: the picture is taken to open 40 degrees upwards, and a pixel
+    // to be square, stretched along the surface at grazing angles.
+    constexpr float kPictureHeight = 0.72794047f; // 2 tan 20 degrees, at distance 1
+    constexpr float kLeastCosine = 0.05f;
+    float const pixels = state.imageHeight > 0 ? static_cast<float>(state.imageHeight) : 1000.0f;
+    float const width = length(state.P - state.E) * (kPictureHeight / pixels) / flakes.size;
     float const cosine = maxOf(std::fabs(dot(state.I, state.Ng)), kLeastCosine);
-    SLArray<Vec3f> along{{kBlack, kBlack, state.Nref}};
-    orthonormalTangent(along);
-    return {flakes, api, p, along[0], along[1], width * width / cosine};
+    FlakePlace const place{state.Pref * (scale / flakes.size), std::floor(state.rasterX),
+                           std::floor(state.rasterY), width, width * width / cosine};
+    // A size that leaves no room for numbers.
+    if (!(place.underneath < 1e30f && dot(place.p, place.p) < 1e30f))
+        return FlakeFootprint(flakes);
+    return {flakes, api, place};
 }
 
 PaintColors corvid_Mtl_MetallicPaint::colors(ShadeState const& state) const
@@ -82,67 +103,95 @@ float corvid_Mtl_MetallicPaint::coatWidth(ShadeState const& state) const
         ? mappedValue(u_coatRoughMap, u_coatRoughTransform, u_coatRoughAmount, attribute_uv(state))
         : u_coatRoughValue;
     // A highlight of a twentieth of a degree is a mirror's, and still has a finite density.
-    return saturate(width, 0.001f, 0.5f);
+    return saturate(width, ClearCoat::kLeastWidth, ClearCoat::kMostWidth);
 }
 
-/// Nf: the normal as faced by V, the direction to the viewer.
-inline PaintLobe corvid_Mtl_MetallicPaint::lobe(IShaderAPI* api, ShadeState const& state,
-                                                Vec3f const& Nf, Vec3f const& V) const
+/// The paint as this ray meets it; none where the ray runs along the surface.
+/// Nf: the normal on the ray's side, by Ng.
+inline std::optional<PaintLobe> corvid_Mtl_MetallicPaint::lobe(IShaderAPI* api,
+                                                               ShadeState const& state) const
 {
-    return {colors(state),          footprint(api, state),
-            frames(api, state, Nf), saturate(u_coatReflectivity),
-            coatWidth(state),       V};
+    float const side = -facingSign(state.I, state.Ng);
+    if (side == 0.0f)
+        return std::nullopt;
+    Vec3f const Nf = state.N * side;
+    // An interpolated normal that faces away is seen at grazing incidence.
+    constexpr float kLeastCosine = 1e-4f;
+    Vec3f V = -state.I;
+    float const cosine = dot(Nf, V);
+    if (!(cosine > kLeastCosine))
+        V = normalize(V + Nf * (kLeastCosine - cosine));
+    return PaintLobe(colors(state), footprint(api, state), frames(api, state, Nf, V),
+                     saturate(u_coatReflectivity), coatWidth(state), V, state.Ng * side,
+                     u_finish == 1 || !(state.N == state.Ng));
+}
+
+/// Draws a direction of some layers; none below the surface, where no light comes from either.
+bool corvid_Mtl_MetallicPaint::draw(IShaderAPI* api, PaintLobe const& paint, PaintLayers layers,
+                                    Event& event)
+{
+    float const pick = api->random();
+    event.direction = paint.direction(pick, api->random2D(), layers);
+    if (!paint.lights(event.direction, event.cosine))
+        return false;
+    PaintLobe::Value const value = paint(event.direction, layers);
+    constexpr float kLeastDensity = 1e-30f; // its reciprocal is a number
+    if (!(value.pdf > kLeastDensity))
+        return false;
+    event.value = value.under + grey(value.coat);
+    event.invPdf = 1.0f / value.pdf;
+    return true;
+}
+
+/// What is seen along a drawn direction.
+Vec3f corvid_Mtl_MetallicPaint::traced(IShaderAPI* api, ShadeState const& state,
+                                       PaintLobe const& paint, PaintLayers layers)
+{
+    Event event;
+    if (!draw(api, paint, layers, event))
+        return kBlack;
+    Vec3f const weight = event.value * (event.cosine * event.invPdf);
+    if (weight == kBlack)
+        return kBlack;
+    return api->traceSpecular(&state.P, &event.direction, 0.0f, maxComponent(weight)) * weight;
 }
 
 void corvid_Mtl_MetallicPaint::f_calculateColors(IShaderAPI* api, ShadeState const& state,
                                                  PhysicalColors& out) const
 {
-    float const side = -facingSign(state.I, state.Ng);
-    Vec3f const Ngf = state.Ng * side;
-    Vec3f const Nf = state.N * side;
-    Vec3f V = -state.I;
-    bool const seen = dot(Nf, V) > 0.0f;
-    if (!seen) // an interpolated normal that faces away still mirrors, at grazing incidence
-        V = V - Nf * dot(Nf, V);
-    PaintLobe const paint = lobe(api, state, Nf, V);
-    PaintFrames const& f = paint.frames();
-    Vec3f const& N = f.base[2];
+    std::optional<PaintLobe> const seen = lobe(api, state);
+    if (!seen)
+        return;
+    PaintLobe const& paint = *seen;
+    Vec3f const& N = paint.frames().base[2];
 
-    if (seen)
-        for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
-             light = light->next) {
-            float const fade = lightFade(dot(light->L, Ngf));
-            if (fade == 0.0f || !(dot(N, light->L) > 0.0f))
-                continue;
-            PaintLobe::Value const value = paint(light->L, false);
-            Vec3f const arriving = light->color * light->shadow * (light->weight * fade);
-            out.lit += arriving * value.under;
-            out.highlight += arriving * value.coat;
-        }
-
-    out.reflectionWeight = grey(paint.coatAlbedo());
-    if (paint.coatAlbedo() > 0.0f) {
-        Vec3f const R = f_safe_reflect(api, state, state.I, Ngf, f.coat[2]);
-        out.reflection = api->traceSpecular(&state.P, &R, paint.coatWidth(), paint.coatAlbedo())
-            * paint.coatAlbedo();
-    }
-    if (paint.flakeCoverage() > 0.0f) {
-        // One of the flakes in view, so that each shows its own part of the surroundings.
-        FlakeFootprint::Pick const flake = paint.pickFlake(api->random());
-        Vec3f const n = normalize(toWorld(f.base, Vec3f(flake.slope.x, flake.slope.y, 1.0f)));
-        Vec3f const weight = paint.flakeAlbedo(clamp01(-dot(n, state.I)));
-        if (!(weight == kBlack)) {
-            Vec3f const R = f_safe_reflect(api, state, state.I, Ngf, n);
-            out.reflection +=
-                api->traceSpecular(&state.P, &R, flake.width, maxComponent(weight)) * weight;
-            out.reflectionWeight += weight;
-        }
+    for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
+         light = light->next) {
+        float cosine;
+        if (!paint.lights(light->L, cosine))
+            continue;
+        PaintLobe::Value const value = paint(light->L, kAllLayers);
+        // A light of colour 1 brings the irradiance pi.
+        Vec3f const arriving = light->color * light->shadow * (light->weight * kPi);
+        out.lit += arriving * value.under;
+        out.highlight += arriving * value.coat;
     }
 
-    // Ambient light has no direction: flakes and base return it alike.
-    out.indirectWeight = paint.baseAlbedo() + paint.flakeAlbedo(1.0f);
-    out.indirect =
+    // Coat and flakes mirror what their lobes see, each by a direction of its own.
+    out.reflectionWeight = grey(paint.coatAlbedo()) + paint.flakeAlbedo();
+    if (paint.coatAlbedo() > 0.0f)
+        out.reflection = traced(api, state, paint, {true, false, false});
+    if (!(paint.flakeAlbedo() == kBlack))
+        out.reflection += traced(api, state, paint, {false, false, true});
+
+    // The base gathers. Gathered rays know what stands in their way, ambient light does not.
+    out.indirectWeight = paint.baseAlbedo();
+    if (out.indirectWeight == kBlack)
+        return;
+    Vec3f const ambient =
         occludedDiffuse(api, out.indirectWeight, api->ambientLight(&state.P, &N), state.P, N);
+    out.indirect = ambient
+        + api->indirectDiffuse(&state.P, &N, maxComponent(out.indirectWeight)) * out.indirectWeight;
 }
 
 void corvid_Mtl_MetallicPaint::shade(IShaderAPI* api, ShadeState& state) const
@@ -152,15 +201,13 @@ void corvid_Mtl_MetallicPaint::shade(IShaderAPI* api, ShadeState& state) const
 
 void corvid_Mtl_MetallicPaint::transfer(IShaderAPI* api, ShadeState& state) const
 {
-    Vec3f const Nf = -state.N * facingSign(state.I, state.Ng);
-    float const cosine = dot(Nf, state.sampleDirection);
-    if (!(dot(Nf, state.I) < 0.0f && cosine > 0.0f)) {
-        state.outBrdf = kBlack;
-        state.sampleCosine = 0.0f;
+    state.outBrdf = kBlack;
+    state.sampleCosine = 0.0f;
+    std::optional<PaintLobe> const paint = lobe(api, state);
+    float cosine;
+    if (!paint || !paint->lights(state.sampleDirection, cosine))
         return;
-    }
-    PaintLobe const paint = lobe(api, state, Nf, -state.I);
-    PaintLobe::Value const value = paint(state.sampleDirection, false);
+    PaintLobe::Value const value = (*paint)(state.sampleDirection, kAllLayers);
     state.outBrdf = value.under + grey(value.coat);
     state.sampleCosine = cosine;
 }
@@ -168,24 +215,18 @@ void corvid_Mtl_MetallicPaint::transfer(IShaderAPI* api, ShadeState& state) cons
 void corvid_Mtl_MetallicPaint::sample(IShaderAPI* api, ShadeState& state) const
 {
     state.sampleType = kSampleNone;
-    Vec3f const Nf = -state.N * facingSign(state.I, state.Ng);
-    if (!anySwitch(state.allowReflection) || !(dot(Nf, state.I) < 0.0f))
+    if (!anySwitch(state.allowReflection))
         return;
     // The third switch alone asks for what mirrors: coat and flakes.
     bool const glossyOnly = !(state.allowReflection[0] | state.allowReflection[1]);
-    PaintLobe const paint = lobe(api, state, Nf, -state.I);
-    float const pick = api->random();
-    Vec3f const direction = paint.sample(pick, api->random2D(), glossyOnly);
-    float const cosine = dot(Nf, direction);
-    if (!(cosine > 0.0f))
+    std::optional<PaintLobe> const paint = lobe(api, state);
+    Event event;
+    if (!paint || !draw(api, *paint, {true, !glossyOnly, true}, event))
         return;
-    PaintLobe::Value const value = paint(direction, glossyOnly);
-    if (!(value.pdf > 0.0f))
-        return;
-    state.sampleDirection = direction;
-    state.outBrdf = value.under + grey(value.coat);
-    state.sampleCosine = cosine;
-    state.sampleInvPdf = 1.0f / value.pdf;
+    state.sampleDirection = event.direction;
+    state.outBrdf = event.value;
+    state.sampleCosine = event.cosine;
+    state.sampleInvPdf = event.invPdf;
     state.sampleType = glossyOnly ? kSampleStraight : kSampleMixture;
 }
 

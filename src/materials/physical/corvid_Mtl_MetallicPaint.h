@@ -3,6 +3,8 @@
 #include "materials/physical/shared/materialSkeleton.h"
 #include "materials/physical/shared/safeReflect.h"
 
+#include <optional>
+
 namespace zsi {
 
 /// Car paint: a coloured base, metal or pearl flakes over a part of it, and a clear coat that may
@@ -38,6 +40,7 @@ class FlakeFootprint;
 class PaintLobe;
 struct PaintColors;
 struct PaintFrames;
+struct PaintLayers;
 
 class corvid_Mtl_MetallicPaint final : public MaterialShader,
                                        public PhysicalShading<corvid_Mtl_MetallicPaint>,
@@ -58,11 +61,16 @@ public:
                                SLArray<Vec3f>& peelFrame) const;
 
 private:
-    PaintFrames frames(IShaderAPI* api, ShadeState const& state, Vec3f const& Nf) const;
+    struct Event;
+    static bool draw(IShaderAPI* api, PaintLobe const& paint, PaintLayers layers, Event& event);
+    static Vec3f traced(IShaderAPI* api, ShadeState const& state, PaintLobe const& paint,
+                        PaintLayers layers);
+    PaintFrames frames(IShaderAPI* api, ShadeState const& state, Vec3f const& Nf,
+                       Vec3f const& V) const;
     FlakeFootprint footprint(IShaderAPI* api, ShadeState const& state) const;
     PaintColors colors(ShadeState const& state) const;
     float coatWidth(ShadeState const& state) const;
-    PaintLobe lobe(IShaderAPI* api, ShadeState const& state, Vec3f const& Nf, Vec3f const& V) const;
+    std::optional<PaintLobe> lobe(IShaderAPI* api, ShadeState const& state) const;
 };
 
 } // namespace zsi

@@ -4,16 +4,21 @@
 /// a gloss of its own; both are Gaussian, so that many flakes together are one lobe whose squared
 /// width is the sum of theirs (Olano and Baker 2010, "LEAN Mapping"). A footprint of n flakes is
 /// their mean, as in Jakob et al. 2014, "Discrete Stochastic Microfacet Models"; the contrast that
-/// n flakes have left, 1/sqrt(n), is what is told apart here, and the rest is the crowd.
+/// n flakes have left is what is resolved here, and the rest is the crowd.
 ///
-/// Flakes come in opposite pairs, like the walls of the grooves of Torrance and Sparrow 1967: each
-/// patch then is level on average, and keeps its own balance of light whatever its slope.
+/// Flakes come in opposite pairs, the walls of V-shaped grooves (Torrance and Sparrow 1967, "Theory
+/// for Off-Specular Reflection From Roughened Surfaces"): each groove keeps its own balance of
+/// light, so each footprint does, and the value is linear in the distribution of slopes, so the
+/// crowd is the mean of its flakes in every direction.
 /// Local directions: unit, z along the normal.
 #pragma once
 
-#include "materials/physical/shared/ggx.h"
+#include "materials/physical/paintTables.h"
+#include "materials/physical/shared/facetLoss.h"
 #include "materials/physical/shared/tiltedFacets.h"
+#include "runtime/arithmetic.h"
 
+#include <iterator>
 #include <zsi/zsi.h>
 
 namespace zsi {
@@ -22,8 +27,122 @@ namespace zsi {
 struct FlakeRecipe {
     float size; ///< width of a flake, world units
     float density; ///< share of the surface that they cover, 0..1
-    float spread; ///< width of their slopes, 0 or more
-    float gloss; ///< width of the lobe of one flake, above 0
+    float spread; ///< width of their slopes, 0..1
+    float gloss; ///< width of the lobe of one flake, 0.01..1
+};
+
+/// Light that grooves lose after one bounce, and send out after more.
+namespace grooves {
+
+/// The mean of max(0, x) for x about d, Gaussian but for its tails: a quartic with the Gaussian's
+/// value at d = 0, where `reach` is 1.504 times the Gaussian's width (1 / e).
+inline float softRamp(float d, float reach)
+{
+    if (d >= reach)
+        return d;
+    if (d <= -reach)
+        return 0.0f;
+    float const t = d / reach, rise = 1.0f + t;
+    return reach * (rise * rise * rise * (3.0f - t)) * (1.0f / 16.0f);
+}
+
+/// Of the light along w, for facets of the slopes +-s and Gaussian width a, narrow against 1.
+///
+/// A wall of slope s shows the area p = min(1, u/2), with u = 1 + w.s / w.z, and mirrors w to the
+/// height B = 2 u / (1 + s.s) - 1, both over w.z; it sends out min(p, B). The width makes each
+/// difference a blurred one, by its gradient over the slope.
+inline float lossOfNarrow(Vec3f w, Vec2f s, float a)
+{
+    float const invZ = 1.0f / w.z;
+    float const lean = (w.x * s.x + w.y * s.y) * invZ;
+    float const tan2 = (w.x * w.x + w.y * w.y) * (invZ * invZ), steep2 = s.x * s.x + s.y * s.y;
+    float const k = 2.0f / (1.0f + steep2 + a * a);
+    float const reach = maxOf(1.504f * a, 1e-6f), tangent = std::sqrt(tan2);
+    float loss = 0.0f;
+    for (float const side : {lean, -lean}) {
+        float const half = 0.5f * (1.0f + side), y = 2.0f * k * half, high = y - 1.0f;
+        // Gradients: of u the tangent t of w; of B k (t - y s); of B - u/2 that less t/2.
+        float const bend = k * k * y * y * steep2;
+        auto const reachOf = [&](float along) {
+            float const g2 = along * along * tan2 - 2.0f * along * k * y * side + bend;
+            return reach * std::sqrt(maxOf(g2, 0.0f)) + 1e-6f;
+        };
+        float const reachB = reachOf(k), reachHalf = reach * 0.5f * tangent + 1e-6f;
+        loss += softRamp(half, reachHalf) - softRamp(high, reachB);
+        if (k >= 1.0f) // the wall is shown whole before its light is
+            loss += softRamp(high - half, reachOf(k - 0.5f));
+        else
+            loss += softRamp(high - 1.0f, reachB) - softRamp(half - 1.0f, reachHalf);
+    }
+    return loss;
+}
+
+/// The same for widths up to a half: wide lobes are four narrower ones about the same mean.
+inline float loss(Vec3f w, Vec2f s, float a)
+{
+    constexpr float kNarrow = 0.12f;
+    float sum;
+    if (a <= kNarrow) {
+        sum = lossOfNarrow(w, s, a);
+    } else {
+        float const sine = std::sqrt(w.x * w.x + w.y * w.y);
+        Vec2f const along =
+            sine > 0.0f ? Vec2f(w.x, w.y) * (0.8f * a / sine) : Vec2f(0.8f * a, 0.0f);
+        Vec2f const across(-along.y, along.x);
+        float const part = 0.6f * a; // 0.8^2 + 0.6^2 = 1
+        sum = 0.25f
+            * (lossOfNarrow(w, s + along, part) + lossOfNarrow(w, s - along, part)
+               + lossOfNarrow(w, s + across, part) + lossOfNarrow(w, s - across, part));
+    }
+    return saturate(sum);
+}
+
+/// Mean of it over the hemisphere, weighted with the cosine. Exact for a = 0.
+inline float meanLoss(Vec2f s, float a)
+{
+    float const steep2 = s.x * s.x + s.y * s.y + a * a, k = std::sqrt(1.0f + steep2);
+    return steep2 > 1.0f ? 2.0f * std::sqrt(steep2) / k - 1.0f : steep2 / (1.0f + k);
+}
+
+/// Of Gaussian slopes about the level, any width up to 1.5.
+class LevelLoss {
+public:
+    explicit LevelLoss(float width)
+        : width_(width)
+        , node_(std::sqrt(width * (1.0f / 1.5f)) * (kSpreads - 1))
+    {
+    }
+    float operator()(float c) const
+    {
+        TablePosition<kCosines> const at(c * (1.0f + width_) / (c + width_) * (kCosines - 1));
+        float const* const below = kFlakeLoss[node_.node] + at.node;
+        float const* const above = below + kCosines;
+        return lerp(lerp(below[0], below[1], at.fraction), lerp(above[0], above[1], at.fraction),
+                    node_.fraction);
+    }
+    float mean() const
+    {
+        float const* const at = kFlakeMeanLoss[0] + node_.node;
+        float const w2 = width_ * width_;
+        return lerp(at[0], at[1], node_.fraction) * w2 / (1.0f + std::sqrt(1.0f + w2));
+    }
+
+private:
+    static constexpr int kSpreads = std::size(kFlakeLoss), kCosines = std::size(kFlakeLoss[0]);
+    static float lerp(float a, float b, float t) { return a + t * (b - a); }
+
+    float width_;
+    TablePosition<kSpreads> node_;
+};
+
+} // namespace grooves
+
+/// Where a footprint lies.
+struct FlakePlace {
+    Vec3f p; ///< position that sticks to the surface, in flakes
+    float pixelX, pixelY; ///< of the picture, whole numbers
+    float width; ///< of the pixel there, in flakes
+    float underneath; ///< flakes under the pixel, above 0
 };
 
 /// The flakes that one ray meets.
@@ -35,45 +154,35 @@ public:
     /// The crowd alone.
     explicit FlakeFootprint(FlakeRecipe const& recipe)
         : coverage_(recipe.density)
-        , crowdShare_(1.0f)
-        , gloss2_(recipe.gloss * recipe.gloss)
-        , crowd2_(gloss2_ + recipe.spread * recipe.spread)
+        , crowd_(recipe.density)
+        , gloss_(recipe.gloss)
+        , crowd2_(recipe.gloss * recipe.gloss + recipe.spread * recipe.spread)
     {
     }
 
-    /// The flakes around p. p: position that sticks to the surface, in flakes; x, y: unit, along
-    /// the surface there; underneath: flakes under the footprint, any number above 0.
-    FlakeFootprint(FlakeRecipe const& recipe, IShaderAPI* api, Vec3f p, Vec3f x, Vec3f y,
-                   float underneath)
+    FlakeFootprint(FlakeRecipe const& recipe, IShaderAPI* api, FlakePlace const& place)
         : FlakeFootprint(recipe)
     {
-        float const told = minOf(maxOf(underneath, 1.0f), static_cast<float>(kMost));
-        // Contrast under this is not worth a look-up.
-        constexpr float kFaint = 0.02f;
-        float const contrast = underneath > told ? std::sqrt(told / underneath) : 1.0f;
-        float const resolved = (contrast - kFaint) / (1.0f - kFaint);
-        if (!(resolved > 0.0f))
+        bool const alone = !(place.underneath > 1.0f);
+        // A pixel that cuts flakes shows parts of more of them: the variance of the mean of cells
+        // over a square n cells large is (1 - 1 / (3 sqrt n))^2 / n of theirs.
+        float const cut = 1.0f - 0.33333333f / std::sqrt(place.underneath);
+        float const seen = alone ? 1.0f : place.underneath / (cut * cut);
+        float const resolved = minOf(seen, static_cast<float>(kMost));
+        // Contrast under this is not worth a look-up, and flakes as dull as this are no sparkles.
+        constexpr float kFaint = 0.02f, kDull = 0.45f, kDulling = 0.1f;
+        float const contrast = (std::sqrt(resolved / seen) - kFaint) / (1.0f - kFaint)
+            * saturate((kDull - recipe.gloss) / kDulling);
+        if (!(contrast > 0.0f))
             return;
-        bool const alone = !(underneath > 1.0f);
-        float const width = std::sqrt(underneath);
-        float present = 0.0f;
-        for (int i = 0; static_cast<float>(i) < told; ++i) {
-            Vec3f cell;
-            if (alone) {
-                cell = flakeAt(api, p);
-            } else {
-                // R2 sequence: Roberts 2018, "The Unreasonable Effectiveness of Quasirandom
-                // Sequences".
-                float const k = static_cast<float>(i);
-                Vec3f const q = p + x * (width * (fract(0.5f + k * 0.7548777f) - 0.5f))
-                    + y * (width * (fract(0.5f + k * 0.5698403f) - 0.5f));
-                cell = {std::floor(q.x), std::floor(q.y), std::floor(q.z)};
-            }
+        Vec3f const first = alone ? flakeAt(api, place.p) : pixelSeed(place);
+        coverage_ = crowd_ = (1.0f - contrast) * recipe.density;
+        for (int i = 0; static_cast<float>(i) < resolved; ++i) {
             // In the decimals of a smooth noise every value is as likely as any other. Two steps of
             // the golden ratio's kin keep the points of cells off the noise's lattice.
             constexpr Vec3f kStride(1.6180340f, 1.4142136f, 1.7320508f);
-            Vec3f at = cell * kStride + grey(0.37f);
-            float const share = minOf(1.0f, told - static_cast<float>(i)) / told;
+            Vec3f at = first * kStride + grey(0.37f);
+            at.z += 5.1961524f * static_cast<float>(i);
             if (recipe.density < 1.0f) {
                 Vec3f const other = at + grey(0.29f);
                 if (!(fract(api->noise3DRecord(&other) * 64.0f) < recipe.density))
@@ -82,94 +191,79 @@ public:
             float const n = api->noise3DRecord(&at) * 64.0f;
             float const r = recipe.spread * std::sqrt(-std::log(1.0f - fract(n)));
             float const phi = kPi * fract(n * 64.0f); // half a turn: the pair has the other half
-            flake_[count_++] = {{r * std::cos(phi), r * std::sin(phi)}, resolved * share};
-            present += share;
+            float const share =
+                contrast * (minOf(1.0f, resolved - static_cast<float>(i)) / resolved);
+            flake_[count_++] = {{r * std::cos(phi), r * std::sin(phi)}, share};
+            coverage_ += share;
         }
-        coverage_ = resolved * present + (1.0f - resolved) * recipe.density;
-        if (!(coverage_ > 0.0f))
-            return;
-        for (int i = 0; i < count_; ++i)
-            flake_[i].share /= coverage_;
-        crowdShare_ = (1.0f - resolved) * recipe.density / coverage_;
     }
 
     /// Share of the surface that flakes cover, 0..1.
     float coverage() const { return coverage_; }
 
-    /// Area of the flakes that w sees, per area of surface: at least w.z, and never less than the
-    /// true one, so that w.z over it is a masking that keeps the energy. The area of Gaussian
-    /// slopes is held from above by that of a hyperbola with the same value at grazing incidence.
-    float seenArea(Vec3f w) const
+    /// Density of facet normals at h, 1/sr, over the whole surface: its integral with the cosine is
+    /// the coverage.
+    float density(Vec3f h) const
     {
-        float sum = crowdShare_ > 0.0f ? crowdShare_ * seen(w.z, across(w, crowd2_)) : 0.0f;
-        float const q = across(w, gloss2_);
+        float sum = crowd_ > 0.0f ? crowd_ * facetsAbout(h, {0.0f, 0.0f}, crowd2_) : 0.0f;
+        float const gloss2 = gloss_ * gloss_;
         for (int i = 0; i < count_; ++i) {
-            float const lean = w.x * flake_[i].slope.x + w.y * flake_[i].slope.y;
-            sum += 0.5f * flake_[i].share * (seen(w.z + lean, q) + seen(w.z - lean, q));
+            Flake const& f = flake_[i];
+            sum += 0.5f * f.share
+                * (facetsAbout(h, f.slope, gloss2) + facetsAbout(h, f.slope * -1.0f, gloss2));
         }
+        return sum * kInvPi;
+    }
+
+    /// A facet normal that v sees, unit: the slope by its density, then of the two walls of its
+    /// groove one by the area that v sees of it (Heitz and d'Eon 2014, "Importance Sampling
+    /// Microfacet-Based BSDFs using the Distribution of Visible Normals"). pick, u: in [0, 1).
+    Vec3f visibleNormal(Vec3f v, float pick, Vec2f u) const
+    {
+        float left = pick * coverage_, share = crowd_, width = std::sqrt(crowd2_);
+        Vec2f slope(0.0f, 0.0f);
+        for (int i = 0; i < count_ && !(left < share); ++i) {
+            left -= share;
+            share = flake_[i].share;
+            slope = flake_[i].slope;
+            width = gloss_;
+        }
+        float const r = width * std::sqrt(-std::log(1.0f - u.y)), phi = 2.0f * kPi * u.x;
+        Vec2f const s(slope.x + r * std::cos(phi), slope.y + r * std::sin(phi));
+        float const lean = v.x * s.x + v.y * s.y;
+        bool const first = left * (2.0f * v.z) < share * (v.z + lean);
+        return normalize(first ? Vec3f(s.x, s.y, 1.0f) : Vec3f(-s.x, -s.y, 1.0f));
+    }
+
+    /// Of the light along w, what the flakes lose after one bounce, and its mean over the
+    /// hemisphere; crowd: of `crowdLoss`.
+    float loss(Vec3f w, float crowd) const
+    {
+        float sum = crowd_ * crowd;
+        for (int i = 0; i < count_; ++i)
+            sum += flake_[i].share * grooves::loss(w, flake_[i].slope, gloss_);
         return sum;
     }
-
-    struct Density {
-        float normals; ///< of facet normals at h, 1/sr
-        float picked; ///< the same with each flake weighted by the area that v sees of it
-    };
-    /// h: unit; area: `seenArea(v)`.
-    Density operator()(Vec3f h, Vec3f v, float area) const
+    float meanLoss(float crowd) const
     {
-        Density sum{0.0f, 0.0f};
-        auto const add = [&](Vec2f slope, float alpha2, float share) {
-            float const d = share * kInvPi * facetsAbout(h, slope, alpha2);
-            sum.normals += d;
-            float const lean = v.x * slope.x + v.y * slope.y;
-            sum.picked += d * seen(v.z + lean, across(v, alpha2)) / area;
-        };
-        if (crowdShare_ > 0.0f)
-            add({0.0f, 0.0f}, crowd2_, crowdShare_);
-        for (int i = 0; i < count_; ++i) {
-            add(flake_[i].slope, gloss2_, 0.5f * flake_[i].share);
-            add(flake_[i].slope * -1.0f, gloss2_, 0.5f * flake_[i].share);
-        }
+        float sum = crowd_ * crowd;
+        for (int i = 0; i < count_; ++i)
+            sum += flake_[i].share * grooves::meanLoss(flake_[i].slope, gloss_);
         return sum;
     }
-
-    /// One flake, or the crowd.
-    struct Pick {
-        Vec2f slope;
-        float width;
-    };
-    /// By the area that v sees of each. area: `seenArea(v)`; u: in [0, 1).
-    Pick pick(Vec3f v, float area, float u) const
-    {
-        float left = u * area;
-        float const q = across(v, gloss2_);
-        for (int i = 0; i < count_; ++i) {
-            Vec2f const s = flake_[i].slope;
-            float const lean = v.x * s.x + v.y * s.y;
-            float const one = 0.5f * flake_[i].share * seen(v.z + lean, q);
-            if (left < one)
-                return {s, std::sqrt(gloss2_)};
-            left -= one;
-            float const other = 0.5f * flake_[i].share * seen(v.z - lean, q);
-            if (left < other || (i + 1 == count_ && !(crowdShare_ > 0.0f)))
-                return {s * -1.0f, std::sqrt(gloss2_)};
-            left -= other;
-        }
-        return {{0.0f, 0.0f}, std::sqrt(crowd2_)};
-    }
-
-    /// A facet normal of the picked lobe, by its density times its cosine; unit. u: in [0, 1).
-    static Vec3f normal(Pick const& p, Vec2f u)
-    {
-        float const r = p.width * std::sqrt(-std::log(1.0f - u.y)), phi = 2.0f * kPi * u.x;
-        return normalize({p.slope.x + r * std::cos(phi), p.slope.y + r * std::sin(phi), 1.0f});
-    }
+    grooves::LevelLoss crowdLoss() const { return grooves::LevelLoss(std::sqrt(crowd2_)); }
 
 private:
     struct Flake {
         Vec2f slope; ///< of one of the pair
-        float share; ///< of what flakes cover, for both
+        float share; ///< of the surface, for both
     };
+
+    /// Keeps coordinates of the noise small enough for their decimals.
+    static float wrapped(float cell, float period)
+    {
+        return cell - period * std::floor(cell / period);
+    }
 
     /// The cell whose flake covers p: of the jittered centres of cells the nearest.
     static Vec3f flakeAt(IShaderAPI* api, Vec3f p)
@@ -190,22 +284,109 @@ private:
                 nearest = cell;
             }
         }
-        return nearest;
+        constexpr float kPeriod = 4096.0f;
+        return {wrapped(nearest.x, kPeriod), wrapped(nearest.y, kPeriod),
+                wrapped(nearest.z, kPeriod)};
     }
 
-    /// What spreads the slopes in the plane of w: 2/pi of their variance there, alpha^2 sin^2 / 2.
-    static float across(Vec3f w, float alpha2)
+    /// Stands for the cells under a pixel: the same for all samples of the pixel on a part of the
+    /// surface many pixels wide.
+    static Vec3f pixelSeed(FlakePlace const& place)
     {
-        constexpr float kOverInvPi = 0.3184f;
-        return kOverInvPi * alpha2 * (w.x * w.x + w.y * w.y);
+        int octave;
+        std::frexp(place.width, &octave);
+        float const part = std::ldexp(32.0f, octave);
+        constexpr float kPeriod = 64.0f;
+        auto const seed = [&](float p, float stride) {
+            return stride * wrapped(std::floor(p / part), kPeriod);
+        };
+        return {place.pixelX + seed(place.p.x, 131.0f), place.pixelY + seed(place.p.y, 137.0f),
+                seed(place.p.z, 139.0f)};
     }
-    /// Area seen of a lobe whose mean shows the cosine c over its upright part.
-    static float seen(float c, float q) { return 0.5f * (c + std::sqrt(c * c + q)); }
 
     Flake flake_[kMost]{};
     int count_ = 0;
-    float coverage_, crowdShare_;
-    float gloss2_, crowd2_;
+    float coverage_, crowd_; ///< of the surface; the second by what is not resolved
+    float gloss_, crowd2_;
+};
+
+/// Flakes seen along v: mirrored once, and what grooves send out after further bounces, as a broad
+/// lobe, loss(v) loss(l) / (pi mean): Kulla and Conty 2017, "Revisiting Physically Based Shading at
+/// Imageworks".
+class FlakeLobe {
+public:
+    FlakeLobe(FlakeFootprint const& flakes, Vec3f v)
+        : flakes_(flakes)
+        , v_(v)
+        , crowd_(flakes.crowdLoss())
+        , crowdMean_(maxOf(crowd_.mean(), 1e-9f))
+    {
+        if (!(flakes.coverage() > 0.0f))
+            return;
+        lossV_ = flakes.loss(v, crowd_(v.z));
+        if (!(lossV_ > 0.0f))
+            return;
+        furtherV_ = lossV_ * kInvPi / flakes.meanLoss(crowdMean_);
+        // Less than the loss may be: facets are to be drawn wherever they still send light.
+        constexpr float kMostBroad = 0.75f;
+        broadChance_ = minOf(lossV_ / flakes.coverage(), kMostBroad);
+    }
+
+    float coverage() const { return flakes_.coverage(); }
+    /// Mean loss of a layer of such flakes, 0..1.
+    float crowdMeanLoss() const { return crowdMean_; }
+
+    /// Scattering values without the cosine, 1/sr.
+    struct Value {
+        float once, further;
+        float cosine; ///< on the facet that mirrors
+        float pdf; ///< of `direction`, 1/sr
+    };
+    /// l: z above 0.
+    Value operator()(Vec3f l) const
+    {
+        Vec3f const h = v_ + l;
+        float const m2 = 0.25f * dot(h, h); // squared cosine on the facet
+        float const cosine = minOf(std::sqrt(m2), 1.0f);
+        float const density = 0.25f * flakes_.density(h * (0.5f / std::sqrt(m2)));
+        // Masking of grooves: min(1, k cos v, k cos l), k = 2 h.z / v.h.
+        float const k = h.z / m2;
+        float const higher = maxOf(v_.z, l.z), lower = minOf(v_.z, l.z);
+        Value value{};
+        value.cosine = cosine;
+        value.once = density * minOf(1.0f, k * lower) / (higher * lower);
+        if (lossV_ > 0.0f)
+            value.further = flakes_.loss(l, crowd_(l.z)) * furtherV_;
+        value.pdf =
+            (1.0f - broadChance_) * density * minOf(1.0f, k * v_.z) / (v_.z * flakes_.coverage())
+            + broadChance_ * l.z * kInvPi;
+        return value;
+    }
+
+    /// A direction by the facets that v sees, or by the cosine about as often as light bounces
+    /// further; it may point below the surface. pick: in [0, 1).
+    Vec3f direction(float pick, Vec2f u) const
+    {
+        if (pick < broadChance_)
+            return cosineDirection(u);
+        Vec3f const h = flakes_.visibleNormal(v_, (pick - broadChance_) / (1.0f - broadChance_), u);
+        return h * (2.0f * dot(v_, h)) - v_;
+    }
+
+    static Vec3f cosineDirection(Vec2f u)
+    {
+        float const r = std::sqrt(u.y), phi = 2.0f * kPi * u.x;
+        return {r * std::cos(phi), r * std::sin(phi), std::sqrt(1.0f - u.y)};
+    }
+
+private:
+    FlakeFootprint flakes_;
+    Vec3f v_;
+    grooves::LevelLoss crowd_;
+    float crowdMean_;
+    float lossV_ = 0.0f; ///< over the whole surface
+    float furtherV_ = 0.0f; ///< the same over pi and its mean
+    float broadChance_ = 0.0f; ///< of a direction by the cosine
 };
 
 } // namespace zsi
