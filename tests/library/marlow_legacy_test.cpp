@@ -226,8 +226,8 @@ TEST(MarlowLegacy, LightsShadeAsTransferSays)
 TEST(MarlowLegacy, OneEnergyAndOneShapeForOneLobe)
 {
     test::Random random;
-    for (float const width : {0.03f, 0.3f, 0.85f, 1.0f})
-        for (float const cosine : {1.0f, 0.6f, 0.2f, 0.05f})
+    for (float const width : {0.03f, 0.4f, 1.0f})
+        for (float const cosine : {1.0f, 0.5f, 0.1f})
             for (int kind : {0, 1, 2}) { // a highlight; a reflection with and without lights
                 Legacy l;
                 MarlowLegacy& s = l.shader;

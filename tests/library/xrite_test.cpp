@@ -1,4 +1,5 @@
 #include "materials/legacy/XRite.h"
+#include "support/lobeSampling.h"
 #include "support/scriptedHost.h"
 
 #include <bit>
@@ -148,6 +149,80 @@ TEST(CarPaint, FlakesGlintNearAndFadeFarWithTheSameBrightness)
         EXPECT_NEAR(middle.mean, far.mean, error) << L.x;
         Look const flat(0.1f, L, 0); // coarseness 0; the root of what double cancels
         EXPECT_LE(flat.deviation, 1e-6 * flat.mean);
+    }
+}
+
+/// White paint under a dome of lights shows what it shows in a white room.
+TEST(CarPaint, LightsBringAsMuchAsTheRoom)
+{
+    struct Case {
+        char const* why;
+        bool solid, texture;
+        float distance, coarseness;
+        double width; // of the lobe
+    };
+    constexpr Case kCases[] = {{"solid", true, false, 1, 1, 0.04},
+                               {"flat flakes, near", false, false, 0.01f, 1, 0.1},
+                               {"flat flakes, far", false, false, 1e4f, 1, 0.1},
+                               {"flakes that lean, far", false, true, 1e4f, 0.656f, 0.23},
+                               {"as much as can be", false, true, 1e4f, 1e30f, 0.95}};
+    Texture normals(gaussianFlake);
+    for (Case const& c : kCases)
+        for (double const cosine : {1.0, 0.5, 0.26, 0.1}) {
+            Paint p;
+            XRite& s = p.shader;
+            s.xriteIsSolid = c.solid;
+            s.coarseness = c.coarseness;
+            if (!c.solid)
+                s.fresnel = {0, 0, 1, 1}; // no coat: the grid fits one lobe
+            s.contributionFactor = 1;
+            s.xriteDiffuse = grey(c.solid ? 1.0f : 0.0f);
+            s.flakeColor = s.flakeColor2 = {1, 1, 1};
+            if (c.texture)
+                s.flakeNormalTexture.texture = &normals;
+            double const sine = std::sqrt(1 - cosine * cosine);
+            p.state.I = test::toFloat({sine, 0, -cosine});
+            p.state.E = p.state.P - p.state.I * c.distance;
+            p.host.onTrace = p.host.onIndirect = [](Vec3f, Vec3f) { return Vec3f(1, 1, 1); };
+            EXPECT_NEAR(p.shade().x, 1, 1e-5) << c.why;
+            p.host.onTrace = p.host.onIndirect = nullptr;
+            p.host.addLight({0, 0, 1}, {1, 1, 1});
+            double const dome = test::hemisphere(
+                {c.width / 2, c.width / 2, {-sine, 0, cosine}}, 120, [&](test::Vec3d l) {
+                    p.host.lights[0].L = test::toFloat(l);
+                    p.host.lights[0].weight = float(l.z);
+                    return l.z > 0 ? d(p.shade().x) / (M_PI * l.z) : 0;
+                });
+            EXPECT_NEAR(dome, 1, 0.012) << c.why << ' ' << cosine;
+        }
+}
+
+TEST(CarPaint, BrokenInputIsNeutral)
+{
+    constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
+    Texture normals(gaussianFlake);
+    auto const shown = [&](float XRite::*number, Vec3f XRite::*color, float value) {
+        Paint p;
+        p.shader.flakeNormalTexture.texture = &normals;
+        (number ? p.shader.*number : (p.shader.*color).y) = value;
+        p.host.onTrace = p.host.onIndirect = [](Vec3f, Vec3f) { return Vec3f(1, 1, 1); };
+        p.host.addLight({0, 0.6f, 0.8f}, {1, 1, 1});
+        return rgb(p.shade());
+    };
+    for (float const value : {-1.0f, kNan, -1e30f}) {
+        for (auto color : {&XRite::xriteDiffuse, &XRite::flakeColor, &XRite::flakeColor2})
+            EXPECT_EQ(shown(nullptr, color, value), shown(nullptr, color, 0)) << value;
+        for (auto number :
+             {&XRite::specIntensity, &XRite::diffIntensity, &XRite::contributionFactor})
+            EXPECT_EQ(shown(number, nullptr, value), shown(number, nullptr, 0)) << value;
+    }
+    EXPECT_EQ(shown(&XRite::coarseness, nullptr, kNan), shown(&XRite::coarseness, nullptr, 0));
+    for (float const value : {1e30f, -1e30f, std::numeric_limits<float>::infinity()}) {
+        float const most = std::copysign(3.0f, value);
+        EXPECT_EQ(shown(&XRite::coarseness, nullptr, value),
+                  shown(&XRite::coarseness, nullptr, most));
+        Vec3f const most3 = shown(&XRite::specIntensity, nullptr, std::fabs(value));
+        EXPECT_TRUE(std::isfinite(most3.x) && most3.x > 0);
     }
 }
 

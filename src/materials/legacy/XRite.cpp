@@ -2,8 +2,8 @@
 
 #include "environments/iblGrading.h"
 #include "materials/legacy/curveFresnel.h"
+#include "materials/legacy/glossyLobe.h"
 #include "materials/physical/shared/facedNormal.h"
-#include "materials/physical/shared/ggx.h"
 #include "materials/physical/shared/safeReflect.h"
 #include "materials/physical/shared/shadingFrame.h"
 
@@ -12,8 +12,13 @@
 namespace zsi {
 namespace {
 
-/// Squared width of the coat's highlights: lights are points, and a coat is never quite flat.
-constexpr float kCoatAlpha2 = 0.0016f;
+/// Width of the coat's highlights: lights are points, and a coat is never quite flat.
+constexpr float kCoatWidth = 0.04f;
+
+/// Largest colour or intensity; more would lose itself in infinities.
+constexpr float kMost = 1e18f;
+constexpr float bounded(float x) { return saturate(x, 0.0f, kMost); }
+constexpr Vec3f bounded(Vec3f c) { return {bounded(c.x), bounded(c.y), bounded(c.z)}; }
 
 float srgbCurve(float x, float power)
 {
@@ -43,7 +48,7 @@ Vec3f XRite::f_r709tosRGB(IShaderAPI*, ShadeState const&, Vec3f c) const
 
 /// Slope of the flake of a cell: a draw from the normals that the texture holds, so that flakes
 /// are of flakeSize whatever the pattern of the texture.
-Vec2f XRite::flakeSlope(IShaderAPI* api, ShadeState const& state, Vec3i cell) const
+Vec2f XRite::flakeSlope(IShaderAPI* api, ShadeState const& state, Vec3i cell, float scale) const
 {
     if (!flakeNormalTexture.texture)
         return {0.0f, 0.0f};
@@ -51,13 +56,15 @@ Vec2f XRite::flakeSlope(IShaderAPI* api, ShadeState const& state, Vec3i cell) co
     Vec3f const at = cellHash(cell.y ^ 0x2545F491, cell.x);
     Vec3f const n = f_getFlakeNormal(api, state, {at.x, at.y});
     constexpr float kLeastHeight = 0.1f; // no flake stands upright
-    return Vec2f(n.x, n.y) * (coarseness / maxOf(n.z, kLeastHeight));
+    return Vec2f(n.x, n.y) * (scale / maxOf(n.z, kLeastHeight));
 }
 
 FlakeLayer XRite::flakes(IShaderAPI* api, ShadeState const& state) const
 {
     FlakeLayer layer;
-    layer.spread = kFlakeSlope * coarseness * coarseness;
+    float const scale = saturate(std::fabs(coarseness), 0.0f, kMostCoarseness);
+    if (flakeNormalTexture.texture) // without it, flakes lie flat
+        layer.spread = kFlakeSlope * scale * scale;
     float const density = flakeFactor / flakeSize; // flakes per unit of uv
     Vec2f const p = attribute_uv(state) * density;
     // Beyond this, cells have no integer number. Negated, so that NaN leaves too.
@@ -70,15 +77,15 @@ FlakeLayer XRite::flakes(IShaderAPI* api, ShadeState const& state) const
     constexpr float kPixelAngle = 0.001f;
     float const footprint = length(state.P - state.E) * kPixelAngle * density; // in flakes
     float const underneath = maxOf(1.0f, footprint * footprint);
-    float const told = minOf(minOf(maxFlakes, underneath), static_cast<float>(FlakeLayer::kMost));
-    if (!(told > 0.0f) || !(footprint < kMostCells))
+    float const most = minOf(minOf(maxFlakes, underneath), static_cast<float>(FlakeLayer::kMost));
+    if (!(most > 0.0f) || !(footprint < kMostCells))
         return layer;
 
-    // The contrast of a crowd falls with the root of its number; `told` of it are averaged here.
-    layer.resolved = underneath > told ? std::sqrt(told / underneath) : 1.0f;
+    // The contrast of many falls with the root of its number; as many as `most` are averaged here.
+    layer.resolved = underneath > most ? std::sqrt(most / underneath) : 1.0f;
     // Alone, a flake has its shape; of many, only cells are drawn.
     bool const alone = underneath <= 1.0f;
-    for (int i = 0; static_cast<float>(i) < told; ++i) {
+    for (int i = 0; static_cast<float>(i) < most; ++i) {
         Vec3i cell;
         if (alone) {
             cell = flakeAt(p);
@@ -90,8 +97,9 @@ FlakeLayer XRite::flakes(IShaderAPI* api, ShadeState const& state) const
             cell = {static_cast<std::int32_t>(std::floor(x)),
                     static_cast<std::int32_t>(std::floor(y)), 0};
         }
-        float const weight = minOf(1.0f, told - static_cast<float>(i)) / told;
-        layer.flake[layer.count++] = {flakeSlope(api, state, cell), weight};
+        float const weight = minOf(1.0f, most - static_cast<float>(i)) / most;
+        layer.flake[layer.count++] = {
+            flakeSlope(api, state, cell, std::copysign(scale, coarseness)), weight};
     }
     return layer;
 }
@@ -109,52 +117,56 @@ Vec3f XRite::paint(IShaderAPI* api, ShadeState const& state) const
     Vec3f const upper = inside ? -n : n;
     Vec3f const ng = dot(state.I, state.Ng) > 0.0f ? -state.Ng : state.Ng;
 
-    // The measured colours are told in the curve of a display.
-    Vec3f const base = f_r709tosRGB(api, state, xriteDiffuse) * diffIntensity;
-    float const flakeScale = xriteIsSolid ? 0.0f : contributionFactor * specIntensity;
+    // The measured colours are taken in the curve of a display.
+    auto const measured = [&](Vec3f const& c) { return f_r709tosRGB(api, state, bounded(c)); };
+    float const specular = bounded(specIntensity);
+    Vec3f const base = measured(xriteDiffuse) * bounded(diffIntensity);
+    float const flakeScale = xriteIsSolid ? 0.0f : bounded(contributionFactor) * specular;
     bool const flaky = flakeScale != 0.0f;
-    Vec3f color(0.0f, 0.0f, 0.0f), color2(0.0f, 0.0f, 0.0f);
+    Vec3f color = kBlack, color2 = kBlack;
     FlakeLayer layer;
     if (flaky) {
-        color = f_r709tosRGB(api, state, flakeColor);
-        color2 = f_r709tosRGB(api, state, flakeColor2);
+        color = measured(flakeColor);
+        color2 = measured(flakeColor2);
         layer = flakes(api, state);
     }
+    float const coat = saturate(f_fast_fresnel(api, state, {0.0f, 0.0f, std::fabs(v.z)}, fresnel));
+    float const under = 1.0f - coat;
 
     // Lights. Every term is what a light of irradiance pi sends to the viewer: a white base that
     // faces a light of colour 1 shows 1.
-    Vec3f diffuse(0.0f, 0.0f, 0.0f), glints(0.0f, 0.0f, 0.0f), highlight(0.0f, 0.0f, 0.0f);
+    Vec3f diffuse = kBlack, glints = kBlack, mirrored = kBlack;
+    GlossyLobe const lobe = v.z > 0.0f ? GlossyLobe(kCoatWidth, v, grey(1.0f)) : GlossyLobe();
     for (LightSample const* s = api->getLightSamples(-2, &state.P, &n); s; s = s->next) {
         Vec3f const light = s->color * s->shadow * s->weight;
-        if (light == Vec3f(0.0f, 0.0f, 0.0f))
+        if (light == kBlack)
             continue;
         diffuse += light;
         Vec3f const l = toLocal(frame, s->L);
         if (l.z <= 0.0f || v.z <= 0.0f)
             continue;
-        Vec3f const h = normalize(v + l);
-        float const f = f_fast_fresnel(api, state, {0.0f, 0.0f, dot(v, h)}, fresnel);
-        highlight += light * (f * kPi * Ggx{.alpha2 = kCoatAlpha2}.reflection(v, l, h));
+        mirrored += light * (kPi * lobe.value(l));
         if (flaky)
-            glints += light * layer.glint(v, l, h, color, color2);
+            glints += light * layer.glint(v, l, normalize(v + l), color, color2);
     }
+    if (!(glints == kBlack))
+        glints = glints / layer.albedo(v);
 
     // Surroundings: a cube where one is bound, the host's rays otherwise.
-    float const coat = f_fast_fresnel(api, state, {0.0f, 0.0f, std::fabs(v.z)}, fresnel);
-    float const under = maxOf(0.0f, 1.0f - coat);
     diffuse += occlusion
         * (diffuseCube.texture ? rgb(diffuseCube.lookup(cubeCoordinate(n)))
                                : api->indirectDiffuse(&state.P, &n, under * maxComponent(base)));
     Vec3f const mirror = f_safe_reflect(api, state, state.I, ng, upper);
     if (flaky) {
         // About the mean of the flakes that are told apart, as wide as what they leave.
-        Vec3f mean(0.0f, 0.0f, 0.0f), average(0.0f, 0.0f, 0.0f);
+        Vec3f mean = kBlack, average = kBlack;
         for (int i = 0; i < layer.count; ++i) {
             FlakeLayer::Flake const& f = layer.flake[i];
             mean += Vec3f(f.slope.x, f.slope.y, 0.0f) * f.weight;
-            average += mix(color, color2, layer.flop(f.slope)) * f.weight;
+            average += mix(color, color2, layer.flop(f)) * f.weight;
         }
-        average = mix(mix(color, color2, 0.5f), average, layer.resolved);
+        float const flop = layer.spread > 0.0f ? kMeanFlop : 0.0f;
+        average = mix(mix(color, color2, flop), average, layer.resolved);
         mean *= layer.resolved;
         mean.z = 1.0f;
         Vec3f const m = normalize(toWorld(frame, mean));
@@ -165,17 +177,15 @@ Vec3f XRite::paint(IShaderAPI* api, ShadeState const& state) const
             * (specularCube.texture
                    ? rgb(specularCube.lookup(cubeCoordinate(r)))
                    : api->traceSpecular(&state.P, &r, std::sqrt(kFlakeGloss + left),
-                                        under * std::fabs(flakeScale) * maxComponent(average)));
+                                        under * flakeScale * maxComponent(average)));
     }
-    float const mirrored = coat * specIntensity;
-    Vec3f reflection(0.0f, 0.0f, 0.0f);
+    float const mirrors = coat * specular;
     if (reflectCube.texture)
-        reflection = rgb(reflectCube.lookup(cubeCoordinate(mirror))) * occlusion;
-    else if (mirrored != 0.0f)
-        reflection = api->traceReflection(&state.P, &mirror, mirrored);
+        mirrored += rgb(reflectCube.lookup(cubeCoordinate(mirror))) * occlusion;
+    else if (mirrors != 0.0f)
+        mirrored += api->traceReflection(&state.P, &mirror, mirrors);
 
-    return under * (base * diffuse + glints * flakeScale) + reflection * mirrored
-        + highlight * specIntensity;
+    return bounded(under * (base * diffuse + glints * flakeScale) + mirrored * mirrors);
 }
 
 void XRite::shade(IShaderAPI* api, ShadeState& state) const

@@ -16,7 +16,7 @@ namespace zsi {
     P(Vec3f, flakeColor2, (0.0953f, 0.0958f, 0.0976f), "colour of flakes that lean, as measured") \
     P(Vec4f, fresnel, (0.04f, 0.9f, 2.5f, 1.0f), "coat: base, scale, exponent, ceiling")          \
     P(bool, xriteIsSolid, (false), "solid paint: no flakes")                                      \
-    P(float, coarseness, (0.656f), "scales the slopes of the flakes, 0 all flat")                 \
+    P(float, coarseness, (0.656f), "scales the slopes of the flakes, 0 all flat; -3 to 3 count")  \
     P(float, specIntensity, (1.0f), "scales what the coat and the flakes mirror")                 \
     P(float, diffIntensity, (1.0f), "scales the base")                                            \
     P(float, contributionFactor, (0.75f), "scales the flakes")                                    \
@@ -33,6 +33,8 @@ class XRite final : public MaterialShader,
                     public MaskingFunctions<XRite>,
                     public AmbientOcclusionFunctions<XRite> {
 public:
+    static constexpr bool kMaskSaturates = true;
+
     SHADER(XRite, kShade | kTransmission, XRITE)
     void shade(IShaderAPI* api, ShadeState& state) const override;
     void transmission(IShaderAPI* api, ShadeState& state) const override;
@@ -47,7 +49,7 @@ public:
 private:
     Vec3f paint(IShaderAPI* api, ShadeState const& state) const;
     FlakeLayer flakes(IShaderAPI* api, ShadeState const& state) const;
-    Vec2f flakeSlope(IShaderAPI* api, ShadeState const& state, Vec3i cell) const;
+    Vec2f flakeSlope(IShaderAPI* api, ShadeState const& state, Vec3i cell, float scale) const;
 };
 
 } // namespace zsi

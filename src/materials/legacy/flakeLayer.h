@@ -1,12 +1,13 @@
 /// Flakes in a paint: which of them a view ray meets, and what they mirror.
 ///
 /// A flake is a facet of slope s (the tangent-plane part of its normal over the upright part) with
-/// a gloss of its own. Slopes of many flakes are taken as Gaussian, so that a crowd of flakes
-/// mirrors like one wider lobe whose variance is that of the gloss plus that of the slopes; what a
+/// a gloss of its own. Slopes of many flakes are taken as Gaussian, so that together they mirror
+/// like one wider lobe whose variance is that of the gloss plus that of the slopes; what a
 /// footprint no longer resolves moves from flakes into that lobe. Olano and Baker 2010, "LEAN
 /// Mapping". Local directions: z along the normal.
 #pragma once
 
+#include "materials/legacy/facetAlbedo.h"
 #include "materials/physical/shared/tiltedFacets.h"
 
 #include <cmath>
@@ -19,6 +20,11 @@ namespace zsi {
 inline constexpr float kFlakeGloss = 0.01f;
 /// Mean squared slope of the flakes that a flake-normal texture holds, at coarseness 1.
 inline constexpr float kFlakeSlope = 0.1f;
+
+/// Slopes beyond this many times those of the texture tell nothing apart.
+inline constexpr float kMostCoarseness = 3.0f;
+/// Mean of `FlakeLayer::flop` over Gaussian slopes: 1 - e E1(1), E1 the exponential integral.
+inline constexpr float kMeanFlop = 0.4036526f;
 
 /// Three numbers in [0, 1) of a cell.
 /// Jarzynski and Olano 2020, "Hash Functions for GPU Rendering" (pcg3d).
@@ -65,7 +71,7 @@ inline Vec3i flakeAt(Vec2f p)
 
 /// What a view ray meets of the layer.
 struct FlakeLayer {
-    /// More flakes than these look no different from the crowd.
+    /// More flakes than these look no different from their mean.
     static constexpr int kMost = 16;
 
     struct Flake {
@@ -74,33 +80,42 @@ struct FlakeLayer {
     };
     Flake flake[kMost];
     int count = 0;
-    float resolved = 0.0f; ///< share of the layer that shows as flakes and not as the crowd, 0..1
-    float spread = kFlakeSlope; ///< mean squared slope of the crowd
+    float resolved = 0.0f; ///< share of the layer that shows as flakes and not as their mean, 0..1
+    float spread = 0.0f; ///< mean squared slope; 0: all flakes lie flat
+
+    /// Squared width of the lobe of many flakes.
+    float alpha2() const { return kFlakeGloss + spread; }
 
     /// Share of the second flake colour at a slope: flakes that lie flat show the first colour,
-    /// those that lean more than most the second.
-    float flop(Vec2f s) const
+    /// those that lean more than most the second. variance: mean squared slope of all of them.
+    static float flop(Vec2f s, float variance)
     {
         float const tilt = s.x * s.x + s.y * s.y;
-        return tilt > 0.0f ? tilt / (tilt + spread) : 0.0f;
+        return tilt > 0.0f ? tilt / (tilt + variance) : 0.0f;
     }
+    float flop(Flake const& f) const { return flop(f.slope, spread); }
 
-    /// Colour that flakes mirror from l to v, for a light of irradiance pi. h: unit.
+    /// What is left of the light along v after one bounce on white flakes, 0..1. What they lose to
+    /// each other, more bounces give back: `glint` is to be divided by it, as by Turquin 2019,
+    /// "Practical Multiple Scattering Compensation for Microfacet Models".
+    float albedo(Vec3f v) const { return flakeAlbedo(std::sqrt(alpha2()), v.z); }
+
+    /// Colour that flakes mirror from l to v in one bounce, for a light of irradiance pi. h: unit.
     Vec3f glint(Vec3f v, Vec3f l, Vec3f h, Vec3f const& color, Vec3f const& color2) const
     {
-        float const alpha2 = kFlakeGloss + spread;
-        // Smith shadowing of the crowd for every flake: they lie in the same layer.
-        auto const shadowing = [alpha2](float c) {
-            return c + std::sqrt(c * c + alpha2 * (1.0f - c * c));
+        // Smith shadowing of all flakes for each: they lie in the same layer.
+        auto const shadowing = [this](float c) {
+            return c + std::sqrt(c * c + alpha2() * (1.0f - c * c));
         };
         float const visible = 1.0f / (shadowing(v.z) * shadowing(l.z));
         Vec3f sum(0.0f, 0.0f, 0.0f);
         if (resolved < 1.0f) {
-            float const t = h.z > 0.0f ? flop({h.x / h.z, h.y / h.z}) : 0.0f;
-            sum = mix(color, color2, t) * ((1.0f - resolved) * facetsAbout(h, {0, 0}, alpha2));
+            float const t =
+                spread > 0.0f && h.z > 0.0f ? flop({h.x / h.z, h.y / h.z}, alpha2()) : 0.0f;
+            sum = mix(color, color2, t) * ((1.0f - resolved) * facetsAbout(h, {0, 0}, alpha2()));
         }
         for (int i = 0; i < count; ++i)
-            sum += mix(color, color2, flop(flake[i].slope))
+            sum += mix(color, color2, flop(flake[i]))
                 * (resolved * flake[i].weight * facetsAbout(h, flake[i].slope, kFlakeGloss));
         return sum * visible;
     }
