@@ -258,74 +258,70 @@ struct Metal {
 };
 inline V3 notBelow0(V3 a) { return {std::max(a.x, 0.f), std::max(a.y, 0.f), std::max(a.z, 0.f)}; }
 inline float lerp(float a, float b, float t) { return a + t * (b - a); }
-struct Cell {
-    int node;
-    float share;
-    Cell(float x, int last)
-        : node(std::min(static_cast<int>(x), last))
-        , share(x - static_cast<float>(node))
-    {
-    }
-};
 inline float pow5(float k)
 {
     float k2 = k * k;
     return k2 * k2 * k;
 }
 struct MetalSeen { // a metal from the direction v
-    float ax, ay, wide, rootWide, stretchedV, lossV, broad;
-    bool even;
-    Cell width, ratio;
+    float ax, ay, a2, least2, uneven, width, power, stretchedV, lossV, broad;
+    int widthNode, powerNode;
     V3 v, r0, bump, further;
 
     MetalSeen(Metal const& m, V3 v_)
         : ax(std::min(std::max(m.rough, 0.001f), 1.f))
         , ay(std::min(std::max(ax * m.anisotropy, 0.001f), 1.f))
-        , wide(std::max(ax, ay))
-        , rootWide(std::sqrt(wide))
-        , even(ax == ay)
-        , width(rootWide * 6, 5)
-        , ratio(even ? 3 : (std::min(ax, ay) / wide - 0.1f) * (3 / 0.9f), 2)
+        , a2(0.5f * (ax * ax + ay * ay))
+        , least2(std::min(ax * ax, ay * ay))
+        , uneven(ax == ay ? 0 : 1 - least2 / a2)
         , v(v_)
         , r0(m.r0)
     {
         constexpr float c = 1 / 7.f, k = (6 / 7.f) * (6 / 7.f) * (6 / 7.f) * (6 / 7.f) * (6 / 7.f);
         V3 one = {1, 1, 1};
         bump = (r0 * (1 - k) + one * k) * (one - m.edge) * (1 / (c * (1 - c) * k));
+        width = a2 * 10.4f / (a2 + 0.3f);
+        widthNode = std::min(static_cast<int>(width), 7);
+        width -= static_cast<float>(widthNode);
+        int bits;
+        std::memcpy(&bits, &a2, sizeof bits);
+        powerNode = (bits >> 22) - 2 * (127 + zsi::kFirstPower);
+        power = static_cast<float>(bits & 0x3fffff) * 0x1p-22f;
         stretchedV = stretched(v);
-        lossV = loss(v);
-        Cell w(rootWide * 12, 11);
-        float const* t = &zsi::kMeanFacetLoss[w.node][ratio.node];
-        float lost =
-            wide * lerp(lerp(t[0], t[1], ratio.share), lerp(t[4], t[5], ratio.share), w.share);
-        V3 mean = notBelow0(r0 * (20 / 21.f) + one * (1 / 21.f) - bump * (1 / 126.f));
-        V3 rest = one - mean * lost;
-        V3 F2 = mean * mean * (1 - lost);
+        lossV = loss(v, stretchedV);
+        float lost = mean(0);
+        if (uneven != 0)
+            lost += uneven * (mean(1) + uneven * mean(2));
+        lost *= a2;
+        V3 average = notBelow0(r0 * (20 / 21.f) + one * (1 / 21.f) - bump * (1 / 126.f));
+        V3 rest = one - average * lost;
+        V3 F2 = average * average * (1 - lost);
         further = {F2.x / rest.x, F2.y / rest.y, F2.z / rest.z};
-        broad = lossV > 0 ? lossV * kInvPi / lost : 0;
+        broad = lossV * kInvPi / lost;
+    }
+    float mean(int column) const
+    {
+        return lerp(zsi::kMeanFacetLoss[powerNode][column],
+                    zsi::kMeanFacetLoss[powerNode + 1][column], power);
     }
     float stretched(V3 w) const
     {
         float x = ax * w.x, y = ay * w.y;
         return std::sqrt(x * x + y * y + w.z * w.z);
     }
-    float loss(V3 w) const
+    float loss(V3 w, float stretch) const
     {
-        constexpr int kStepWidth = 4 * 9 * 5, kStepRatio = 9 * 5, kStepCosine = 5;
-        Cell c(w.z * (1 + wide) / (w.z + wide) * 8, 7);
-        float const* t = &zsi::kFacetLoss[width.node][0][c.node][0];
-        auto cosines = [&](float const* p) { return lerp(p[0], p[kStepCosine], c.share); };
-        if (even) {
-            t += 3 * kStepRatio;
-            return lerp(cosines(t), cosines(t + kStepWidth), width.share);
-        }
-        Cell a(std::fabs(ax >= ay ? w.x : w.y) / std::sqrt(w.x * w.x + w.y * w.y) * 4, 3);
-        t += ratio.node * kStepRatio + a.node;
-        auto azimuths = [&](float const* p) { return lerp(cosines(p), cosines(p + 1), a.share); };
-        auto ratios = [&](float const* p) {
-            return lerp(azimuths(p), azimuths(p + kStepRatio), ratio.share);
+        float k = 1 / stretch, t = w.z * k * 16;
+        int node = std::min(static_cast<int>(t), 15);
+        t -= static_cast<float>(node);
+        float const* p = zsi::kFacetLoss[widthNode][node];
+        auto term = [&](int i) {
+            return lerp(lerp(p[i], p[i + 3], t), lerp(p[i + 51], p[i + 54], t), width);
         };
-        return lerp(ratios(t), ratios(t + kStepWidth), width.share);
+        float sum = term(0);
+        if (uneven != 0)
+            sum += uneven * (term(1) + term(2) * (least2 * (1 - w.z * w.z) * (k * k)));
+        return std::max(sum, 0.f);
     }
     V3 fresnel(float c) const
     {
@@ -338,17 +334,18 @@ struct MetalSeen { // a metal from the direction v
         V3 h = v + l;
         float hh = dot(h, h), x = h.x / ax, y = h.y / ay, r = hh / (x * x + y * y + h.z * h.z);
         density = r * r / (kPi * ax * ay);
-        float once = density * (0.5f / (v.z * stretched(l) + l.z * stretchedV));
+        float stretchedL = stretched(l);
+        float once = density * (0.5f / (v.z * stretchedL + l.z * stretchedV));
         V3 single = fresnel(std::min(0.5f * std::sqrt(hh), 1.f)) * once;
-        return single + further * (broad * loss(l));
+        return single + further * (broad * loss(l, stretchedL));
     }
     float sample(float pick, float u1, float u2, V3& l, V3& out) const
     {
         float s, c;
         sincosf(6.283185f * u1, &s, &c);
         if (pick < lossV) {
-            float r = std::sqrt(u2);
-            l = {r * c, r * s, std::sqrt(1 - u2)};
+            float z2 = a2 * (std::exp(u2 * mean(3)) - 1), r = std::sqrt(std::max(0.f, 1 - z2));
+            l = {r * c, r * s, std::sqrt(z2)};
         } else {
             float k = 1 / stretchedV, vz = v.z * k, z = (1 - u2) * (1 + vz) - vz;
             float r = std::sqrt(std::max(0.f, 1 - z * z));
@@ -359,7 +356,8 @@ struct MetalSeen { // a metal from the direction v
         }
         float density;
         out = value(l, density);
-        return (1 - lossV) * density / (2 * (v.z + stretchedV)) + lossV * l.z * kInvPi;
+        return (1 - lossV) * density / (2 * (v.z + stretchedV))
+            + lossV * l.z * kInvPi / ((l.z * l.z + a2) * mean(3));
     }
 };
 

@@ -56,16 +56,15 @@ test::MirrorMap mapOf(float rough, float anisotropy, D3 v)
 TEST(Metal, WhiteMetalReturnsAllLight)
 {
     for (float rough : {0.02f, 0.1f, 0.25f, 0.5f, 0.8f, 1.0f})
-        for (float anisotropy : {1.0f, 0.6f, 0.3f, 0.1f})
-            for (double cosine : {0.1, 0.3, 0.6, 0.95})
+        for (float anisotropy : {1.0f, 0.6f, 0.1f, 10.0f})
+            for (double cosine : {0.02, 0.1, 0.3, 0.6, 0.95})
                 for (double azimuth : {0.1, 0.8, 1.5}) {
                     if (anisotropy == 1 && azimuth > 0.1)
                         continue;
                     D3 const v = viewAt(cosine, azimuth);
                     double const returned =
                         albedo(whiteMetal(rough, anisotropy), mapOf(rough, anisotropy, v), 96);
-                    // The grid itself is good to 0.1 %.
-                    EXPECT_LT(returned, 1.001) << rough << " " << anisotropy << " " << cosine;
+                    EXPECT_LT(returned, 1.01) << rough << " " << anisotropy << " " << cosine;
                     EXPECT_GT(returned, 0.96) << rough << " " << anisotropy << " " << cosine;
                 }
 }
@@ -120,6 +119,7 @@ TEST(Metal, SamplesFollowTheirDensityAndCarryTheValueOfTransfer)
             ASSERT_EQ(s.sampleType, 2u);
             check.accept(s.sampleDirection, double(s.sampleInvPdf));
             double const weight = double(s.outBrdf.x) * double(s.sampleCosine * s.sampleInvPdf);
+            EXPECT_LT(weight, 2.6); // no fireflies
             red += weight;
             redSquares += weight * weight;
             if (i % 16)
@@ -221,34 +221,73 @@ TEST(Metal, FrameIsBentByThePatternThenTheFacetsThenRotated)
     }
 }
 
-TEST(Metal, LightsCountWithTheValueOfTransferAndTheMirrorRayWithTheAlbedo)
+TEST(Metal, LightsCountAsTransferTimesPiAboveTheSurface)
 {
     test::ScriptedHost host;
     corvid_Mtl_Metal metal = whiteMetal(0.4f, 0.5f);
     metal.u_reflectColor = {0.9f, 0.5f, 0.2f};
-    ShadeState s = hitFrom(viewAt(0.7, 0.5));
-    // 0.125 above the horizon: (0.075 / 0.2)^2 (3 - 2 x 0.075 / 0.2) of the light.
-    Vec3f const L =
-        normalize({-0.99f, 0.1f, 0.0f}) * std::sqrt(1 - 0.015625f) + Vec3f(0, 0, 0.125f);
-    for (float side : {1.0f, -1.0f}) { // metal has two equal faces
-        s.N = s.Ng = {0, 0, side};
-        host.lights.clear();
-        metal.shade(&host, s);
-        EXPECT_EQ(rgb(s.Ci), grey(0));
-        host.addLight(L, {2, 3, 4}, {1, 0.5f, 0.25f}, 0.6f);
-        metal.shade(&host, s);
-        Vec3f const want = transferTo(metal, s, L) * Vec3f(2, 1.5f, 1) * (0.6f * 0.31640625f);
-        EXPECT_GT(want.x, 0.0f);
-        EXPECT_TRUE(test::near(rgb(s.Ci), want, 1e-4 * double(length(want))));
-    }
-    test::Trial<corvid_Mtl_Metal> white{whiteMetal(0.4f, 0.25f), {}, s};
-    white.host.onTrace = [](Vec3f, Vec3f) { return Vec3f(1, 1, 1); };
-    EXPECT_TRUE(test::near(white.shade(), {1, 1, 1, 1}, 1e-5)); // all light comes back
-    ASSERT_EQ(white.host.count("traceSpecular"), 1);
-    test::Call const& ray = white.host.calls.back();
-    EXPECT_TRUE(test::near(ray.vectors[1], Vec3f(s.I.x, s.I.y, -s.I.z), 1e-6));
-    EXPECT_NEAR(ray.scalars[0], 0.2f, 1e-6f); // spread: mean of 0.4 and 0.1
-    EXPECT_NEAR(ray.scalars[1], 1.0f, 1e-5f);
+    for (float side : {1.0f, -1.0f}) // metal has two equal faces
+        for (float height : {0.6f, 0.01f, -0.01f}) {
+            ShadeState s = hitFrom(viewAt(0.7, 0.5));
+            s.Ng = {0, 0, side};
+            s.N = Vec3f(-0.28f, 0, 0.96f) * side; // leans to the light, also when it is below
+            Vec3f const L = normalize({-0.99f, 0.1f, 0.0f}) * std::sqrt(1 - height * height)
+                + Vec3f(0, 0, height);
+            host.lights.clear();
+            host.addLight(L, {2, 3, 4}, {1, 0.5f, 0.25f}, 0.6f);
+            metal.shade(&host, s);
+            Vec3f const value = transferTo(metal, s, L);
+            EXPECT_EQ(value.x > 0, height > 0);
+            Vec3f const want = value * Vec3f(2, 1.5f, 1) * (0.6f * 3.14159265f);
+            EXPECT_TRUE(test::near(rgb(s.Ci), want, 1e-4 * double(length(want)))) << height;
+        }
+}
+
+/// In a white room `shade`, whose ray is drawn from the lobe, shows what paths show; where normals
+/// lean, nothing is sought below the surface.
+TEST(Metal, TracesItsLobe)
+{
+    test::Trial<corvid_Mtl_Metal> t;
+    test::Random random;
+    t.host.randoms.resize(3);
+    t.host.onTrace = [&](Vec3f, Vec3f d) {
+        EXPECT_GT(dot(d, t.state.Ng), 0.0f);
+        return Vec3f(1, 1, 1);
+    };
+    auto const shown = [&](auto const& mayBe, int draws) {
+        double sum = 0, squares = 0;
+        for (int i = 0; i < draws; ++i) {
+            for (float& u : t.host.randoms)
+                u = random.in(0, 1);
+            double const red = double(t.shade().x);
+            for (test::Call const& call : t.host.calls)
+                EXPECT_TRUE(call.service != "traceSpecular" || call.scalars[0] == 0)
+                    << "no spread beside the lobe's own";
+            sum += red;
+            squares += red * red;
+        }
+        double const mean = sum / draws;
+        mayBe(mean, std::sqrt((squares / draws - mean * mean) / draws));
+    };
+    for (double cosine : {0.9, 0.25, 0.02})
+        for (float anisotropy : {1.0f, 0.2f}) {
+            t.shader = whiteMetal(0.5f, anisotropy);
+            t.shader.u_reflectColor = {0.2f, 0, 0};
+            t.shader.u_edgeColor = {0.1f, 0, 0};
+            D3 const v = viewAt(cosine, 0.6);
+            t.state = hitFrom(v);
+            shown(
+                [&](double mean, double error) {
+                    EXPECT_NEAR(mean, albedo(t.shader, mapOf(0.5f, anisotropy, v), 128),
+                                4 * error + 0.002);
+                },
+                8000);
+        }
+    // Bent so far that the plain mirror direction is below the surface.
+    t.shader = whiteMetal(0.02f, 1);
+    t.state = hitFrom(viewAt(0.4, 0));
+    t.state.N = normalize({-0.9f, 0.2f, 0.4f});
+    shown([](double mean, double) { EXPECT_GT(mean, 0.7) << "no black rim"; }, 500);
 }
 
 TEST(Metal, ReflectanceGoesFromTheColourThroughTheTintToWhite)
@@ -267,7 +306,7 @@ TEST(Metal, ReflectanceGoesFromTheColourThroughTheTintToWhite)
     Vec3f const schlick = r0 + (grey(1) - r0) * 0.46266436f;
     for (float tint : {1.0f, 0.5f, 0.1f}) {
         t.shader.u_edgeColor = grey(tint);
-        EXPECT_TRUE(test::near(reflectance(1 / 7.0), schlick * tint, 2e-3)) << tint;
+        EXPECT_TRUE(test::near(reflectance(1 / 7.0), schlick * tint, 4e-3)) << tint;
     }
 }
 
@@ -283,6 +322,8 @@ TEST(Metal, HolesShowLetThroughAndAreSampledInTheirShare)
     ShadeState s = hitFrom(viewAt(0.8, 0));
     Vec3f const L(0.6f, 0, 0.8f);
     Vec3f const solid = transferTo(whiteMetal(0.3f, 1), s, L);
+    whiteMetal(0.3f, 1).shade(&host, s);
+    float const ray = s.Ci.x; // always by the same random numbers
     for (float amount : {0.0f, 1.0f, 2.0f, 9.0f}) { // keeps 0, 1/2, 1, 1
         metal.u_cutoutAmount = amount;
         float const keep = std::min(1.0f, 0.5f * amount);
@@ -290,9 +331,10 @@ TEST(Metal, HolesShowLetThroughAndAreSampledInTheirShare)
         EXPECT_EQ(s.transmissionColor, grey(1 - keep));
         EXPECT_NEAR(transferTo(metal, s, L).x, keep * solid.x, 1e-6f);
         host.calls.clear();
+        host.randoms = {0.5f};
         metal.shade(&host, s);
-        EXPECT_NEAR(s.Ci.x, keep, 1e-5f);
-        EXPECT_NEAR(s.Ci.z, 1, 1e-5f);
+        EXPECT_NEAR(s.Ci.x, keep * ray, 1e-5f);
+        EXPECT_NEAR(s.Ci.z, keep * ray + 1 - keep, 1e-5f);
         EXPECT_EQ(host.count("traceThrough"), keep < 1);
         EXPECT_TRUE(keep == 1 || host.calls[0].scalars[0] == 1 - keep) << "importance";
         EXPECT_EQ(host.count("traceSpecular"), keep > 0);
@@ -350,6 +392,9 @@ TEST(Metal, StaysFiniteAtTheEndsOfEveryRange)
             test::setAttribute(s, kTangent, Vec3f(0, 0, i % 2 ? 1.0f : 0.0f)); // no tangent
         for (float& u : host.randoms)
             u = i % 7 ? random.in(0, 1) : 0;
+        metal.maskingColor = {end(), end(), end()};
+        metal.shade(&host, s);
+        EXPECT_GE(minComponent(rgb(s.Ci)), 0.0f) << i;
         s.sampleType = 99;
         metal.sample(&host, s);
         ASSERT_NE(s.sampleType, 99u);

@@ -1,8 +1,6 @@
 #include "materials/physical/corvid_Mtl_Metal.h"
 
 #include "materials/physical/gradientRamp.h"
-#include "materials/physical/metalLobe.h"
-#include "materials/physical/shared/lightFade.h"
 #include "materials/physical/shared/shadingFrame.h"
 #include "materials/physical/shared/straightThrough.h"
 #include "materials/physical/shared/textureChannel.h"
@@ -52,28 +50,34 @@ void corvid_Mtl_Metal::f_computeShadingFrameNative(IShaderAPI* api, ShadeState c
         bendByFacets(api, state, frame);
 }
 
-/// The whole frame by value, so that one that nothing bends need not be in memory for this.
-SLArray<Vec3f> corvid_Mtl_Metal::bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f Nf) const
+/// Frame of a normal that mirrors above the surface. The whole frame by value, so that one that
+/// nothing bends need not be in memory for this. Nf, Ng: on the ray's side.
+SLArray<Vec3f>
+corvid_Mtl_Metal::bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f Nf, Vec3f Ng) const
 {
     SLArray<Vec3f> frame;
     f_computeShadingFrameNative(api, state, state.P, Nf, Mat3f(state.objectToWorld), frame);
-    if (u_bumpSwitcher == 1)
-        normalizeAndReorthogonalize(frame);
+    frame[2] = mirroringNormal(-state.I, Ng, normalize(frame[2]));
+    reorthogonalize(frame);
     return frame;
 }
 
-/// Orthonormal frame of the lobe, tangent along the brush marks.
-inline SLArray<Vec3f> corvid_Mtl_Metal::lobeFrame(IShaderAPI* api, ShadeState const& state,
-                                                  Vec3f const& Nf) const
+[[gnu::always_inline]] inline corvid_Mtl_Metal::Surface
+corvid_Mtl_Metal::surface(IShaderAPI* api, ShadeState const& state) const
 {
-    SLArray<Vec3f> frame;
+    float const side = -facingSign(state.I, state.Ng);
+    Vec3f const Nf = state.N * side;
+    Surface s;
+    s.Ng = state.Ng * side;
     if (u_patternEnable || u_bumpSwitcher == 1) [[unlikely]]
-        frame = bentFrame(api, state, scalars(Nf));
+        s.frame = bentFrame(api, state, scalars(Nf), scalars(s.Ng));
     else
-        frame = computeBaseFrame(attribute_tangent(state), Nf, Mat3f(state.objectToWorld));
-    orthonormalTangent(frame);
-    f_anisoRotateFrame(api, state, frame, 0.0f);
-    return frame;
+        s.frame = computeBaseFrame(attribute_tangent(state), mirroringNormal(-state.I, s.Ng, Nf),
+                                   Mat3f(state.objectToWorld));
+    orthonormalTangent(s.frame);
+    f_anisoRotateFrame(api, state, s.frame, 0.0f);
+    s.v = toLocal(s.frame, -state.I);
+    return s;
 }
 
 inline AnisotropicGgx corvid_Mtl_Metal::facets(ShadeState const& state) const
@@ -90,16 +94,17 @@ inline AnisotropicGgx corvid_Mtl_Metal::facets(ShadeState const& state) const
     return {maxOf(ax, ay * FacetLoss::kLeastRatio), maxOf(ay, ax * FacetLoss::kLeastRatio)};
 }
 
-/// Share of the surface that the cut-out keeps, 0..1.
+/// Part of the surface that the cut-out keeps, 0..1.
 inline float corvid_Mtl_Metal::coverage(ShadeState const& state) const
 {
     if (u_cutoutMapEnable) [[unlikely]]
-        return clamp01(
+        return saturate(
             mappedValue(u_cutoutMap, u_cutoutTransform, u_cutoutAmount, attribute_uv(state)));
     return 1.0f;
 }
 
-inline MetalLobe corvid_Mtl_Metal::lobe(ShadeState const& state, Vec3f const& v) const
+[[gnu::always_inline]] inline MetalLobe corvid_Mtl_Metal::lobe(ShadeState const& state,
+                                                               Vec3f const& v) const
 {
     Vec3f r0 = u_reflectColor, edge = u_edgeColor;
     if (u_reflectMapEnable) [[unlikely]]
@@ -107,6 +112,18 @@ inline MetalLobe corvid_Mtl_Metal::lobe(ShadeState const& state, Vec3f const& v)
     if (u_edgeMapEnable) [[unlikely]]
         edge = mappedColor(u_edgeMap, u_edgeTransform, u_edgeAmount, attribute_uv(state));
     return {facets(state), ConductorFresnel(saturate(r0), saturate(edge)), v};
+}
+
+/// A direction of the lobe; density 0 where it is below the surface.
+inline corvid_Mtl_Metal::Reflected
+corvid_Mtl_Metal::sampleReflected(IShaderAPI* api, MetalLobe const& metal, Surface const& s)
+{
+    float const pick = api->random();
+    Reflected r{{}, metal.sample(pick, api->random2D())};
+    r.direction = toWorld(s.frame, r.sample.l);
+    if (!(dot(s.Ng, r.direction) > 0.0f))
+        r.sample.pdf = 0.0f;
+    return r;
 }
 
 void corvid_Mtl_Metal::f_calculateColors(IShaderAPI* api, ShadeState const& state,
@@ -120,33 +137,28 @@ void corvid_Mtl_Metal::f_calculateColors(IShaderAPI* api, ShadeState const& stat
         if (opacity == 0.0f)
             return;
     }
-    float const side = -facingSign(state.I, state.Ng);
-    Vec3f const Ngf = state.Ng * side;
-    SLArray<Vec3f> const frame = lobeFrame(api, state, state.N * side);
-    Vec3f const& N = frame[2];
-    Vec3f v = toLocal(frame, -state.I);
-    bool const seen = v.z > 0.0f;
-    if (!seen)
-        v.z = 0.0f; // a bump that faces away still mirrors, at grazing incidence
-    MetalLobe const metal = lobe(state, v);
+    Surface const s = surface(api, state);
+    if (!(s.v.z > 0.0f))
+        return;
+    MetalLobe const metal = lobe(state, s.v);
+    Vec3f const& N = s.frame[2];
+    for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
+         light = light->next) {
+        Vec3f const l = toLocal(s.frame, light->L);
+        if (!(l.z > 0.0f && dot(light->L, s.Ng) > 0.0f))
+            continue;
+        // A light's colour is its irradiance over pi.
+        out.lit += light->color * light->shadow * metal.value(l) * (light->weight * kPi * opacity);
+    }
 
-    if (seen)
-        for (LightSample const* light = api->getLightSamples(0, &state.P, &N); light;
-             light = light->next) {
-            float const fade = lightFade(dot(light->L, Ngf));
-            Vec3f const l = toLocal(frame, light->L);
-            if (fade == 0.0f || !(l.z > 0.0f))
-                continue;
-            out.lit +=
-                light->color * light->shadow * metal.value(l) * (light->weight * fade * opacity);
-        }
-
-    out.reflectionWeight = metal.albedo() * opacity;
+    Reflected const r = sampleReflected(api, metal, s);
+    if (!(r.sample.pdf > 0.0f))
+        return;
+    out.reflectionWeight = r.sample.value * (r.sample.l.z / r.sample.pdf * opacity);
     if (out.reflectionWeight == kBlack)
         return;
-    Vec3f const R = f_safe_reflect(api, state, state.I, Ngf, N);
     out.reflection =
-        api->traceSpecular(&state.P, &R, metal.spread(), maxComponent(out.reflectionWeight))
+        api->traceSpecular(&state.P, &r.direction, 0.0f, maxComponent(out.reflectionWeight))
         * out.reflectionWeight;
 }
 
@@ -162,16 +174,14 @@ void corvid_Mtl_Metal::transmission(IShaderAPI*, ShadeState& state) const
 
 void corvid_Mtl_Metal::transfer(IShaderAPI* api, ShadeState& state) const
 {
-    Vec3f const Nf = -state.N * facingSign(state.I, state.Ng);
-    SLArray<Vec3f> const frame = lobeFrame(api, state, Nf);
-    Vec3f const v = toLocal(frame, -state.I);
-    Vec3f const l = toLocal(frame, state.sampleDirection);
-    if (!(v.z > 0.0f && l.z > 0.0f && dot(Nf, state.sampleDirection) > 0.0f)) {
+    Surface const s = surface(api, state);
+    Vec3f const l = toLocal(s.frame, state.sampleDirection);
+    if (!(s.v.z > 0.0f && l.z > 0.0f && dot(s.Ng, state.sampleDirection) > 0.0f)) {
         state.outBrdf = kBlack;
         state.sampleCosine = 0.0f;
         return;
     }
-    state.outBrdf = lobe(state, v).value(l) * coverage(state);
+    state.outBrdf = lobe(state, s.v).value(l) * coverage(state);
     state.sampleCosine = l.z;
 }
 
@@ -192,22 +202,16 @@ void corvid_Mtl_Metal::sample(IShaderAPI* api, ShadeState& state) const
     state.sampleType = kSampleNone;
     if (!mayReflect || opacity == 0.0f)
         return;
-    Vec3f const Nf = -state.N * facingSign(state.I, state.Ng);
-    SLArray<Vec3f> const frame = lobeFrame(api, state, Nf);
-    Vec3f const v = toLocal(frame, -state.I);
-    if (!(v.z > 0.0f))
+    Surface const s = surface(api, state);
+    if (!(s.v.z > 0.0f))
         return;
-    float const pick = api->random();
-    MetalLobe::Sample const s = lobe(state, v).sample(pick, api->random2D());
-    if (!(s.pdf > 0.0f))
+    Reflected const r = sampleReflected(api, lobe(state, s.v), s);
+    if (!(r.sample.pdf > 0.0f))
         return;
-    Vec3f const direction = toWorld(frame, s.l);
-    if (!(dot(Nf, direction) > 0.0f)) // below the surface that is not bent
-        return;
-    state.sampleDirection = direction;
-    state.outBrdf = s.value * opacity;
-    state.sampleCosine = s.l.z;
-    state.sampleInvPdf = 1.0f / (s.pdf * chance);
+    state.sampleDirection = r.direction;
+    state.outBrdf = r.sample.value * opacity;
+    state.sampleCosine = r.sample.l.z;
+    state.sampleInvPdf = 1.0f / (r.sample.pdf * chance);
     state.sampleType = (state.allowReflection[0] | state.allowReflection[1]) != 0 ? kSampleMixture
                                                                                   : kSampleStraight;
 }

@@ -1,7 +1,7 @@
 #pragma once
 
+#include "materials/physical/metalLobe.h"
 #include "materials/physical/shared/anisoRotation.h"
-#include "materials/physical/shared/ggx.h"
 #include "materials/physical/shared/materialSkeleton.h"
 #include "materials/physical/shared/safeReflect.h"
 
@@ -46,8 +46,6 @@ namespace zsi {
     U(Mat3f, u_cutoutTransform, "UV transform of the cut-out map")                              \
     P(float, u_cutoutAmount, (1.0f), "multiplier of the cut-out map")
 
-class MetalLobe;
-
 class corvid_Mtl_Metal final : public MaterialShader,
                                public PhysicalShading<corvid_Mtl_Metal>,
                                public AnisoRotationFunctions<corvid_Mtl_Metal>,
@@ -69,12 +67,23 @@ public:
                                      SLArray<Vec3f>& frame) const;
 
 private:
-    SLArray<Vec3f> bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f Nf) const;
+    /// What a ray meets: the lobe's orthonormal frame, its tangent along the brush marks, the
+    /// geometric normal on the ray's side, and the way back in the frame.
+    struct Surface {
+        SLArray<Vec3f> frame;
+        Vec3f Ng, v;
+    };
+    struct Reflected {
+        Vec3f direction;
+        MetalLobe::Sample sample;
+    };
+    SLArray<Vec3f> bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f Nf, Vec3f Ng) const;
     void bendByFacets(IShaderAPI* api, ShadeState const& state, SLArray<Vec3f>& frame) const;
-    SLArray<Vec3f> lobeFrame(IShaderAPI* api, ShadeState const& state, Vec3f const& Nf) const;
+    Surface surface(IShaderAPI* api, ShadeState const& state) const;
     AnisotropicGgx facets(ShadeState const& state) const;
     float coverage(ShadeState const& state) const;
     MetalLobe lobe(ShadeState const& state, Vec3f const& v) const;
+    static Reflected sampleReflected(IShaderAPI* api, MetalLobe const& metal, Surface const& s);
 };
 
 } // namespace zsi

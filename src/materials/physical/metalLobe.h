@@ -54,49 +54,39 @@ public:
         , loss_(facets)
         , v_(v)
         , stretchedV_(facets.stretched(v))
-        , lossV_(loss_(v))
+        , lossV_(loss_(v, stretchedV_))
     {
         // What the facets return after two and more bounces, of what they lose after one.
         float const lost = loss_.mean();
         Vec3f const F = fresnel.mean();
         Vec3f const rest = grey(1.0f) - F * lost;
-        float const meanAlbedo = 1.0f - lost;
-        further_ = {F.x * F.x * meanAlbedo / rest.x, F.y * F.y * meanAlbedo / rest.y,
-                    F.z * F.z * meanAlbedo / rest.z};
-        broad_ = lossV_ > 0.0f ? lossV_ * kInvPi / lost : 0.0f;
+        float const albedo = 1.0f - lost;
+        further_ = {F.x * F.x * albedo / rest.x, F.y * F.y * albedo / rest.y,
+                    F.z * F.z * albedo / rest.z};
+        broad_ = lossV_ * kInvPi / lost;
     }
 
     /// Scattering value, without the cosine.
     Vec3f value(Vec3f l) const { return value(l, Facet(facets_, v_ + l)); }
-
-    /// Share of light from v that leaves, taking the reflectance of the mirror direction for all.
-    Vec3f albedo() const { return fresnel_(v_.z) * (1.0f - lossV_) + further_ * lossV_; }
-
-    /// One width for a traced cone: the mean of both.
-    float spread() const { return std::sqrt(facets_.ax * facets_.ay); }
 
     struct Sample {
         Vec3f l;
         Vec3f value;
         float pdf; ///< 1/sr; 0 where l is below the surface
     };
-    /// A direction by the single bounces, or by the cosine as often as light bounces further.
+    /// A direction by the single bounces, or by the broad lobe as often as light bounces further.
+    /// pick, u: in [0, 1).
     Sample sample(float pick, Vec2f u) const
     {
         Sample s;
-        if (pick < lossV_) {
-            float const r = std::sqrt(u.y), phi = 2.0f * kPi * u.x;
-            s.l = {r * std::cos(phi), r * std::sin(phi), std::sqrt(1.0f - u.y)};
-        } else {
-            s.l = facets_.mirrorVisible(v_, stretchedV_, u);
-        }
+        s.l = pick < lossV_ ? loss_.sample(u) : facets_.mirrorVisible(v_, stretchedV_, u);
         s.pdf = 0.0f;
         if (!(s.l.z > 0.0f))
             return s;
         Facet const facet(facets_, v_ + s.l);
         s.value = value(s.l, facet);
         s.pdf = (1.0f - lossV_) * AnisotropicGgx::reflectedDensity(facet.density, v_.z, stretchedV_)
-            + lossV_ * s.l.z * kInvPi;
+            + lossV_ * loss_.density(s.l.z);
         return s;
     }
 
@@ -115,10 +105,10 @@ private:
 
     Vec3f value(Vec3f l, Facet facet) const
     {
-        float const once = facet.density
-            * AnisotropicGgx::visibility(v_.z, stretchedV_, l.z, facets_.stretched(l));
-        Vec3f const single = fresnel_(facet.cosine) * once;
-        return broad_ > 0.0f ? single + further_ * (broad_ * loss_(l)) : single;
+        float const stretched = facets_.stretched(l);
+        float const once =
+            facet.density * AnisotropicGgx::visibility(v_.z, stretchedV_, l.z, stretched);
+        return fresnel_(facet.cosine) * once + further_ * (broad_ * loss_(l, stretched));
     }
 
     AnisotropicGgx facets_;

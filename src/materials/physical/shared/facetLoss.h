@@ -4,6 +4,7 @@
 #include "materials/physical/shared/facetLossTable.h"
 #include "materials/physical/shared/ggx.h"
 
+#include <bit>
 #include <cstdint>
 
 namespace zsi {
@@ -28,82 +29,108 @@ struct TablePosition {
 
 /// Multiple scattering between facets of two widths as a broad, reciprocal lobe,
 ///   loss(v) loss(l) / (pi mean) x colour:
-/// Kulla and Conty 2017, "Revisiting Physically Based Shading at Imageworks". The loss depends on
-/// the azimuth where the widths differ.
+/// Kulla and Conty 2017, "Revisiting Physically Based Shading at Imageworks".
+///
+/// The loss is read at the direction's cosine over its stretched length: in that measure narrow
+/// facets of every width, ratio and azimuth lose alike, and what wide ones differ is smooth
+/// (scripts/facetLossTable.cpp tells the terms).
 class FacetLoss {
 public:
     /// The table reaches to this ratio of the widths.
     static constexpr float kLeastRatio = 0.1f;
 
-    /// Widths in (0, 1], at most 1 : 10.
+    /// Widths in [0.001, 1], at most 1 : 10.
     explicit FacetLoss(AnisotropicGgx facets)
-        : wide_(maxOf(facets.ax, facets.ay))
-        , rootWide_(std::sqrt(wide_))
-        , alongX_(facets.ax >= facets.ay)
-        , isotropic_(facets.ax == facets.ay)
-        , width_(rootWide_ * (kWidths - 1))
-        , ratio_(isotropic_ ? kRatios - 1.0f
-                            : (minOf(facets.ax, facets.ay) / wide_ - kLeastRatio)
-                         * ((kRatios - 1) / (1.0f - kLeastRatio)))
+        : FacetLoss(facets.ax * facets.ax, facets.ay * facets.ay)
     {
     }
 
     /// Mean of the loss over the hemisphere, weighted with the cosine.
     float mean() const
     {
-        TablePosition<kMeanWidths> const width(rootWide_ * (kMeanWidths - 1));
-        float const* const cell = flat(kMeanFacetLoss) + (width.node * kRatios + ratio_.node);
-        float const below = lerp(cell[0], cell[1], ratio_.fraction);
-        float const above = lerp(cell[kRatios], cell[kRatios + 1], ratio_.fraction);
-        return wide_ * lerp(below, above, width.fraction);
+        float mean = power_.at(kMeanFacetLoss, 0);
+        if (unevenness_ != 0.0f) {
+            float const d = unevenness_;
+            mean += d * (power_.at(kMeanFacetLoss, 1) + d * power_.at(kMeanFacetLoss, 2));
+        }
+        return a2_ * mean;
     }
 
     /// Share of the light along w that single bounces on perfect mirrors do not send out.
-    float operator()(Vec3f w) const
+    /// stretched: `AnisotropicGgx::stretched` of w.
+    float operator()(Vec3f w, float stretched) const
     {
-        TablePosition<kCosines> const cosine(w.z * (1.0f + wide_) / (w.z + wide_) * (kCosines - 1));
-        float const* const cell =
-            flat(kFacetLoss) + (width_.node * kWidthStep + cosine.node * kCosineStep);
-        auto const across = [&](float const* at) {
-            return lerp(at[0], at[kCosineStep], cosine.fraction);
+        float const scale = 1.0f / stretched;
+        TablePosition<kCosines> const t(w.z * scale * (kCosines - 1));
+        float const* const cell = &kFacetLoss[0][0][0] + width_.node * kWidthStep + t.node * kTerms;
+        auto const term = [&](int k) {
+            return lerp(lerp(cell[k], cell[k + kTerms], t.fraction),
+                        lerp(cell[k + kWidthStep], cell[k + kWidthStep + kTerms], t.fraction),
+                        width_.fraction);
         };
-        if (isotropic_) { // the same at every azimuth
-            float const* const even = cell + (kRatios - 1) * kRatioStep;
-            return lerp(across(even), across(even + kWidthStep), width_.fraction);
+        float loss = term(0);
+        if (unevenness_ != 0.0f) {
+            float const narrowness = least2_ * (1.0f - w.z * w.z) * (scale * scale);
+            loss += unevenness_ * (term(1) + term(2) * narrowness);
         }
-        float const side = std::sqrt(w.x * w.x + w.y * w.y);
-        TablePosition<kAzimuths> const azimuth(std::fabs(alongX_ ? w.x : w.y) / side
-                                               * (kAzimuths - 1));
-        auto const around = [&](float const* at) {
-            return lerp(across(at), across(at + 1), azimuth.fraction);
-        };
-        auto const along = [&](float const* at) {
-            return lerp(around(at), around(at + kRatioStep), ratio_.fraction);
-        };
-        float const* const uneven = cell + (ratio_.node * kRatioStep + azimuth.node);
-        return lerp(along(uneven), along(uneven + kWidthStep), width_.fraction);
+        return maxOf(loss, 0.0f);
+    }
+
+    /// Density over the hemisphere that falls off as the loss of narrow facets does towards the
+    /// normal, cos / (cos^2 + a^2), so that loss x cosine over it has no peak; 1/sr.
+    float density(float cosine) const
+    {
+        return cosine * kInvPi / ((cosine * cosine + a2_) * logRange());
+    }
+    /// A direction of that density; it may point below the horizon. u: in [0, 1).
+    Vec3f sample(Vec2f u) const
+    {
+        // From the cumulative log(1 + cos^2 / a^2). The table's logarithm is never too small: what
+        // it adds lies above cosine 1 and is turned down.
+        float const z2 = a2_ * (std::exp(u.y * logRange()) - 1.0f), side2 = 1.0f - z2;
+        float const r = std::sqrt(maxOf(side2, 0.0f)), phi = 2.0f * kPi * u.x;
+        return {r * std::cos(phi), r * std::sin(phi), side2 < 0.0f ? -1.0f : std::sqrt(z2)};
     }
 
 private:
-    static constexpr int kWidths = 7, kMeanWidths = 13, kRatios = 4, kCosines = 9, kAzimuths = 5;
-    // From a node to its neighbour: the table is read as one row, with fixed steps from one
-    // address.
-    static constexpr int kCosineStep = kAzimuths, kRatioStep = kCosines * kCosineStep,
-                         kWidthStep = kRatios * kRatioStep;
+    static constexpr int kWidths = 9, kCosines = 17, kTerms = 3, kWidthStep = kCosines * kTerms;
     static_assert(sizeof kFacetLoss == sizeof(float) * kWidths * kWidthStep);
-    static_assert(sizeof kMeanFacetLoss == sizeof(float) * kMeanWidths * kRatios);
 
-    template <class Table>
-    static float const* flat(Table const& table)
-    {
-        return reinterpret_cast<float const*>(&table);
-    }
     static float lerp(float a, float b, float t) { return a + t * (b - a); }
 
-    float wide_, rootWide_;
-    bool alongX_, isotropic_;
+    /// x, the squared width, between the powers of 2 and their half-ways.
+    struct Power {
+        std::int32_t node;
+        float fraction;
+
+        explicit Power(float x)
+        {
+            std::int32_t const bits = std::bit_cast<std::int32_t>(x);
+            node = (bits >> 22) - 2 * (127 + kFirstPower);
+            fraction = static_cast<float>(bits & 0x3fffff) * 0x1p-22f;
+        }
+        template <class Table>
+        float at(Table const& table, int column) const
+        {
+            return lerp(table[node][column], table[node + 1][column], fraction);
+        }
+    };
+    float logRange() const { return power_.at(kMeanFacetLoss, 3); }
+
+    FacetLoss(float x2, float y2)
+        : a2_(0.5f * (x2 + y2))
+        , least2_(minOf(x2, y2))
+        , unevenness_(x2 == y2 ? 0.0f : 1.0f - least2_ / a2_)
+        , width_(a2_ * (1.3f * (kWidths - 1)) / (a2_ + 0.3f))
+        , power_(a2_)
+    {
+    }
+
+    float a2_; ///< mean of the squared widths
+    float least2_;
+    float unevenness_; ///< difference of the squared widths over their sum
     TablePosition<kWidths> width_;
-    TablePosition<kRatios> ratio_;
+    Power power_;
 };
 
 } // namespace zsi

@@ -46,6 +46,28 @@ inline Vec3f keepAboveSurface(Vec3f R, Vec3f I, Vec3f Ng, Vec3f N)
     return atReflectMargin(I, Ng, N);
 }
 
+/// What `mirroringNormal` does where N leans far.
+[[gnu::noinline]] inline Vec3f raisedNormal(Vec3f V, Vec3f Ng, Vec3f N)
+{
+    float const height = minOf(kReflectMargin, 0.5f * dot(V, Ng));
+    Vec3f const R = N * (2.0f * dot(V, N)) - V;
+    float const mirrored = dot(R, Ng);
+    if (mirrored >= height)
+        return N;
+    Vec3f const along = normalize(R - Ng * mirrored);
+    return normalize(V + along * std::sqrt(1.0f - height * height) + Ng * height);
+}
+
+/// `N`, or where its mirror direction of V would dip below the surface, the normal in their plane
+/// that keeps it above: by the margin, at grazing incidence by half of V's own height. So a bump
+/// that faces away still mirrors. V: away from the surface; Ng: unit, on V's side.
+inline Vec3f mirroringNormal(Vec3f V, Vec3f Ng, Vec3f N)
+{
+    if (dot(V, N) * dot(N, Ng) >= 0.75f * dot(V, Ng)) [[likely]] // mirrored to half of its height
+        return N;
+    return raisedNormal(V, Ng, N);
+}
+
 /// How the ray of a hit meets the shading normal, the side told by the geometric one.
 struct Incidence {
     float cosine; ///< -I.N for the normal faced to the viewer; a zero along Ng's plane
