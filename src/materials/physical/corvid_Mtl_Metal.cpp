@@ -52,8 +52,8 @@ void corvid_Mtl_Metal::f_computeShadingFrameNative(IShaderAPI* api, ShadeState c
 
 /// Frame of a normal that mirrors above the surface. The whole frame by value, so that one that
 /// nothing bends need not be in memory for this. Nf, Ng: on the ray's side.
-SLArray<Vec3f>
-corvid_Mtl_Metal::bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f Nf, Vec3f Ng) const
+SLArray<Vec3f> corvid_Mtl_Metal::bentFrame(IShaderAPI* api, ShadeState const& state, Vec3f Nf,
+                                           Vec3f Ng) const
 {
     SLArray<Vec3f> frame;
     f_computeShadingFrameNative(api, state, state.P, Nf, Mat3f(state.objectToWorld), frame);

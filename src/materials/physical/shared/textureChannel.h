@@ -7,15 +7,15 @@
 namespace zsi {
 
 /// Colour of a channel whose map is on.
-[[gnu::noinline]] inline Vec3f mappedColor(TextureSampler2D const& map, Mat3f const& transform, float amount,
-                         Vec2f uv)
+[[gnu::noinline]] inline Vec3f mappedColor(TextureSampler2D const& map, Mat3f const& transform,
+                                           float amount, Vec2f uv)
 {
     return rgb(map.lookup(transformUv(transform, uv))) * amount;
 }
 
 /// Value of a channel whose map is on: the red of the map.
-[[gnu::noinline]] inline float mappedValue(TextureSampler2D const& map, Mat3f const& transform, float amount,
-                         Vec2f uv)
+[[gnu::noinline]] inline float mappedValue(TextureSampler2D const& map, Mat3f const& transform,
+                                           float amount, Vec2f uv)
 {
     return map.lookup(transformUv(transform, uv)).x * amount;
 }
