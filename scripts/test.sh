@@ -1,10 +1,68 @@
 #!/usr/bin/env bash
 # Installs what is missing, builds, runs every test.
+#   usage: scripts/test.sh            the optimised build and its tests
+#          scripts/test.sh --all      every gate that a change has to pass
+#          scripts/test.sh GATE...    some of them:
+#              lint         formatting, clang-tidy, cppcheck, licences
+#              sanitizers   the tests under the address and undefined-behaviour sanitizers
+#              clang        Clang's warnings, and the tests as Clang compiles them
+#              tests        the optimised build and its tests
 set -euo pipefail
 cd "$(dirname "$0")/.."
 . scripts/lib/packages.sh
-install_missing "${packages_build[@]}" "${packages_test[@]}"
 
-cmake --preset release -DZSI_BUILD_TESTS=ON -DZSI_BUILD_BENCH=ON >/dev/null
-cmake --build --preset release
-ctest --preset release -j "$(nproc)"
+gates=("$@")
+[ $# -gt 0 ] || gates=(tests)
+[ "${1:-}" != --all ] || gates=(lint sanitizers clang tests)
+packages=("${packages_build[@]}" "${packages_test[@]}")
+for gate in "${gates[@]}"; do
+    case $gate in
+    tests | sanitizers) ;;
+    lint | clang) packages+=("${packages_lint[@]}") ;;
+    *)
+        echo "test.sh: $gate: unknown gate (lint, sanitizers, clang, tests or --all)" >&2
+        exit 2
+        ;;
+    esac
+done
+install_missing "${packages[@]}"
+
+# A preset's build and tests; further arguments go to ctest.
+preset() {
+    local name=$1
+    shift
+    cmake --preset "$name" -DZSI_BUILD_TESTS=ON >/dev/null && cmake --build --preset "$name" &&
+        ctest --preset "$name" -j "$(nproc)" "$@"
+}
+# run GATE. What leaves the others' tests as they are is left out: the bounds of GCC's code, what an
+# installation holds.
+run() {
+    case $1 in
+    tests) preset release ;;
+    lint) scripts/lint.sh ;;
+    sanitizers) preset asan ;;
+    clang) preset clang -LE install ;;
+    esac
+}
+
+log=$(mktemp -d)
+trap 'rm -rf "$log"' EXIT
+summary=() failed=0
+for gate in "${gates[@]}"; do
+    echo "== $gate"
+    SECONDS=0
+    # In a condition of its own: `set -e` would not hold inside `if run`.
+    set +e
+    (set -e; run "$gate") 2>&1 | tee "$log/$gate"
+    status=${PIPESTATUS[0]}
+    set -e
+    verdict=passed
+    [ "$status" -eq 0 ] || { verdict=FAILED failed=1; }
+    summary+=("$(printf '%-10s %s, %d:%02d' "$gate" "$verdict" $((SECONDS / 60)) $((SECONDS % 60)))")
+done
+
+echo "== summary"
+printf '%s\n' "${summary[@]}"
+# The closing lines of the last gate's tests, as ctest wrote them.
+grep -hE '^[0-9]+% tests passed|^Total Test time' "$log/${gates[-1]}" || true
+exit "$failed"
