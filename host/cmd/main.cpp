@@ -63,7 +63,8 @@ int run(int argc, char** argv)
     std::string shaderPath;
     app.add_option("--shader-path", shaderPath,
                    "Folders with shader libraries, separated by colons. Without it: "
-                   "ZSI_SHADER_PATH, else the folder `shaders` beside this program")
+                   "ZSI_SHADER_PATH, else the folder `shaders` beside this program, else the "
+                   "installed one")
         ->type_name("FOLDER[:FOLDER]");
     Subcommand const subcommands[] = {addInfo(app, shaderPath), addRender(app, shaderPath)};
     app.footer("Exit status: 0 done, 1 bad input, 2 bad command line, 130 interrupted.");

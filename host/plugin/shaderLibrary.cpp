@@ -135,8 +135,12 @@ std::vector<fs::path> shaderDirectories(std::string const& option)
     }
     if (directories.empty()) {
         std::error_code failed;
-        fs::path const program = fs::read_symlink("/proc/self/exe", failed);
-        directories.push_back(program.parent_path() / "shaders");
+        fs::path const folder = fs::read_symlink("/proc/self/exe", failed).parent_path();
+        fs::path const installed = (folder / ZSI_INSTALLED_SHADERS).lexically_normal();
+        fs::path const beside = folder / "shaders";
+        directories.push_back(!fs::exists(beside, failed) && fs::exists(installed, failed)
+                                  ? installed
+                                  : beside);
     }
     return directories;
 }

@@ -2,8 +2,9 @@
 
 # openimageio-tools: OpenImageIO's CMake package refuses to load without its programs.
 # zlib1g-dev: assimp's CMake package links to it without depending on it.
-packages_build=(g++ cmake ninja-build libembree-dev libopenimageio-dev openimageio-tools libtbb-dev
-    libassimp-dev zlib1g-dev nlohmann-json3-dev libcli11-dev libfmt-dev libelf-dev)
+packages_build=(g++ cmake ninja-build libembree-dev libopenimageio-dev openimageio-tools
+    libimath-dev libtbb-dev libassimp-dev zlib1g-dev nlohmann-json3-dev libcli11-dev libfmt-dev
+    libelf-dev)
 packages_test=(libgtest-dev libbenchmark-dev binutils valgrind pkg-config dpkg-dev file groff-base)
 packages_lint=(clang-14 clang-format-14 clang-tidy-14 cppcheck)
 
