@@ -236,17 +236,17 @@ public:
     }
 
     /// Of the light along w, what the flakes lose after one bounce, and its mean over the
-    /// hemisphere; crowd: of `crowdLoss`.
-    float loss(Vec3f w, float crowd) const
+    /// hemisphere. crowd: as `crowdLoss` gives it.
+    float loss(Vec3f w, grooves::LevelLoss const& crowd) const
     {
-        float sum = crowd_ * crowd;
+        float sum = crowd_ > 0.0f ? crowd_ * crowd(w.z) : 0.0f;
         for (int i = 0; i < count_; ++i)
             sum += flake_[i].share * grooves::loss(w, flake_[i].slope, gloss_);
         return sum;
     }
-    float meanLoss(float crowd) const
+    float meanLoss(grooves::LevelLoss const& crowd) const
     {
-        float sum = crowd_ * crowd;
+        float sum = crowd_ > 0.0f ? crowd_ * crowd.mean() : 0.0f;
         for (int i = 0; i < count_; ++i)
             sum += flake_[i].share * grooves::meanLoss(flake_[i].slope, gloss_);
         return sum;
@@ -319,14 +319,13 @@ public:
         : flakes_(flakes)
         , v_(v)
         , crowd_(flakes.crowdLoss())
-        , crowdMean_(maxOf(crowd_.mean(), 1e-9f))
     {
         if (!(flakes.coverage() > 0.0f))
             return;
-        lossV_ = flakes.loss(v, crowd_(v.z));
+        lossV_ = flakes.loss(v, crowd_);
         if (!(lossV_ > 0.0f))
             return;
-        furtherV_ = lossV_ * kInvPi / flakes.meanLoss(crowdMean_);
+        furtherV_ = lossV_ * kInvPi / flakes.meanLoss(crowd_);
         // Less than the loss may be: facets are to be drawn wherever they still send light.
         constexpr float kMostBroad = 0.75f;
         broadChance_ = minOf(lossV_ / flakes.coverage(), kMostBroad);
@@ -334,7 +333,7 @@ public:
 
     float coverage() const { return flakes_.coverage(); }
     /// Mean loss of a layer of such flakes, 0..1.
-    float crowdMeanLoss() const { return crowdMean_; }
+    float crowdMeanLoss() const { return crowd_.mean(); }
 
     /// Scattering values without the cosine, 1/sr.
     struct Value {
@@ -356,7 +355,7 @@ public:
         value.cosine = cosine;
         value.once = density * minOf(1.0f, k * lower) / (higher * lower);
         if (lossV_ > 0.0f)
-            value.further = flakes_.loss(l, crowd_(l.z)) * furtherV_;
+            value.further = flakes_.loss(l, crowd_) * furtherV_;
         value.pdf =
             (1.0f - broadChance_) * density * minOf(1.0f, k * v_.z) / (v_.z * flakes_.coverage())
             + broadChance_ * l.z * kInvPi;
@@ -383,7 +382,6 @@ private:
     FlakeFootprint flakes_;
     Vec3f v_;
     grooves::LevelLoss crowd_;
-    float crowdMean_;
     float lossV_ = 0.0f; ///< over the whole surface
     float furtherV_ = 0.0f; ///< the same over pi and its mean
     float broadChance_ = 0.0f; ///< of a direction by the cosine
