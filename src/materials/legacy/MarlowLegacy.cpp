@@ -46,8 +46,8 @@ MarlowLegacy::Lit MarlowLegacy::lights(IShaderAPI* api, ShadeState const& state,
                 continue;
             lit.diffuse += light;
             auto const add = [&](GlossyLobe const& lobe, float gain) {
-                if (!(lobe.albedo == kBlack))
-                    lit.glossy += light * lobe.albedo * (gain * kPi * lobe.value(l));
+                if (!lobe.empty())
+                    lit.glossy += light * lobe.albedo * (gain * kPi * lobe.value(at.v, l));
             };
             add(layers.highlight[0], specularLightGainValue);
             add(layers.highlight[1], specular2LightGainValue);
@@ -90,7 +90,7 @@ Vec3f MarlowLegacy::mirrored(IShaderAPI* api, ShadeState const& state, Surface c
     if (highlights == kBlack && reflection == kBlack)
         return kBlack;
     Vec3f const& facing = at.facing();
-    Vec3f const mirror = mirrorDirection(api, state, at, {});
+    Vec3f const mirror = mirrorDirection(api, state, at, GlossyLobe());
     auto const seen = [&](GlossyLobe const& lobe, Vec3f const& weight) {
         float const importance = maxComponent(weight);
         // A ray that gathers light would carry the image of a lamp as a speck: it sees a matt
@@ -98,7 +98,7 @@ Vec3f MarlowLegacy::mirrored(IShaderAPI* api, ShadeState const& state, Surface c
         if (state.rayType == kRayDiffuse)
             return weight * api->indirectDiffuse(&state.P, &facing, importance);
         // A ray of the lobe itself: the host is left nothing to spread.
-        Vec3f const r = lobe.albedo == kBlack ? mirror : mirrorDirection(api, state, at, lobe);
+        Vec3f const r = lobe.empty() ? mirror : mirrorDirection(api, state, at, lobe);
         return weight * api->traceSpecular(&state.P, &r, 0.0f, importance);
     };
 
@@ -117,7 +117,7 @@ Vec3f MarlowLegacy::mirrored(IShaderAPI* api, ShadeState const& state, Surface c
     }
     if (!blurred || IBLSpecMode > 0) {
         for (GlossyLobe const& lobe : layers.highlight)
-            if (!(lobe.albedo == kBlack))
+            if (!lobe.empty())
                 sum += seen(lobe, lobe.albedo);
     }
 

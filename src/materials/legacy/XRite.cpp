@@ -136,7 +136,8 @@ Vec3f XRite::paint(IShaderAPI* api, ShadeState const& state) const
     // Lights. Every term is what a light of irradiance pi sends to the viewer: a white base that
     // faces a light of colour 1 shows 1.
     Vec3f diffuse = kBlack, glints = kBlack, mirrored = kBlack;
-    GlossyLobe const lobe = v.z > 0.0f ? GlossyLobe(kCoatWidth, v, grey(1.0f)) : GlossyLobe();
+    GlossyLobe lobe;
+    lobe.set(kCoatWidth, v, grey(1.0f));
     for (LightSample const* s = api->getLightSamples(-2, &state.P, &n); s; s = s->next) {
         Vec3f const light = s->color * s->shadow * s->weight;
         if (light == kBlack)
@@ -145,7 +146,7 @@ Vec3f XRite::paint(IShaderAPI* api, ShadeState const& state) const
         Vec3f const l = toLocal(frame, s->L);
         if (l.z <= 0.0f || v.z <= 0.0f)
             continue;
-        mirrored += light * (kPi * lobe.value(l));
+        mirrored += light * (kPi * lobe.value(v, l));
         if (flaky)
             glints += light * layer.glint(v, l, normalize(v + l), color, color2);
     }

@@ -8,19 +8,17 @@
 
 namespace zsi {
 
-/// Interpolated in a table of albedoTables.h. width: leastWidth, the table's, to 1; cosine: 0..1,
-/// of the direction.
+/// Interpolated in a table of albedoTables.h. rootLeast: root of the table's least width; width:
+/// from that to 1; cosine: 0..1, of the direction.
 template <int Widths, int Cosines>
-float facetAlbedo(float const (&table)[Widths][Cosines], float leastWidth, float width,
-                  float cosine)
+float facetAlbedo(float const (&table)[Widths][Cosines], float rootLeast, float width, float cosine)
 {
     // Whatever comes, NaN included, ends between the first node and a little before the last.
     auto const position = [](float x, int nodes) {
         float const end = static_cast<float>(nodes - 1);
         return maxOf(0.0f, minOf(x * end, end * (1.0f - 0x1p-23f)));
     };
-    float const least = std::sqrt(leastWidth);
-    float const y = position((std::sqrt(width) - least) / (1.0f - least), Widths);
+    float const y = position((std::sqrt(width) - rootLeast) / (1.0f - rootLeast), Widths);
     float const x = position(cosine * (1.0f + width) / (cosine + width), Cosines);
     int const row = static_cast<int>(y), column = static_cast<int>(x);
     float const t = x - static_cast<float>(column);
@@ -34,13 +32,13 @@ float facetAlbedo(float const (&table)[Widths][Cosines], float leastWidth, float
 /// Trowbridge-Reitz facets, of widths from 0.02 on.
 inline float lobeAlbedo(float width, float cosine)
 {
-    return facetAlbedo(kLobeAlbedo, 0.02f, width, cosine);
+    return facetAlbedo(kLobeAlbedo, 0.14142136f, width, cosine);
 }
 
 /// Facets of Gaussian slopes, of widths from 0.1 on.
 inline float flakeAlbedo(float width, float cosine)
 {
-    return facetAlbedo(kFlakeAlbedo, 0.1f, width, cosine);
+    return facetAlbedo(kFlakeAlbedo, 0.31622777f, width, cosine);
 }
 
 } // namespace zsi

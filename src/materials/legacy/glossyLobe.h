@@ -30,56 +30,54 @@ struct Highlight {
     float strength(float cosine) const { return gain * schlick(1.0f - rollOff, cosine); }
 };
 
-/// Facets of one width seen along a direction. What single bounces lose between facets is given
-/// back in their shape, so that the lobe sends out `albedo` of the light whatever its width:
-/// Turquin 2019, "Practical Multiple Scattering Compensation for Microfacet Models".
+/// Facets of one width seen along v. What single bounces lose between facets is given back in their
+/// shape, so that the lobe sends out `albedo` of the light whatever its width: Turquin 2019,
+/// "Practical Multiple Scattering Compensation for Microfacet Models".
 ///
-/// Directions are local to the viewer's side, unit; below the surface there is nothing.
-class GlossyLobe {
-public:
+/// Directions are local to the viewer's side, unit; v is the same for all members, above the
+/// surface. Below it there is nothing.
+struct GlossyLobe {
     Vec3f albedo = kBlack; ///< black: no lobe, and nothing else is set
+    float width, stretchedV, compensation;
 
-    GlossyLobe() = default;
-    /// v: above the surface. width: kLeastWidth to 1.
-    GlossyLobe(float width, Vec3f v, Vec3f albedo_)
-        : albedo(albedo_)
-        , facets_{width, width}
-        , v_(v)
-        , stretchedV_(facets_.stretched(v))
-        , compensation_(1.0f / lobeAlbedo(width, v.z))
+    /// width: kLeastWidth to 1.
+    void set(float width_, Vec3f const& v, Vec3f const& albedo_)
     {
+        albedo = albedo_;
+        width = width_;
+        stretchedV = facets().stretched(v);
+        compensation = 1.0f / lobeAlbedo(width, v.z);
     }
+    bool empty() const { return albedo == kBlack; }
 
     /// Scattering value for albedo 1, without the cosine, 1/sr. Its integral with the cosine is 1.
-    float value(Vec3f l) const
+    float value(Vec3f v, Vec3f l) const
     {
         if (!(l.z > 0.0f))
             return 0.0f;
-        Vec3f const h = v_ + l;
-        return compensation_ * facets_.density(h, dot(h, h))
-            * AnisotropicGgx::visibility(v_.z, stretchedV_, l.z, facets_.stretched(l));
+        Vec3f const h = v + l;
+        return compensation * facets().density(h, dot(h, h))
+            * AnisotropicGgx::visibility(v.z, stretchedV, l.z, facets().stretched(l));
     }
     /// A direction and, for any direction, the density of these, 1/sr. u: in [0, 1). The direction
     /// need not be above the surface.
-    Vec3f sample(Vec2f u) const { return facets_.mirrorVisible(v_, stretchedV_, u); }
-    float density(Vec3f l) const
+    Vec3f sample(Vec3f v, Vec2f u) const { return facets().mirrorVisible(v, stretchedV, u); }
+    float density(Vec3f v, Vec3f l) const
     {
-        Vec3f const h = v_ + l;
-        return AnisotropicGgx::reflectedDensity(facets_.density(h, dot(h, h)), v_.z, stretchedV_);
+        Vec3f const h = v + l;
+        return AnisotropicGgx::reflectedDensity(facets().density(h, dot(h, h)), v.z, stretchedV);
     }
     /// How much of a sampled direction other facets leave, 0..1: taken as often as this, directions
     /// are distributed as value times cosine.
-    float unmasked(Vec3f l) const
+    float unmasked(Vec3f v, Vec3f l) const
     {
         if (!(l.z > 0.0f))
             return 0.0f;
-        return l.z * (v_.z + stretchedV_) / (v_.z * facets_.stretched(l) + l.z * stretchedV_);
+        return l.z * (v.z + stretchedV) / (v.z * facets().stretched(l) + l.z * stretchedV);
     }
 
 private:
-    AnisotropicGgx facets_{1.0f, 1.0f};
-    Vec3f v_{0.0f, 0.0f, 1.0f};
-    float stretchedV_ = 1.0f, compensation_ = 1.0f;
+    AnisotropicGgx facets() const { return {width, width}; }
 };
 
 } // namespace zsi

@@ -117,13 +117,14 @@ MarlowLegacy::Layers MarlowLegacy::layersAt(IShaderAPI* api, ShadeState const& s
     l.mirrorsLights = glossy && reflectLight;
 
     float const leastWidth = state.rayType == kRayDiffuse ? kGatheredWidth : kLeastWidth;
-    auto const lobe = [&](float width, Vec3f const& albedo) {
-        return albedo == kBlack ? GlossyLobe() : GlossyLobe(maxOf(width, leastWidth), at.v, albedo);
+    auto const set = [&](GlossyLobe& lobe, float width, Vec3f const& albedo) {
+        if (!(albedo == kBlack))
+            lobe.set(maxOf(width, leastWidth), at.v, albedo);
     };
-    l.highlight[0] = lobe(first.width, l.albedo.highlight[0]);
-    l.highlight[1] = lobe(second.width, l.albedo.highlight[1]);
+    set(l.highlight[0], first.width, l.albedo.highlight[0]);
+    set(l.highlight[1], second.width, l.albedo.highlight[1]);
     if (l.mirrorsLights || blurs(at))
-        l.reflection = lobe(lobeWidth(surfaceRoughness), l.albedo.reflection);
+        set(l.reflection, lobeWidth(surfaceRoughness), l.albedo.reflection);
     return l;
 }
 

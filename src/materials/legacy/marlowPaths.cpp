@@ -48,10 +48,10 @@ Vec3f MarlowLegacy::mirrorDirection(IShaderAPI* api, ShadeState const& state, Su
 {
     Vec3f const ng = facedNg(state);
     constexpr int kMostDraws = 16; // seen from above, the widest lobe takes 3 in the mean
-    for (int i = 0; i < kMostDraws && !(lobe.albedo == kBlack); ++i) {
-        Vec3f const l = lobe.sample(api->random2D());
+    for (int i = 0; i < kMostDraws && !lobe.empty(); ++i) {
+        Vec3f const l = lobe.sample(at.v, api->random2D());
         Vec3f const direction = toWorld(at.frame, l);
-        if (api->random() < lobe.unmasked(l) && dot(direction, ng) > 0.0f)
+        if (api->random() < lobe.unmasked(at.v, l) && dot(direction, ng) > 0.0f)
             return direction;
     }
     return f_safe_reflect(api, state, state.I, ng, at.facing());
@@ -90,8 +90,8 @@ Vec3f MarlowLegacy::scattered(Surface const& at, Layers const& layers, Vec3f l) 
     if (faceLight ? l.z != 0.0f : outside > 0.0f)
         value = layers.albedo.base * layers.diffuse * kInvPi;
     auto const add = [&](GlossyLobe const& lobe) {
-        if (!(lobe.albedo == kBlack))
-            value += lobe.albedo * lobe.value(l);
+        if (!lobe.empty())
+            value += lobe.albedo * lobe.value(at.v, l);
     };
     add(layers.highlight[0]);
     add(layers.highlight[1]);
@@ -168,7 +168,7 @@ void MarlowLegacy::sample(IShaderAPI* api, ShadeState& state) const
         e.type = kSampleStraight;
     } else {
         Vec2f const u = api->random2D();
-        Vec3f l = drawn == kDiffuse ? cosineHemisphere(u) : lobes[drawn - kLobes]->sample(u);
+        Vec3f l = drawn == kDiffuse ? cosineHemisphere(u) : lobes[drawn - kLobes]->sample(at.v, u);
         if (!(l.z > 0.0f))
             return;
         if (drawn == kDiffuse && at.behind) // the base faces away
@@ -179,7 +179,7 @@ void MarlowLegacy::sample(IShaderAPI* api, ShadeState& state) const
         float density = chance[kDiffuse] * maxOf(outside, 0.0f) * kInvPi;
         for (int i = 0; i < 3; ++i)
             if (chance[kLobes + i] > 0.0f && l.z > 0.0f)
-                density += chance[kLobes + i] * lobes[i]->density(l);
+                density += chance[kLobes + i] * lobes[i]->density(at.v, l);
         e = {toWorld(at.frame, l), coverage * scattered(at, layers, l), std::fabs(l.z),
              total / density, kSampleMixture};
     }
