@@ -75,7 +75,9 @@ void print(char const* name, double leastWidth, double (*albedo)(double, double)
             double const x = double(c) / (kCosines - 1);
             double const cosine = std::clamp(x * width / (1 + width - x), kLeastCosine, 1.0);
             std::printf("%.4ff%s", albedo(width, cosine),
-                        c + 1 == kCosines ? "},\n" : c == 7 ? ",\n     " : ", ");
+                        c + 1 == kCosines ? "},\n"
+                            : c == 7      ? ",\n     "
+                                          : ", ");
         }
     }
     std::printf("};\n");
@@ -83,12 +85,13 @@ void print(char const* name, double leastWidth, double (*albedo)(double, double)
 
 int main()
 {
-    std::printf("/// Albedo of perfectly reflecting facets after one bounce; made by "
-                "scripts/albedoTables.cpp.\n"
-                "/// Nodes in equal steps: sqrt(width) up to 1, and c (1 + width) / (c + width) with "
-                "c the\n/// cosine of the direction.\n"
-                "#pragma once\n\nnamespace zsi {\n\n// clang-format off\n"
-                "/// Trowbridge-Reitz facets, widths from 0.02.\n");
+    std::printf(
+        "/// Albedo of perfectly reflecting facets after one bounce; made by "
+        "scripts/albedoTables.cpp.\n"
+        "/// Nodes in equal steps: sqrt(width) up to 1, and c (1 + width) / (c + width) with "
+        "c the\n/// cosine of the direction.\n"
+        "#pragma once\n\nnamespace zsi {\n\n// clang-format off\n"
+        "/// Trowbridge-Reitz facets, widths from 0.02.\n");
     print("kLobeAlbedo", 0.02, lobe);
     std::printf("/// Gaussian slopes, widths from 0.1.\n");
     print("kFlakeAlbedo", 0.1, flakes);
