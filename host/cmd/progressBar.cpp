@@ -1,14 +1,24 @@
 #include "cmd/progressBar.h"
 
+#include <algorithm>
 #include <cmath>
 #include <cstdio>
 #include <fmt/format.h>
+#include <sys/ioctl.h>
 #include <unistd.h>
 
 namespace zsi::cmd {
 namespace {
 
-constexpr int kWidth = 40;
+constexpr std::size_t kMostMarks = 40, kFewestMarks = 5;
+
+/// Characters that fit in a line without breaking it.
+std::size_t columns()
+{
+    winsize size = {};
+    bool const known = ioctl(STDERR_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0;
+    return (known ? size.ws_col : 80u) - 1u;
+}
 
 std::string clockText(double seconds)
 {
@@ -19,8 +29,8 @@ std::string clockText(double seconds)
 
 } // namespace
 
-ProgressBar::ProgressBar()
-    : terminal_(isatty(STDERR_FILENO) == 1)
+ProgressBar::ProgressBar(bool wanted)
+    : terminal_(wanted && isatty(STDERR_FILENO) == 1)
     , begin_(Clock::now())
     , next_(begin_)
 {
@@ -32,18 +42,40 @@ ProgressBar::~ProgressBar()
         std::fputs("\r\033[K", stderr);
 }
 
-void ProgressBar::show(double done)
+void ProgressBar::show(std::string const& what)
+{
+    if (terminal_)
+        draw(what);
+}
+
+void ProgressBar::show(std::string const& what, double done)
 {
     auto const now = Clock::now();
+    if (what != what_) {
+        what_ = what;
+        begin_ = next_ = now;
+    }
     if (!terminal_ || now < next_ || !(done > 0.0))
         return;
     next_ = now + std::chrono::milliseconds(200);
     double const elapsed = std::chrono::duration<double>(now - begin_).count();
-    int const filled = static_cast<int>(done * kWidth);
-    std::string const line =
-        fmt::format("\r[{:#<{}}{:.<{}}] {:3.0f}%  {} left\033[K", "", filled, "", kWidth - filled,
-                    std::floor(done * 100.0), clockText(elapsed * (1.0 - done) / done));
-    std::fputs(line.c_str(), stderr);
+    std::string const percent = fmt::format("{:3.0f}%", std::floor(done * 100.0));
+    std::string const head = what + ' ';
+    std::string const tail =
+        fmt::format(" {}  {} left", percent, clockText(elapsed * (1.0 - done) / done));
+    std::size_t const room = columns(), text = head.size() + tail.size() + 2;
+    if (room < text + kFewestMarks) {
+        draw(room < text ? percent : head + tail);
+        return;
+    }
+    std::size_t const marks = std::min(room - text, kMostMarks);
+    auto const filled = static_cast<std::size_t>(done * static_cast<double>(marks));
+    draw(head + '[' + std::string(filled, '#') + std::string(marks - filled, '.') + ']' + tail);
+}
+
+void ProgressBar::draw(std::string const& line)
+{
+    std::fputs(('\r' + line.substr(0, columns()) + "\033[K").c_str(), stderr);
     std::fflush(stderr);
     drawn_ = true;
 }

@@ -2,27 +2,32 @@
 #pragma once
 
 #include <chrono>
+#include <string>
 
 namespace zsi::cmd {
 
-/// One line on stderr with the share done and the time left, redrawn in place a few times a second
-/// and wiped at the end. Nothing where stderr is no terminal.
+/// One line on stderr: what is being done, the share done and the time left, as much of it as the
+/// terminal is wide; redrawn in place a few times a second and wiped at the end. Nothing where
+/// stderr is no terminal.
 class ProgressBar {
 public:
-    ProgressBar();
+    explicit ProgressBar(bool wanted = true);
     ~ProgressBar();
     ProgressBar(ProgressBar const&) = delete;
     ProgressBar& operator=(ProgressBar const&) = delete;
 
-    /// `done` in [0, 1]. Calls must not overlap.
-    void show(double done);
+    /// Calls must not overlap.
+    void show(std::string const& what); ///< of unknown length
+    void show(std::string const& what, double done); ///< `done` in [0, 1]
 
 private:
     using Clock = std::chrono::steady_clock;
+    void draw(std::string const& line);
 
     bool terminal_;
     bool drawn_ = false;
-    Clock::time_point begin_;
+    std::string what_;
+    Clock::time_point begin_; ///< of `what_`
     Clock::time_point next_;
 };
 

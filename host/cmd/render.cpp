@@ -5,16 +5,23 @@
 #include "cmd/interruption.h"
 #include "cmd/progressBar.h"
 #include "film/imageFile.h"
+#include "integrate/integrators.h"
+#include "integrate/layers.h"
 #include "load/loadScene.h"
+#include "scene/resize.h"
 
 #include <CLI/CLI.hpp>
+#include <algorithm>
 #include <charconv>
+#include <chrono>
 #include <cmath>
 #include <cstdio>
 #include <fmt/format.h>
+#include <fmt/ranges.h>
 #include <limits>
 #include <memory>
 #include <optional>
+#include <utility>
 
 namespace zsi::cmd {
 namespace {
@@ -30,6 +37,9 @@ struct Arguments {
     int threads = 0;
     std::optional<int> samples;
     std::optional<std::int64_t> seed;
+    std::string integrator;
+    std::vector<std::string> layers, assignments;
+    bool quiet = false, verbose = false;
 };
 
 /// Exactly N decimal integers with `separator` between them.
@@ -72,24 +82,65 @@ std::array<int, 4> parseCrop(std::string const& text)
     return *crop;
 }
 
-/// A crop of the scene keeps its share of a picture of another size.
-void resize(host::FilmSettings& film, std::array<int, 2> size)
-{
-    if (film.crop) {
-        auto const scaled = [](int at, int to, int from, auto round) {
-            return static_cast<int>(round(static_cast<double>(at) * to / from));
-        };
-        auto const down = [](double v) { return std::floor(v); };
-        auto const up = [](double v) { return std::ceil(v); };
-        auto& c = *film.crop;
-        c = {scaled(c[0], size[0], film.width, down), scaled(c[1], size[1], film.height, down),
-             scaled(c[2], size[0], film.width, up), scaled(c[3], size[1], film.height, up)};
+/// What differs from one line of the command to the next is where it goes: warnings and what
+/// --verbose tells to stderr, the closing line to stdout.
+class Reporter {
+public:
+    explicit Reporter(Arguments const& arguments)
+        : quiet_(arguments.quiet)
+        , verbose_(arguments.verbose)
+    {
     }
-    film.width = size[0];
-    film.height = size[1];
+    bool quiet() const { return quiet_; }
+    void warning(std::string const& message) const
+    {
+        if (!quiet_)
+            warn(message);
+    }
+    /// With the seconds since the last one.
+    void detail(std::string const& message)
+    {
+        auto const now = Clock::now();
+        double const seconds =
+            std::chrono::duration<double>(now - std::exchange(last_, now)).count();
+        if (verbose_)
+            std::fputs(fmt::format("zsi: {}, {:.2f} s\n", message, seconds).c_str(), stderr);
+    }
+
+private:
+    using Clock = std::chrono::steady_clock;
+    bool quiet_, verbose_;
+    Clock::time_point last_ = Clock::now();
+};
+
+std::string contents(host::Scene const& scene)
+{
+    std::size_t triangles = 0;
+    for (host::Mesh const& mesh : scene.meshes)
+        triangles += mesh.triangles.size();
+    return fmt::format("{}: {} meshes of {} triangles, {} instances, {} materials, {} lights, {}",
+                       scene.file, scene.meshes.size(), triangles, scene.instances.size(),
+                       scene.materials.size(), scene.lights.size(),
+                       scene.environment ? scene.environment->className() : "no environment");
 }
 
-int render(Arguments const& arguments, std::string const& shaderPath)
+/// "12 non-finite results left out (glass 10, environment 2)".
+std::string nonFinite(host::Scene const& scene, host::RenderReport const& report)
+{
+    std::string who;
+    for (std::size_t i = 0; i < report.nonFiniteOf.size(); ++i)
+        if (std::uint64_t const count = report.nonFiniteOf[i])
+            who +=
+                fmt::format("{}{} {}", who.empty() ? "" : ", ",
+                            i < scene.materialNames.size() ? host::printable(scene.materialNames[i])
+                                                           : "environment",
+                            count);
+    return fmt::format("{} non-finite results left out{}", report.nonFinite,
+                       who.empty() ? "" : " (" + who + ")");
+}
+
+/// The scene as the command line wants it.
+host::Scene load(Arguments const& arguments, host::ShaderLibraries const& libraries)
 {
     std::optional<std::array<int, 2>> size;
     if (!arguments.size.empty())
@@ -98,15 +149,13 @@ int render(Arguments const& arguments, std::string const& shaderPath)
     if (!arguments.crop.empty())
         crop = parseCrop(arguments.crop);
 
-    Interruption interruption;
-    host::checkPictureFile(arguments.output);
-    host::ShaderLibraries const libraries = loadLibraries(shaderPath);
-    host::Scene scene = host::loadScene(arguments.scene, libraries);
-    for (std::string const& warning : scene.warnings)
-        warn(warning);
-
+    ProgressBar bar(!arguments.quiet);
+    host::LoadOptions options;
+    options.assignments = arguments.assignments;
+    options.progress = [&](std::string const& path) { bar.show("loading " + path); };
+    host::Scene scene = host::loadScene(arguments.scene, libraries, options);
     if (size)
-        resize(scene.film, *size);
+        host::resize(scene, (*size)[0], (*size)[1]);
     if (crop)
         scene.film.crop = crop;
     if (crop && ((*crop)[2] > scene.film.width || (*crop)[3] > scene.film.height))
@@ -116,16 +165,68 @@ int render(Arguments const& arguments, std::string const& shaderPath)
         scene.settings.samples = *arguments.samples;
     if (arguments.seed)
         scene.settings.seed = static_cast<std::uint32_t>(*arguments.seed);
+    if (!arguments.integrator.empty())
+        scene.settings.integrator = arguments.integrator;
+    if (!arguments.layers.empty())
+        scene.film.layers = arguments.layers;
+    return scene;
+}
+
+/// A word of a list, or a usage error that names the option.
+void checkWord(char const* option, std::string const& word, std::vector<std::string> const& known)
+{
+    if (std::find(known.begin(), known.end(), word) == known.end())
+        throw UsageError(fmt::format("{} {}: unknown{}", option, host::printable(word),
+                                     host::suggestion(word, known)));
+}
+
+void check(Arguments const& arguments)
+{
+    if (!arguments.size.empty())
+        parseSize(arguments.size);
+    if (!arguments.crop.empty())
+        parseCrop(arguments.crop);
+    if (!arguments.integrator.empty())
+        checkWord("--integrator", arguments.integrator, host::integratorNames());
+    for (std::string const& layer : arguments.layers)
+        checkWord("--layers", layer, host::layerNames());
+    host::checkPictureFile(arguments.output);
+    if (!arguments.layers.empty() && !host::keepsLayers(arguments.output))
+        throw UsageError(fmt::format("--layers: {} has no layers; expected an .exr file",
+                                     host::printable(arguments.output)));
+}
+
+int render(Arguments const& arguments, std::string const& shaderPath)
+{
+    check(arguments);
+    Interruption interruption;
+    Reporter reporter(arguments);
+    host::ShaderLibraries const libraries = loadLibraries(shaderPath);
+    host::Scene const scene = load(arguments, libraries);
+    for (std::string const& warning : scene.warnings)
+        reporter.warning(warning);
+    reporter.detail(contents(scene));
 
     host::RenderReport report;
     host::Picture picture;
     try {
-        ProgressBar bar;
-        host::RenderOptions options;
-        options.threads = arguments.threads;
-        options.progress = [&](double done) { bar.show(done); };
-        options.cancel = &interruption.defer();
-        picture = host::render(scene, options, &report);
+        ProgressBar bar(!arguments.quiet);
+        std::atomic<bool> const& interrupted = interruption.defer();
+        host::Session session(scene, [&](double done) {
+            bar.show("building", done);
+            return !interrupted;
+        });
+        reporter.detail("acceleration structures built");
+        host::Film film = session.newFilm();
+        host::RenderJob job;
+        job.window = film.window();
+        job.samples = {0, static_cast<std::uint32_t>(scene.settings.samples)};
+        job.threads = arguments.threads;
+        job.progress = [&](double done) { bar.show("rendering", done); };
+        job.cancel = &interrupted;
+        report = session.render(film, job);
+        picture = host::developed(film, scene.film);
+        reporter.detail(fmt::format("rendered with \"{}\"", scene.settings.integrator));
     } catch (host::Cancelled const&) {
         // Told below, as an interruption while rendering is.
     }
@@ -133,11 +234,16 @@ int render(Arguments const& arguments, std::string const& shaderPath)
         std::fputs("zsi: interrupted, no picture written\n", stderr);
         return status;
     }
+    if (!scene.instances.empty() && report.surfaces == 0)
+        reporter.warning(fmt::format("{}: the camera sees none of its {} instances", scene.file,
+                                     scene.instances.size()));
     host::writePicture(arguments.output, picture, {scene.film.exposure, scene.film.alpha == true});
-    print(fmt::format("{}: {}x{}, {} samples a pixel, {} rays, {} non-finite results left out, "
-                      "{:.2f} s\n",
-                      arguments.output, picture.width(), picture.height(), scene.settings.samples,
-                      report.rays, report.nonFinite, report.seconds));
+    reporter.detail("written to " + arguments.output);
+    if (!reporter.quiet())
+        print(fmt::format("{}: {}x{}, {} samples a pixel, {} rays, {}, {:.2f} s\n",
+                          arguments.output, picture.width(), picture.height(),
+                          scene.settings.samples, report.rays, nonFinite(scene, report),
+                          report.seconds));
     return 0;
 }
 
@@ -148,7 +254,8 @@ Subcommand addRender(CLI::App& app, std::string const& shaderPath)
     auto const arguments = std::make_shared<Arguments>();
     CLI::App* const command =
         app.add_subcommand("render", "Render a scene file into a picture file");
-    command->add_option("SCENE", arguments->scene, "The scene, a JSON file")->required();
+    command->add_option("SCENE", arguments->scene, "The scene, a JSON file; - is standard input")
+        ->required();
     command
         ->add_option("-o,--output", arguments->output,
                      "The picture: .exr or .hdr linear, .png or .jpg for the screen")
@@ -169,6 +276,26 @@ Subcommand addRender(CLI::App& app, std::string const& shaderPath)
         ->add_option("--seed", arguments->seed,
                      "Seed of the random numbers: another one gives other noise")
         ->check(CLI::Range(std::int64_t(0), kMaxSeed));
+    command->add_option("--integrator", arguments->integrator, "How light is gathered")
+        ->type_name(fmt::format("{}", fmt::join(host::integratorNames(), "|")));
+    command
+        ->add_option("--layers", arguments->layers,
+                     "Layers of an .exr beside the beauty: "
+                         + fmt::format("{}", fmt::join(host::layerNames(), ", ")))
+        ->delimiter(',')
+        ->allow_extra_args(false)
+        ->type_name("NAME[,NAME]");
+    command
+        ->add_option("--set", arguments->assignments,
+                     "Put a value in the place of the scene's, as often as wanted: "
+                     "materials.glass.parameters.u_ior=1.4, camera.position[2]=3")
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll)
+        ->allow_extra_args(false)
+        ->type_name("PATH=VALUE");
+    command->add_flag("-q,--quiet", arguments->quiet, "Tell of nothing but errors");
+    command
+        ->add_flag("-v,--verbose", arguments->verbose, "Tell what is loaded and how long it takes")
+        ->excludes("--quiet");
     command->footer("Options override the scene. The same scene and seed give the same picture, "
                     "bit for bit, with any number of threads.");
     return {command, [=, &shaderPath] { return render(*arguments, shaderPath); }};

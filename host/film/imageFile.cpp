@@ -149,6 +149,8 @@ std::vector<unsigned char> encode(std::filesystem::path const& file, Picture con
 
 } // namespace
 
+bool keepsLayers(std::filesystem::path const& file) { return kindOf(file) == Kind::Exr; }
+
 void checkPictureFile(std::filesystem::path const& file)
 {
     kindOf(file);

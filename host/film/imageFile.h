@@ -13,6 +13,9 @@ struct ScreenView {
     bool alpha = false; ///< PNG alone: with the picture's alpha; otherwise it is opaque
 };
 
+/// Whether a file of this name holds all layers of a picture; others hold the first.
+bool keepsLayers(std::filesystem::path const& file);
+
 /// Throws InputError when `writePicture` could not write there: unknown extension, no such folder,
 /// no permission. For the time before a long rendering; leaves nothing behind.
 void checkPictureFile(std::filesystem::path const& file);

@@ -47,7 +47,9 @@ std::string shown(JsonValue const& v)
 
 std::string JsonReader::place() const
 {
-    std::string text = fmt::format("{}:{}", value_->file->string(), value_->line);
+    std::string text = value_->file->string();
+    if (value_->line > 0)
+        text += fmt::format(":{}", value_->line);
     return path_.empty() ? text : text + ": " + path_;
 }
 

@@ -209,9 +209,10 @@ JsonValue const* JsonValue::find(std::string_view name) const
     return nullptr;
 }
 
-JsonValue readJson(std::filesystem::path const& file)
+JsonValue readJson(std::filesystem::path const& file) { return parseJson(readText(file), file); }
+
+JsonValue parseJson(std::string const& text, std::filesystem::path const& file)
 {
-    std::string const text = readText(file);
     Place last;
     TreeBuilder builder(file, last);
     nlohmann::json::sax_parse(CountingIterator(text.data(), &last),

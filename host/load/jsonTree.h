@@ -22,7 +22,7 @@ struct JsonValue {
     std::vector<JsonValue> items;
     std::vector<JsonMember> members;
     std::shared_ptr<std::filesystem::path const> file;
-    int line = 0; ///< from 1
+    int line = 0; ///< from 1; 0: of no file that has lines
 
     JsonValue const* find(std::string_view name) const; ///< null when there is none
 };
@@ -32,8 +32,11 @@ struct JsonMember {
     JsonValue value;
 };
 
-/// Reads a JSON file in which comments may stand. Throws InputError that names file, line and
-/// column when it cannot be read or is no JSON, and for a key that an object has twice.
+/// JSON text in which comments may stand. `file`: where it comes from. Throws InputError that names
+/// file, line and column when it is no JSON, and for a key that an object has twice.
+JsonValue parseJson(std::string const& text, std::filesystem::path const& file);
+
+/// `parseJson` of a file, which can also be one that cannot be read.
 JsonValue readJson(std::filesystem::path const& file);
 
 } // namespace zsi::host

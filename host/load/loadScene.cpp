@@ -4,6 +4,7 @@
 #include "base/names.h"
 #include "integrate/integrators.h"
 #include "integrate/layers.h"
+#include "light/lightCheck.h"
 #include "load/jsonReader.h"
 #include "load/parameterValues.h"
 #include "load/sceneFile.h"
@@ -26,14 +27,22 @@ constexpr int kLargestFilm = 32768; // pixels a side
 constexpr int kMostSamples = 1 << 20;
 constexpr int kMostSegments = 4096;
 
+Vec3f readPosition(JsonReader const& reader)
+{
+    Vec3f const v = reader.toVec3f();
+    if (!(maxOf(std::fabs(v.x), maxOf(std::fabs(v.y), std::fabs(v.z))) <= kFarthest))
+        reader.fail(fmt::format("lies farther out than rays go, which is {}", kFarthest));
+    return v;
+}
+
 Camera readCamera(JsonReader const& reader)
 {
     reader.expectKeys({"position", "target", "up", "fov", "lensRadius", "focusDistance"});
     Camera camera;
     if (auto const v = reader.find("position"))
-        camera.position = v->toVec3f();
+        camera.position = readPosition(*v);
     if (auto const v = reader.find("target"))
-        camera.target = v->toVec3f();
+        camera.target = readPosition(*v);
     if (auto const v = reader.find("up"))
         camera.up = v->toVec3f();
     if (auto const v = reader.find("fov")) {
@@ -42,9 +51,9 @@ Camera readCamera(JsonReader const& reader)
             v->failExpected("degrees below 180");
     }
     if (auto const v = reader.find("lensRadius"))
-        camera.lensRadius = v->toFloat(0);
+        camera.lensRadius = v->toFloat(0, kFarthest / 2);
     if (auto const v = reader.find("focusDistance"))
-        camera.focusDistance = v->toFloat(0);
+        camera.focusDistance = v->toFloat(0, kFarthest);
     Vec3f const view = camera.target - camera.position;
     if (!(length(view) > 0.0f) || !std::isfinite(length(view)))
         reader.fail("the target has no direction from the position");
@@ -206,9 +215,10 @@ private:
 /// Reads the parts of one scene in order; later ones refer to earlier ones by name.
 class Loader {
 public:
-    Loader(Scene& scene, ShaderSource const& shaders)
+    Loader(Scene& scene, ShaderSource const& shaders, LoadOptions const& options)
         : scene_(scene)
         , shaders_(shaders)
+        , options_(options)
     {
     }
 
@@ -224,6 +234,7 @@ public:
             scene_.settings = readSettings(*v);
         if (auto const v = root.find("meshes"))
             for (auto const& [name, mesh] : v->members()) {
+                begin(mesh);
                 scene_.meshes.push_back(readMesh(mesh, scene_.warnings));
                 scene_.meshes.back().name = name;
                 meshes_.add(name);
@@ -237,19 +248,29 @@ public:
             }
         if (auto const v = root.find("instances"))
             for (auto const& [name, instance] : v->members())
-                scene_.instances.push_back(readInstance(instance));
+                addInstance(instance, readInstance(instance));
         if (auto const v = root.find("lights"))
             for (auto const& [name, light] : v->members())
-                scene_.lights.push_back(readLight(light));
+                readLight(light);
         if (auto const v = root.find("environment")) {
             v->expectKeys({"class", "parameters"});
             scene_.environment = readShader(*v, kEnvironment);
         }
+        if (scene_.instances.empty() && !scene_.environment)
+            scene_.warnings.push_back(root.value().file->string()
+                                      + ": nothing to see: no instances and no environment");
     }
 
 private:
+    void begin(JsonReader const& reader) const
+    {
+        if (options_.progress)
+            options_.progress(reader.path());
+    }
+
     Shader readShader(JsonReader const& reader, ShaderKind wanted)
     {
+        begin(reader);
         JsonReader const className = reader.at("class");
         Shader shader = createShader(className);
         if (shader.kind() != wanted) {
@@ -318,7 +339,40 @@ private:
         return m;
     }
 
-    Light readLight(JsonReader const& reader)
+    void addInstance(JsonReader const& reader, Instance const& instance)
+    {
+        Mat4f const& m = instance.objectToWorld;
+        float const largest = largestCoordinate(static_cast<std::size_t>(instance.mesh));
+        for (int i = 0; i < 3; ++i) {
+            float const scale = std::fabs(m.m[i]) + std::fabs(m.m[4 + i]) + std::fabs(m.m[8 + i]);
+            if (!(scale * largest + std::fabs(m.m[12 + i]) <= kFarthest))
+                reader.fail(
+                    fmt::format("reaches farther out than rays go, which is {}", kFarthest));
+        }
+        scene_.instances.push_back(instance);
+    }
+
+    float largestCoordinate(std::size_t mesh)
+    {
+        while (largest_.size() <= mesh) {
+            float& largest = largest_.emplace_back(0.0f);
+            for (Vec3f const& p : scene_.meshes[largest_.size() - 1].positions)
+                largest =
+                    maxOf(largest, maxOf(std::fabs(p.x), maxOf(std::fabs(p.y), std::fabs(p.z))));
+        }
+        return largest_[mesh];
+    }
+
+    void readLight(JsonReader const& reader)
+    {
+        scene_.lights.push_back(placedLight(reader));
+        if (!lightsAnything(scene_.lights.back()))
+            scene_.warnings.push_back(
+                fmt::format("{}: lights nothing at any distance; its colour or its fall-off is 0",
+                            reader.place()));
+    }
+
+    Light placedLight(JsonReader const& reader)
     {
         auto const kind = reader.find("kind");
         if (!kind)
@@ -350,9 +404,9 @@ private:
     ShaderLight readShaderLight(JsonReader const& reader)
     {
         reader.expectKeys({"class", "kind", "position", "target", "axis", "radius", "parameters"});
-        ShaderLight light{readShader(reader, kLight), reader.at("position").toVec3f()};
+        ShaderLight light{readShader(reader, kLight), readPosition(reader.at("position"))};
         if (auto const v = reader.find("radius"))
-            light.radius = v->toFloat(0);
+            light.radius = v->toFloat(0, kFarthest);
         if (reader.find("target") || reader.find("axis"))
             light.axis = readAxis(reader, light.position);
         return light;
@@ -361,11 +415,11 @@ private:
     static PointLight readPointLight(JsonReader const& reader)
     {
         reader.expectKeys({"kind", "position", "color", "radius"});
-        PointLight light{reader.at("position").toVec3f()};
+        PointLight light{readPosition(reader.at("position"))};
         if (auto const v = reader.find("color"))
             light.color = v->toVec3f();
         if (auto const v = reader.find("radius"))
-            light.radius = v->toFloat(0);
+            light.radius = v->toFloat(0, kFarthest);
         return light;
     }
 
@@ -388,8 +442,7 @@ private:
         SurfaceLight light{static_cast<int>(scene_.instances.size())};
         if (auto const v = reader.find("emission"))
             light.emission = v->toVec3f();
-        scene_.instances.push_back(
-            {mesh, -1, objectToWorld, static_cast<int>(scene_.lights.size())});
+        addInstance(reader, {mesh, -1, objectToWorld, static_cast<int>(scene_.lights.size())});
         return light;
     }
 
@@ -411,14 +464,14 @@ private:
     {
         JsonReader const aim = reader.onlyOf({"target", "axis"});
         if (reader.find("target"))
-            return toDirection(aim, aim.toVec3f() - position, "the light stands on its target");
+            return toDirection(aim, readPosition(aim) - position, "the light stands on its target");
         return toDirection(aim, aim.toVec3f(), "expected a direction that is not 0");
     }
 
     /// Turns +z to the axis, by default down, and +y as far as can be to `up`.
     static Mat4f readPose(JsonReader const& reader)
     {
-        Vec3f const position = reader.at("position").toVec3f();
+        Vec3f const position = readPosition(reader.at("position"));
         Vec3f const z = reader.find("target") || reader.find("axis") ? readAxis(reader, position)
                                                                      : Vec3f(0, 0, -1);
         auto const given = reader.find("up");
@@ -435,18 +488,21 @@ private:
 
     Scene& scene_;
     ShaderSource const& shaders_;
+    LoadOptions const& options_;
+    std::vector<float> largest_; ///< coordinate of each mesh, as far as asked for
     Names meshes_{"mesh"}, materials_{"material"};
 };
 
 } // namespace
 
-Scene loadScene(std::filesystem::path const& file, ShaderSource const& shaders)
+Scene loadScene(std::filesystem::path const& file, ShaderSource const& shaders,
+                LoadOptions const& options)
 {
-    JsonValue const tree = readSceneFile(file);
+    JsonValue const tree = readSceneFile(file, options.assignments);
     Scene scene;
     scene.file = file.string();
     scene.textures = std::make_shared<TextureStore>();
-    Loader(scene, shaders).read(JsonReader(tree));
+    Loader(scene, shaders, options).read(JsonReader(tree));
     for (std::string const& warning : scene.textures->warnings())
         scene.warnings.push_back(scene.file + ": " + warning);
     return scene;

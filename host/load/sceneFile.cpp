@@ -2,9 +2,12 @@
 
 #include "base/error.h"
 #include "base/names.h"
+#include "load/assignment.h"
 #include "load/jsonReader.h"
 
 #include <algorithm>
+#include <iostream>
+#include <iterator>
 #include <unordered_map>
 #include <unordered_set>
 
@@ -100,9 +103,14 @@ void refuseNull(JsonReader const& reader)
             refuseNull(member);
 }
 
-JsonValue readWithIncludes(fs::path const& file, std::vector<fs::path>& open)
+JsonValue readStandardInput()
 {
-    JsonValue scene = readJson(file);
+    std::string const text{std::istreambuf_iterator<char>(std::cin), {}};
+    return parseJson(text, "<stdin>");
+}
+
+JsonValue withIncludes(JsonValue scene, fs::path const& file, std::vector<fs::path>& open)
+{
     JsonReader const reader(scene);
     if (!reader.isObject())
         reader.failExpected("an object");
@@ -115,7 +123,7 @@ JsonValue readWithIncludes(fs::path const& file, std::vector<fs::path>& open)
         include->fail(included.string() + " includes itself");
     if (!fs::exists(included))
         include->fail(included.string() + ": no such file");
-    JsonValue merged = readWithIncludes(included, open);
+    JsonValue merged = withIncludes(readJson(included), included, open);
     std::erase_if(scene.members, [](JsonMember const& m) { return m.key == "include"; });
     merge(merged, JsonReader(scene), Level::Scene, {});
     return merged;
@@ -123,10 +131,14 @@ JsonValue readWithIncludes(fs::path const& file, std::vector<fs::path>& open)
 
 } // namespace
 
-JsonValue readSceneFile(fs::path const& file)
+JsonValue readSceneFile(fs::path const& file, std::vector<std::string> const& assignments)
 {
     std::vector<fs::path> open;
-    JsonValue scene = readWithIncludes(file, open);
+    bool const piped = file == "-";
+    JsonValue scene =
+        withIncludes(piped ? readStandardInput() : readJson(file), piped ? "<stdin>" : file, open);
+    for (std::string const& assignment : assignments)
+        assign(scene, assignment, "--set");
     refuseNull(JsonReader(scene));
     return scene;
 }

@@ -8,7 +8,10 @@ namespace zsi::host {
 /// Reads the scene file and, where it has the key "include", puts it over the file that it names:
 /// values of the file replace those of the included one, name by name and key by key; null takes
 /// a value out. The result has neither "include" nor null. Every value keeps the file that it came
-/// from. Throws InputError for files that are no JSON, cycles, and null where there is nothing.
-JsonValue readSceneFile(std::filesystem::path const& file);
+/// from. "-" is standard input, whose relative files start in the current folder. `assignments`:
+/// values put over those of the files (see assignment.h). Throws InputError for files that are no
+/// JSON, cycles, and null where there is nothing.
+JsonValue readSceneFile(std::filesystem::path const& file,
+                        std::vector<std::string> const& assignments = {});
 
 } // namespace zsi::host

@@ -55,6 +55,10 @@ public:
         std::lock_guard const lock(reportLock_);
         report_.rays += integrator->context().rays();
         report_.nonFinite += integrator->context().nonFinite();
+        auto const& counts = integrator->context().nonFiniteOf();
+        report_.nonFiniteOf.resize(counts.size());
+        for (std::size_t i = 0; i < counts.size(); ++i)
+            report_.nonFiniteOf[i] += counts[i];
     }
 
     RenderReport report() const
@@ -77,10 +81,11 @@ private:
         int const top = window_.y0 + tile / tilesAcross_ * kTile;
         Window const pixels = intersection({left, top, left + kTile, top + kTile}, window_);
 
+        std::uint64_t surfaces = 0;
         Film part(film_.frameWidth(), film_.frameHeight(), pixels, film_.layers());
         for (int y = pixels.y0; y < pixels.y1; ++y)
             for (int x = pixels.x0; x < pixels.x1; ++x)
-                if (!render(integrator, x, y, samples, part))
+                if (!render(integrator, x, y, samples, part, surfaces))
                     return;
         {
             std::lock_guard const lock(tileLocks_[static_cast<std::size_t>(tile)]);
@@ -88,6 +93,7 @@ private:
         }
         std::lock_guard const lock(reportLock_);
         ++done_;
+        report_.surfaces += surfaces;
         if (job_.tileDone) {
             std::lock_guard const tileLock(tileLocks_[static_cast<std::size_t>(tile)]);
             job_.tileDone(pixels, samples);
@@ -97,7 +103,8 @@ private:
     }
 
     /// False when the job was cancelled meanwhile.
-    bool render(Integrator& integrator, int x, int y, SampleRange samples, Film& part) const
+    bool render(Integrator& integrator, int x, int y, SampleRange samples, Film& part,
+                std::uint64_t& surfaces) const
     {
         Sampler sampler(settings_.seed, x, y);
         for (std::uint32_t i = samples.begin; i < samples.end; ++i) {
@@ -110,6 +117,7 @@ private:
             Vec3f origin, direction;
             camera_.ray(rasterX, rasterY, sampler.next2D(), origin, direction);
             CameraSample sample = integrator.sample(origin, direction, rasterX, rasterY, sampler);
+            surfaces += sample.surface != nullptr;
             if (!sample.isFinite)
                 continue;
             sample.color = limited(sample.color);

@@ -29,6 +29,8 @@ struct RenderJob {
 
 struct RenderReport {
     std::uint64_t nonFinite = 0; ///< results that were not finite and were left out
+    std::vector<std::uint64_t> nonFiniteOf = {}; ///< the same by material, last the environment's
+    std::uint64_t surfaces = 0; ///< camera samples that saw a surface
     std::uint64_t rays = 0;
     double seconds = 0;
     bool complete = true; ///< false: cancelled, some samples are missing

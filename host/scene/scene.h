@@ -16,6 +16,9 @@ namespace zsi::host {
 
 class TextureStore;
 
+/// Coordinates go up to this: rays are traced within 1.8e18, and squares are still finite.
+constexpr float kFarthest = 1e18f;
+
 /// Triangles with per-vertex data. Every array but `triangles` is either empty or as long as
 /// `positions`; the loader fills normals, uv, tangents and bitangents that a file lacks.
 struct Mesh {

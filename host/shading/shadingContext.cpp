@@ -40,6 +40,7 @@ ShadingContext::ShadingContext(PreparedScene const& scene, RadianceSource& sourc
     , settings_(scene.scene().settings)
     , source_(source)
     , maxDepth_(static_cast<std::uint32_t>(settings_.maxDepth > 0 ? settings_.maxDepth : 0))
+    , nonFiniteOf_(scene.scene().materials.size() + 1)
 {
 }
 
@@ -96,7 +97,12 @@ Vec4f ShadingContext::environment(PathRay const& ray)
         return {0, 0, 0, 0};
     ShadeState state = record(ray);
     environment->shade(this, state);
-    return withAlpha(finite(rgb(state.Ci)), state.Ci.w);
+    if (!isFinite(rgb(state.Ci))) {
+        ++nonFinite_;
+        ++nonFiniteOf_.back();
+        return withAlpha({0, 0, 0}, state.Ci.w);
+    }
+    return state.Ci;
 }
 
 bool ShadingContext::shade(PathRay const& ray, SurfacePoint const& surface, Vec4f& result)
@@ -170,8 +176,19 @@ Vec3f ShadingContext::finite(Vec3f v)
 {
     if (isFinite(v))
         return v;
-    ++nonFinite_;
+    countNonFinite();
     return {0, 0, 0};
+}
+
+void ShadingContext::countNonFinite()
+{
+    ++nonFinite_;
+    SurfacePoint const* const surface = call_ ? &call_->surface
+        : hasFirstHit_                        ? &firstHit_.surface
+                                              : nullptr;
+    int const material =
+        surface ? scene_.scene().instances[surface->instance].material : -1; // a light has none
+    ++nonFiniteOf_[material < 0 ? nonFiniteOf_.size() - 1 : static_cast<std::size_t>(material)];
 }
 
 } // namespace zsi::host

@@ -28,7 +28,10 @@ public:
     Sampler& sampler() { return *sampler_; }
     std::uint64_t rays() const { return rays_; }
     std::uint64_t nonFinite() const { return nonFinite_; }
-    void countNonFinite() { ++nonFinite_; }
+    /// The same by material, and behind the last one of the environment.
+    std::vector<std::uint64_t> const& nonFiniteOf() const { return nonFiniteOf_; }
+    /// Of the running call's material, else of the one that the camera sees, else the environment.
+    void countNonFinite();
     /// Of the running sample; null while no surface was shown.
     FirstHit const* firstHit() const { return hasFirstHit_ ? &firstHit_ : nullptr; }
 
@@ -146,6 +149,7 @@ private:
     bool hasFirstHit_ = false;
     std::uint64_t rays_ = 0;
     std::uint64_t nonFinite_ = 0;
+    std::vector<std::uint64_t> nonFiniteOf_;
 };
 
 inline bool isFinite(Vec3f v)

@@ -38,6 +38,15 @@ bool normalMatrix(Mat4f const& a, Mat3f& result)
     return true;
 }
 
+/// Outside of this range tracing ends the program.
+bool isTraceable(Ray const& ray)
+{
+    auto const inside = [](Vec3f v) {
+        return std::fabs(v.x) < 1.8e18f && std::fabs(v.y) < 1.8e18f && std::fabs(v.z) < 1.8e18f;
+    };
+    return inside(ray.origin) && inside(ray.direction) && ray.tMax >= 0.0f;
+}
+
 RTCRayHit embreeRay(Ray const& ray)
 {
     RTCRayHit r;
@@ -265,6 +274,8 @@ void RayScene::rebuildInstances(BuildProgress const& progress)
 
 bool RayScene::intersect(Ray const& ray, Visibility visible, Hit& hit) const
 {
+    if (!isTraceable(ray))
+        return false;
     RTCRayHit r = embreeRay(ray);
     RTCIntersectContext context;
     rtcInitIntersectContext(&context);
@@ -278,6 +289,8 @@ bool RayScene::intersect(Ray const& ray, Visibility visible, Hit& hit) const
 
 bool RayScene::occluded(Ray const& ray, Visibility visible) const
 {
+    if (!isTraceable(ray))
+        return false;
     RTCRayHit r = embreeRay(ray);
     RTCIntersectContext context;
     rtcInitIntersectContext(&context);
