@@ -205,6 +205,8 @@ int render(Arguments const& arguments, std::string const& shaderPath)
     host::Scene const scene = load(arguments, libraries);
     for (std::string const& warning : scene.warnings)
         reporter.warning(warning);
+    if (scene.instances.empty() && !scene.environment)
+        reporter.warning(scene.file + ": nothing to see: no instances and no environment");
     reporter.detail(contents(scene));
 
     host::RenderReport report;
@@ -283,6 +285,7 @@ Subcommand addRender(CLI::App& app, std::string const& shaderPath)
                      "Layers of an .exr beside the beauty: "
                          + fmt::format("{}", fmt::join(host::layerNames(), ", ")))
         ->delimiter(',')
+        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll)
         ->allow_extra_args(false)
         ->type_name("NAME[,NAME]");
     command

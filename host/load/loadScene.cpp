@@ -256,9 +256,6 @@ public:
             v->expectKeys({"class", "parameters"});
             scene_.environment = readShader(*v, kEnvironment);
         }
-        if (scene_.instances.empty() && !scene_.environment)
-            scene_.warnings.push_back(root.value().file->string()
-                                      + ": nothing to see: no instances and no environment");
     }
 
 private:
