@@ -28,6 +28,7 @@ namespace {
 
 constexpr int kMaxThreads = 1024;
 constexpr int kMaxSamples = 1 << 20;
+constexpr int kMaxCache = 1 << 20; ///< megabytes
 constexpr int kMaxSide = 32768; ///< pixels
 constexpr std::int64_t kMaxSeed = std::numeric_limits<std::uint32_t>::max();
 
@@ -37,6 +38,7 @@ struct Arguments {
     int threads = 0;
     std::optional<int> samples;
     std::optional<std::int64_t> seed;
+    std::optional<int> textureCache; ///< megabytes
     std::string integrator;
     std::vector<std::string> layers, assignments;
     bool quiet = false, verbose = false;
@@ -152,6 +154,8 @@ host::Scene load(Arguments const& arguments, host::ShaderLibraries const& librar
     ProgressBar bar(!arguments.quiet);
     host::LoadOptions options;
     options.assignments = arguments.assignments;
+    if (arguments.textureCache)
+        options.textures.cacheBytes = static_cast<std::size_t>(*arguments.textureCache) << 20;
     options.progress = [&](std::string const& path) { bar.show("loading " + path); };
     host::Scene scene = host::loadScene(arguments.scene, libraries, options);
     if (size)
@@ -295,6 +299,11 @@ Subcommand addRender(CLI::App& app, std::string const& shaderPath)
         ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll)
         ->allow_extra_args(false)
         ->type_name("PATH=VALUE");
+    command
+        ->add_option("--texture-cache", arguments->textureCache,
+                     "Megabytes of pictures in memory; more than that lies in scratch files")
+        ->check(CLI::Range(1, kMaxCache))
+        ->type_name("MB");
     command->add_flag("-q,--quiet", arguments->quiet, "Tell of nothing but errors");
     command
         ->add_flag("-v,--verbose", arguments->verbose, "Tell what is loaded and how long it takes")

@@ -150,12 +150,15 @@ private:
             return &found->value;
         // Sections and parameters that a file leaves out are there all the same; things are not.
         constexpr std::string_view kSections[] = {"camera", "film", "settings", "environment"};
-        bool const section = depth_ == 1
-            && std::find(std::begin(kSections), std::end(kSections), key) != std::end(kSections);
-        if (!section && key != "parameters")
-            fail(fmt::format("{} has no \"{}\"{}",
-                             all.size() == path_.size() ? "the scene" : before(all), printable(key),
-                             suggestion(key, keysOf(object))));
+        std::vector<std::string> known = keysOf(object);
+        if (depth_ == 1)
+            known.insert(known.end(), std::begin(kSections), std::end(kSections));
+        bool const implied = depth_ == 1
+            ? std::find(std::begin(kSections), std::end(kSections), key) != std::end(kSections)
+            : key == "parameters";
+        if (!implied)
+            fail(fmt::format("{} has no \"{}\"{}", depth_ == 1 ? "the scene" : before(all),
+                             printable(key), suggestion(key, known)));
         JsonValue made;
         made.kind = Kind::Object;
         made.file = value_.file;

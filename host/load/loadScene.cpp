@@ -498,7 +498,7 @@ Scene loadScene(std::filesystem::path const& file, ShaderSource const& shaders,
     JsonValue const tree = readSceneFile(file, options.assignments);
     Scene scene;
     scene.file = file.string();
-    scene.textures = std::make_shared<TextureStore>();
+    scene.textures = std::make_shared<TextureStore>(options.textures);
     Loader(scene, shaders, options).read(JsonReader(tree));
     for (std::string const& warning : scene.textures->warnings())
         scene.warnings.push_back(scene.file + ": " + warning);

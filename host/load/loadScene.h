@@ -3,6 +3,7 @@
 
 #include "plugin/shaderSource.h"
 #include "scene/scene.h"
+#include "texture/textureStore.h"
 
 #include <filesystem>
 #include <functional>
@@ -12,6 +13,7 @@ namespace zsi::host {
 struct LoadOptions {
     /// Values that stand in the place of the file's own, "PATH=VALUE" (load/assignment.h).
     std::vector<std::string> assignments = {};
+    TextureOptions textures = {};
     /// Called with the path in the scene, such as "meshes.ball", of what is loaded next.
     std::function<void(std::string const& path)> progress = {};
 };

@@ -7,6 +7,7 @@
 #include "support/inputError.h"
 #include "support/temporaryFolder.h"
 
+#include <array>
 #include <chrono>
 #include <csignal>
 #include <cstdlib>
@@ -14,7 +15,9 @@
 #include <gtest/gtest.h>
 #include <iterator>
 #include <nlohmann/json.hpp>
+#include <pty.h>
 #include <set>
+#include <sstream>
 #include <sys/wait.h>
 #include <thread>
 #include <unistd.h>
@@ -138,7 +141,41 @@ TEST_F(Command, RendersTheSceneAndOptionsOverrideIt)
     scene.settings.samples = 2;
     scene.settings.seed = 77;
     EXPECT_EQ(content(folder_.path / "b.png"), expected());
-    EXPECT_EQ(files().size(), before_.size() + 3) << "nothing but the pictures";
+    Result const piped = zsi("render - -q -o c.exr --set film.width=40 "
+                             "--integrator path --layers depth --texture-cache 64 <scene.json");
+    EXPECT_EQ(piped.out + piped.err, "");
+    scene = host::loadScene(folder_.path / "scene.json", libraries(), {{"film.width=40"}});
+    scene.settings.integrator = "path";
+    scene.film.layers = {"depth"};
+    host::writePicture(folder_.path / "want.exr", host::render(scene), {});
+    EXPECT_TRUE(content(folder_.path / "c.exr") == content(folder_.path / "want.exr"));
+    EXPECT_EQ(files().size(), before_.size() + 5) << "nothing but the pictures";
+}
+
+TEST_F(Command, ProgressFitsTheTerminal)
+{
+    for (unsigned short const columns : std::array<unsigned short, 2>{30, 100}) {
+        winsize const size{24, columns, 0, 0};
+        int terminal = -1;
+        pid_t const child = forkpty(&terminal, nullptr, nullptr, &size);
+        if (child == 0) {
+            if (chdir(folder_.path.c_str()) == 0)
+                execl(ZSI_COMMAND, "zsi", "render", "scene.json", "-o", "/dev/null", "-o", "a.png",
+                      "--size", "400x400", nullptr);
+            _exit(99);
+        }
+        std::string all;
+        char part[4096];
+        for (ssize_t n; (n = read(terminal, part, sizeof(part))) > 0;)
+            all.append(part, static_cast<std::size_t>(n));
+        waitpid(child, nullptr, 0);
+        close(terminal);
+        EXPECT_NE(all.find("rendering "), std::string::npos) << all;
+        EXPECT_EQ(all.find("[##") != std::string::npos, columns == 100);
+        std::istringstream lines(all.substr(0, all.find("a.png:")));
+        for (std::string line; std::getline(lines, line, '\r');)
+            EXPECT_LT(line.substr(0, line.find('\033')).size(), columns) << line;
+    }
 }
 
 TEST_F(Command, BadCallsEndInOneLineAndLeaveNothing)
@@ -161,6 +198,9 @@ TEST_F(Command, BadCallsEndInOneLineAndLeaveNothing)
         {render + "--size 10x10x", 2, {"--size"}},
         {render + "--crop 5,5,5,9", 2, {"--crop", "X0,Y0,X1,Y1"}},
         {render + "--crop 0,0,33,24", 2, {"32x32"}},
+        {render + "--integrator pth", 2, {"--integrator pth", "did you mean path?"}},
+        {render + "--layers depth", 2, {"--layers", "expected an .exr"}},
+        {render + "--set film.width=0", 1, {"--set: film.width: expected"}},
         {"info --shader-path " ZSI_FIXTURE_DIR "/oldShaders", 1, {"version 2700", "version 2722"}},
         // Before the scene is looked at, since that may take long.
         {"render missing.json -o /proc/a.png", 1, {"/proc/a.png: cannot be written"}},

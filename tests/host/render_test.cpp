@@ -1,4 +1,5 @@
 // Small pictures with known answers.
+#include "scene/resize.h"
 #include "support/hostScene.h"
 
 #include <array>
@@ -349,6 +350,44 @@ TEST(Render, SurfaceLightsAreSeenAndLightTheirSurroundings)
         }
 }
 
+/// A picture that tells where it is looked up.
+class Plate final : public HostTexture2D {
+public:
+    void reserved0() override { }
+    void reserved1() override { }
+    void lookup(Vec4f* result, Vec2f const* uv) const override { *result = {uv->x, uv->y, 1, 1}; }
+};
+
+TEST(Render, ABackplateKeepsItsPlaceWhateverTheSize)
+{
+    Plate const plate;
+    HostTexture2D const* const picture = &plate;
+    for (Vec2f const stated : {Vec2f(-1, -1), Vec2f(16, 8)})
+        for (auto const& [width, height] : {std::pair{16, 8}, {32, 16}, {64, 16}}) {
+            Stage stage;
+            stage.scene.film.width = 16;
+            stage.scene.film.height = 8;
+            host::Shader shader = libraries().create("corvid_Env_Backplate");
+            shader.set("useBackgroundImage", true);
+            shader.set("backgroundImage", picture);
+            shader.set("render_size", stated);
+            shader.set("uv_scale", Vec2f(1.0f / 16, 1.0f / 8));
+            stage.scene.environment = std::move(shader);
+            host::resize(stage.scene, width, height);
+            host::Picture const p = stage.render();
+            ASSERT_EQ(p.width(), width);
+            // Within a pixel of where it lies when the plate is two heights wide and in the middle.
+            auto const w = static_cast<float>(width), h = static_cast<float>(height);
+            for (int x = width / 2 - height + 1; x < width / 2 + height; x += 3) {
+                Vec4f const seen = pixel(p, x, height / 4);
+                float const u = 0.5f + (static_cast<float>(x) + 0.5f - w / 2) / (2 * h);
+                EXPECT_NEAR(seen.x, u, 0.75f / h) << width;
+                EXPECT_NEAR(seen.y, 0.75f - 0.5f / h, 1.5f / h) << width;
+            }
+            EXPECT_EQ(pixel(p, 4, height / 2).z == 1.0f, width < 64) << "beside it, the background";
+        }
+}
+
 TEST(Render, BrokenResultsAreCountedAndStayAlone)
 {
     float const nan = std::numeric_limits<float>::quiet_NaN();
@@ -362,6 +401,7 @@ TEST(Render, BrokenResultsAreCountedAndStayAlone)
     }));
     expectNear(mean(direct.render(2, &report)), {1, 1, 1, 1}, 0, "what is left is whole");
     EXPECT_NEAR(static_cast<double>(report.nonFinite), 64 * 64 / 2, 150);
+    EXPECT_EQ(report.nonFiniteOf, (std::vector<std::uint64_t>{report.nonFinite, 0})) << "whose";
 
     Stage lit;
     lit.lamp({0, 0, 5}, {nan, 1, 1});

@@ -135,6 +135,45 @@ TEST_F(SceneFile, AnIncludingSceneChangesTheIncludedOne)
     EXPECT_TRUE(scene.lights.empty());
 }
 
+TEST_F(SceneFile, AssignmentsStandInThePlaceOfTheFile)
+{
+    fs::path const file = folder.write("scene.json", R"({
+        "camera": {"position": [1, 2, 3]},
+        "materials": {"m.1": {"class": "TinyMaterial", "parameters": {"amount": 2, "count": 9}}},
+        "lights": {"l": {"class": "voPointLight", "position": [0, 0, 1]}}})");
+    auto const with = [&](std::vector<std::string> const& assignments) {
+        return loadScene(file, libraries(), {assignments});
+    };
+    Scene const scene =
+        with({"materials.m.1.parameters.amount=6.5", "camera.position[1]=-7",
+              "materials.m.1.parameters.pair=[3, 4]", "film={\"width\": 20}",
+              "settings.integrator=path", "lights.l=null", "materials.m.1.parameters.count=null"});
+    EXPECT_EQ(value<float>(scene.materials[0], "amount"), 6.5f);
+    EXPECT_EQ(value<int>(scene.materials[0], "count"), 3) << "its default";
+    expectNear(numbers(value<Vec2f>(scene.materials[0], "pair")), {3, 4});
+    expectNear(numbers(scene.camera.position), {1, -7, 3});
+    EXPECT_EQ(scene.film.width, 20);
+    EXPECT_EQ(scene.settings.integrator, "path");
+    EXPECT_TRUE(scene.lights.empty());
+
+    struct Bad {
+        char const* assignment;
+        std::vector<std::string> parts;
+    };
+    for (Bad const& bad : {Bad{"film.width", {"PATH=VALUE"}},
+                           {"film.width=wide", {"film.width: expected", "\"wide\""}},
+                           {"film.width=[1", {"film.width: [1: ", "no valid JSON"}},
+                           {"flim.width=1", {"flim.width", "did you mean film?"}},
+                           {"lights.m.position=[0, 0, 0]", {"lights has no \"m\""}},
+                           {"camera.position[3]=1", {"camera.position[3]", "3 elements"}},
+                           {"camera.position.x=1", {"camera.position is no object"}},
+                           {"lights.k=null", {"nothing here", "did you mean l?"}},
+                           {"lights.l.parameters.colour=1", {"did you mean color?"}}})
+        expectContains(errorOf([&] { with({bad.assignment}); }),
+                       std::vector<std::string>(bad.parts.begin(), bad.parts.end()));
+    expectContains(errorOf([&] { with({"film=1"}); }), {"--set: film: expected an object"});
+}
+
 /// What a value of a file costs must not grow with the file.
 TEST_F(SceneFile, LoadingTimeGrowsWithTheFile)
 {
