@@ -1,0 +1,258 @@
+// Noise, brickwork and the wiring of the nine Ward variants, seen through the entry points.
+#include "support/textTable.h"
+
+namespace zsi {
+namespace {
+
+/// A variant with its network on: diffuse colour without lobe, cosine against the bumped normal.
+struct Variant : test::Subject {
+    explicit Variant(std::string const& name)
+        : Subject("corvid_Mtl_Ward_" + name)
+    {
+        set("reflectivity=0 cosineUsesBump=1");
+        for (auto const& [flag, network] : {std::pair("u_diffuseMapEnable", "_ward_diffuse"),
+                                            {"u_normal0MapEnable", "_ward_normal0"},
+                                            {"u_cutoutMapEnable", "_ward_cutout"}})
+            set(flag, byName.lower_bound(network)->first.starts_with(network));
+    }
+    Vec3f albedo() { return transfer({0, 0, 1}) * 3.14159265f; }
+    /// Diffuse colour, cosine, what a shadow ray keeps.
+    std::array<float, 5> results(Vec3f L = {0, 0, 1})
+    {
+        Vec3f const c = transfer(L) * 3.14159265f;
+        material().transmission(&host, state);
+        return {c.x, c.y, c.z, state.sampleCosine, state.transmissionColor.x};
+    }
+};
+
+TEST(WardNetworks, NoiseBlendsBetweenItsThresholds)
+{
+    // Noise of the host; weight of the second colour.
+    for (test::Line const& line : test::table(R"(
+plain, half way                              | type=0 thresholdLow=.25 thresholdHigh=.75 | .5 .5
+at the low threshold                         | type=0 thresholdLow=.25 thresholdHigh=.75 | .25 0
+above the high one                           | type=0 thresholdLow=.25 thresholdHigh=.75 | .8 1
+equal: the value itself, above               | type=0 thresholdLow=.5 thresholdHigh=.5   | .75 .75
+and below                                    | type=0 thresholdLow=.5 thresholdHigh=.5   | .25 .25
+the wrong way round: below low comes first   | type=0 thresholdLow=.75 thresholdHigh=.25 | .5 0
+fractal: (1/2 + 1/4 + 1)/2                   | type=1 levels=2                           | .75 .875
+a fraction is a whole octave                 | type=1 levels=2.1                         | .75 .9375
+less than one level                          | type=1 levels=.01                         | .75 .75
+no levels                                    | type=1                                    | .75 .5
+turbulence: 1/2 + 1/4                        | type=2 levels=2                           | .25 .75
+beyond 1                                     | type=2 levels=3 thresholdHigh=4           | 1 .4375
+unknown: 0 through the thresholds            | type=3 levels=2 thresholdLow=-1           | .9 .5
+unknown, negative                            | type=-1 levels=2 thresholdLow=.1          | .9 0
+)")) {
+        Variant v("120b7820");
+        v.prefix = "_ward_diffuse_color_Noise_";
+        v.set("color1=0,1,.25,0 color2=1,0,.75,1 thresholdHigh=1 " + line.settings);
+        v.host.onNoise = [&](Vec4f) { return line.want[0]; };
+        float const w = line.want[1];
+        EXPECT_TRUE(test::near(v.albedo(), Vec3f(w, 1 - w, 0.25f + 0.5f * w), 2e-6)) << line.why;
+    }
+    // Octaves of a placed position, of which the phase is none; an end to any number of levels.
+    Variant v("120b7820");
+    v.prefix = "_ward_diffuse_color_Noise_";
+    v.set("type=1 size=2 levels=2 phase=.75 xform=1,2,3,0,4,5,6,0,7,8,9,0,10,20,30,1");
+    v.state.Pref = {1, 10, 100};
+    std::vector<Vec4f> asked;
+    v.host.onNoise = [&](Vec4f p) {
+        asked.push_back(p);
+        return 0.5f;
+    };
+    v.albedo();
+    ASSERT_EQ(asked.size(), 2u);
+    EXPECT_TRUE(test::near(asked[0], {375.5f, 436, 496.5f, 0.75f}, 0)); // (1 + 40 + 700 + 10)/2 ..
+    EXPECT_TRUE(test::near(asked[1], {751, 872, 993, 0.75f}, 0));
+    v.set("size=0 levels=1e9");
+    asked.clear();
+    v.albedo();
+    EXPECT_LT(asked.size(), 100u);
+    EXPECT_TRUE(std::isfinite(asked.at(0).x)) << "a size of 0";
+}
+
+TEST(WardNetworks, TileLaysBricksInMortar)
+{
+    // Red of bricks, green of mortar, distance of the eye. Cells of a quarter with mortar for a
+    // tenth at each end, rows not shifted, so that (.375, .375) is the middle of the second brick
+    // of the second row, and .26 and .49 are mortar. The noise is 1 for edges and rows, 0.75 for
+    // rows of a high seed; bricks draw (0.25, 0.25, 0.1), but 0.75 first in column 0 or with a high
+    // seed.
+    for (test::Line const& line : test::table(R"(
+brick                     | uv=.375,.375                                                 | 1 0 0
+mortar left of it         | uv=.26,.375                                                  | 0 1 0
+right of it               | uv=.49,.375                                                  | 0 1 0
+below it                  | uv=.375,.26                                                  | 0 1 0
+beside the square         | uv=-.1,.375                                                  | 0 0 0
+above it                  | uv=.375,1.1                                                  | 0 0 0
+goes on beside            | uv=-.625,.375 repeatX=1                                      | 1 0 0
+but not above             | uv=.375,1.375 repeatX=1                                      | 0 0 0
+fewer columns             | uv=.26,.375 horizontalCount=1.9                              | 1 0 0
+fewer rows                | uv=.375,.26 verticalCount=1.9                                | 1 0 0
+wider mortar along u      | uv=.3,.375 horizontalCount=3.7 horizontalGap=.3              | 0 1 0
+along v                   | uv=.375,.3 verticalCount=3.7 verticalGap=.3                  | 0 1 0
+wider bricks              | uv=.26,.375 brickWidth=2                                     | 1 0 0
+higher bricks             | uv=.375,.26 brickHeight=2                                    | 1 0 0
+second row shifted        | uv=.375,.375 lineShift=0                                     | 0 1 0
+first row not             | uv=.375,.125 lineShift=0                                     | 1 0 0
+rows at random            | uv=.375,.375 randomShift=1                                   | 0 1 0
+another seed, no shift    | uv=.375,.375 randomShift=1 randomSeed=9                      | 1 0 0
+second row edited         | uv=.26,.375 useRowEdit=1 perRow=2 changeRow=2                | 1 0 0
+first row not             | uv=.26,.125 useRowEdit=1 perRow=2 changeRow=2                | 0 1 0
+second column edited      | uv=.375,.26 useColumnEdit=1 perColumn=2 changeColumn=2       | 1 0 0
+first column not          | uv=.125,.26 useColumnEdit=1 perColumn=2 changeColumn=2       | 0 1 0
+the product               | uv=.375,.375 colorVariance=.5 fadeVariance=.5                | .45 0 0
+brighter, but not above 1 | uv=.375,.375 colorVariance=-4                                | 1 0 0
+all holes                 | uv=.375,.375 holes=100                                       | 0 1 0
+hole: .75 above 1/2       | uv=.125,.375 holes=1                                         | 0 1 0
+no hole: .25              | uv=.375,.375 holes=1                                         | 1 0 0
+at 1/4 not yet            | uv=.375,.375 holes=3                                         | 1 0 0
+above 1/5                 | uv=.375,.375 holes=4                                         | 0 1 0
+another seed              | uv=.375,.375 holes=1 randomSeed=9                            | 0 1 0
+fifth column              | uv=.95,.375 holes=1 randomShift=1                            | 1 0 0
+which is the first again  | uv=.95,.375 holes=1 randomShift=1 repeatX=1                  | 0 1 0
+edges displaced by .01    | uv=.27,.375 edgeRoughness=10                                 | 1 0 0
+over the end of the square | uv=.99,.375 edgeRoughness=40                                | 1 0 0
+along v too               | uv=.375,.99 edgeRoughness=40                                  | 1 0 0
+hardly displaced          | uv=.999,.375 edgeRoughness=1e-6                              | 0 1 0
+cells of no size          | uv=.375,.375 brickWidth=1e-40 horizontalCount=1e6 horizontalGap=.25 verticalCount=-.1  | 0 1 0
+placed by the third row   | uv=.01,.375 xform=1,0,0,0,0,1,0,0,.115,0,1,0,0,0,0,1         | 1 0 0
+and the fourth            | uv=.375,.01 xform=1,0,0,0,0,1,0,0,0,0,1,0,0,.115,0,1         | 1 0 0
+a pixel of .05 on an edge | uv=.275,.375                                                 | .5 .5 6.0355
+at .05 from the edge      | uv=.3,.375                                                   | 1 0 6.0355
+the same at 53 degrees    | uv=.3,.375 I=.8,0,-.6                                        | .8 .2 6.0355
+far away: the mean        | uv=.375,.375                                                 | .64 .36 1000
+)")) {
+        Variant v("f05db29e");
+        v.prefix = "_ward_diffuse_color_Tile_";
+        v.set("brickColor_UnifiedBitmap_texture=1,0,0,1 brickColor_UnifiedBitmap_amount=1 "
+              "mortarColor_UnifiedBitmap_texture=0,1,0,1 mortarColor_UnifiedBitmap_amount=1 "
+              "horizontalCount=3.9 verticalCount=3.9 horizontalGap=.1 verticalGap=.1 "
+              "lineShift=-.5 normal0MapEnable=0 "
+              + line.settings);
+        v.host.onNoise = [](Vec4f p) { return p.y > 0 || p.x < 5 ? 1.0f : 0.75f; };
+        v.host.onCellNoise = [](Vec3f p) {
+            return Vec3f(p.x < 1 || p.z > 5 ? 0.75f : 0.25f, 0.25f, 0.1f);
+        };
+        v.state.imageHeight = 100;
+        v.state.E = v.state.P - v.state.I * line.want.at(2);
+        EXPECT_TRUE(test::near(v.albedo(), Vec3f(line.want[0], line.want[1], 0), 1e-4)) << line.why;
+    }
+}
+
+/// What feeds what, by the names of the parameters: pictures are linear in u, noises in the
+/// position's x, all nodes are distinct, and tiles are all brick or all mortar.
+struct Wiring {
+    Variant& v;
+    char const* tileInput;
+
+    static float distinct(std::string const& name)
+    {
+        return static_cast<float>(std::hash<std::string>{}(name) % 89) / 89;
+    }
+    static Vec4f picture(float k, float u)
+    {
+        return {0.1f + 0.3f * k + 0.2f * u, 0.6f - k * u * 0.5f, 0.5f * k * k, 0.3f + 0.5f * k};
+    }
+    Vec4f operator()(std::string const& path, float u, float x) const
+    {
+        auto const has = [&](char const* field) { return v.byName.contains(path + field); };
+        if (has("_UnifiedBitmap_xform"))
+            return picture(distinct(path + "_UnifiedBitmap_texture"), u) * 0.75f;
+        if (has("_Tile_xform"))
+            return (*this)(path + tileInput, u, x);
+        if (!has("_Noise_xform"))
+            return *reinterpret_cast<Vec4f const*>(v.byName.at(path).field);
+        float const w = (0.5f + 0.1f * x) / (1 + distinct(path + "_Noise_thresholdHigh"));
+        return (*this)(path + "_Noise_color1", u, x) * (1 - w)
+            + (*this)(path + "_Noise_color2", u, x) * w;
+    }
+};
+
+TEST(WardNetworks, EveryNodeFeedsItsInputAndEveryRootItsChannel)
+{
+    for (char const* name : {"120b7820", "33632204", "5592d496", "5ba0bfff", "82261344", "aa598cb4",
+                             "b9aac246", "ccb3a2e6", "f05db29e"})
+        for (float const holes : {0.0f, 100.0f}) {
+            SCOPED_TRACE(name);
+            Variant v(name);
+            v.set("uv=.4,.3 Pref=.7,0,0 imageFadeEnable=1 imageFade=.8 diffuseColor=.5,.5,.5 "
+                  "diffuseAmount=9 diffuseTransform=9,9,9,9,9,9,9,9,9 normal0Amount=400 "
+                  "normal0Transform=2,0,0,0,1,0,.1,0,1 cutoutAmount=.9 "
+                  "cutoutTransform=3,0,0,0,1,0,-.4,0,1");
+            v.host.onNoise = [](Vec4f p) { return 0.5f + 0.1f * p.x; };
+            for (auto const& [row, field] : v.byName) {
+                float const k = Wiring::distinct(row);
+                if (row.ends_with("_texture"))
+                    v.texture(row, [k](Vec2f p) { return Wiring::picture(k, p.x); });
+                else if (row.ends_with("_thresholdHigh"))
+                    v.set(row, 1 + k);
+                else if (row.ends_with("_amount"))
+                    v.set(row, 0.75f);
+                else if (row.ends_with("lCount")) // horizontal and vertical
+                    v.set(row, 1);
+                else if (row.ends_with("_holes"))
+                    v.set(row, holes);
+                else if (field.type == "Vec4f")
+                    v.set(row, {k, row.ends_with('1') ? 0.1f : 0.9f, 0.6f, 0.9f});
+            }
+            Wiring const network{v, holes == 0 ? "_Tile_brickColor" : "_Tile_mortarColor"};
+            auto const on = [&](char const* flag) { return *v.byName.at(flag).field != 0; };
+            Vec3f diffuse(0.5f, 0.5f, 0.5f);
+            float slope = 0, cut = 1;
+            if (on("u_diffuseMapEnable")) {
+                Vec4f const c = network("_ward_diffuse_color", 0.4f, 0.7f);
+                diffuse = mix(diffuse, rgb(c), c.w * 0.8f);
+            }
+            if (on("u_normal0MapEnable")) { // both u and the position move by 0.001
+                auto const height = [&](float step) {
+                    Vec4f const c = network("_ward_normal0_map", 0.9f + step, 0.7f + step);
+                    return c.x + c.y + c.z;
+                };
+                slope = (height(-0.0495f) - height(0.0505f)) * (0.01f * 400 * 3.33f);
+                EXPECT_GT(std::fabs(slope), 1e-2f);
+            }
+            if (on("u_cutoutMapEnable"))
+                cut = 0.9f * network("_ward_cutout_map", 0.8f, 0.7f).x;
+            auto const got = v.results({0.6f, 0, 0.8f});
+            EXPECT_TRUE(test::near(Vec3f(got[0], got[1], got[2]), diffuse, 1e-5));
+            EXPECT_NEAR(got[3], (0.6f * slope + 0.8f) / std::sqrt(1 + slope * slope), 1e-3f);
+            EXPECT_NEAR(got[4], 1 - cut, 1e-5f);
+        }
+}
+
+TEST(WardNetworks, BitmapLiesAlongUvOrOnABox)
+{
+    for (test::Line const& line : test::table(R"(
+uv, 1, 1: .05 + .05 + .3 + .04 | uv=.5,.25 xform=.1,0,0,0,.2,0,0,0,.3,0,0,0,.04,0,0,1          | .44
+placed on z: .01 + .04 + .09   | isCube=1 Nref=0,0,-1 xform=.1,0,0,0,.2,0,0,0,.3,0,1,0,0,0,0,1 | .14
+z turned to x                  | isCube=1 Nref=0,0,-1 xform=0,0,1,0,0,1,0,0,1,0,0,0,0,0,0,1    | .1
+face of x                      | isCube=1 Nref=.6,-.6,.5                                       | .3
+face of y                      | isCube=1 Nref=.5,.6,-.6                                       | .1
+)")) {
+        Variant v("82261344");
+        v.prefix = "_ward_cutout_map_UnifiedBitmap_";
+        v.texture(v.prefix + "texture", [](Vec2f p) { return Vec4f(p.x, 9, 9, 9); });
+        v.set("amount=.5 Pref=.1,.2,.3 cutoutAmount=.5 " + line.settings);
+        EXPECT_NEAR(v.results()[4], 1 - line.want[0] / 4, 1e-6f) << line.why;
+    }
+}
+
+TEST(WardNetworks, ReliefTurnsAndGrowsWithItsObject)
+{
+    Variant v("5ba0bfff");
+    v.prefix = "_ward_normal0_map_Noise_";
+    v.set("color2=1,1,1,1 thresholdHigh=1 size=1 normal0Amount=40");
+    v.host.onNoise = [](Vec4f p) { return 0.5f + p.x - 2 * p.y + 3 * p.z; };
+    float const plain = v.results({0.48f, 0.36f, 0.8f})[3];
+    // Row by row, twice as large: x to y, y to z, z to x.
+    v.state.objectToWorld = Mat4f(0, 2, 0, 0, 0, 0, 2, 0, 2, 0, 0, 0, 0, 0, 0, 1);
+    v.state.I = {-1, 0, 0};
+    v.state.N = v.state.Ng = {1, 0, 0};
+    EXPECT_NEAR(v.results({0.8f, 0.48f, 0.36f})[3], plain, 1e-3f);
+    EXPECT_GT(std::fabs(plain - 0.8f), 0.1f);
+}
+
+} // namespace
+} // namespace zsi
