@@ -47,7 +47,7 @@ Vec3f PathIntegrator::directLight(ShadingContext::Call& call)
     int const count = (material.entryPoints & kTransmission) ? 2 : 1;
     Vec3f sum{0, 0, 0};
     for (int i = 0; i < count; ++i)
-        for (LightSample const* l = context_.lightSamples(state.P, sides[i], !material.ior); l;
+        for (LightSample const* l = context_.lightSamples(state.P, sides[i], material.mixes); l;
              l = l->next) {
             state.sampleDirection = l->L;
             state.outBrdf = {0, 0, 0};
@@ -56,6 +56,17 @@ Vec3f PathIntegrator::directLight(ShadingContext::Call& call)
             sum += positive(state.outBrdf * maxOf(state.sampleCosine, 0.0f)) * l->color * l->shadow
                 * kPi;
         }
+    if (material.mixes)
+        sum += context_.fromSky(
+            kRayReflection,
+            [&](Vec3f d) {
+                state.sampleDirection = d;
+                state.outBrdf = {0, 0, 0};
+                state.sampleCosine = 0.0f;
+                material.shader->transfer(&context_, state);
+                return positive(state.outBrdf * maxOf(state.sampleCosine, 0.0f));
+            },
+            [&](Vec3f) { return maxComponent(state.outBrdf) * state.sampleCosine; });
     return context_.finite(sum);
 }
 
@@ -88,15 +99,18 @@ bool PathIntegrator::scatter(PathRay& ray, SurfacePoint const& surface, Path& pa
         // bends.
         if (state.sampleDirection == ray.direction && !material.ior) {
             next.passes += 1;
+            next.skyDensity = std::numeric_limits<float>::infinity();
             next.type = ray.type == kRayCamera ? std::uint32_t(kRayTransmission) : ray.type;
         } else {
             next.depth += 1;
             next.type = kRayReflection;
             next.scatteredAt = surface.P;
-            // What bounds a medium does not say by `transfer` what its `sample` draws.
-            next.lobeDensity = context_.scene().lights().hasSurfaces() && !material.ior
-                ? context_.lobeDensity(next.direction)
-                : std::numeric_limits<float>::infinity();
+            // Lights have been asked for where `transfer` tells what `sample` draws.
+            bool const shares = material.mixes
+                && (context_.scene().lights().hasSurfaces()
+                    || !context_.scene().sky(kRayReflection).isEmpty());
+            next.lobeDensity = next.skyDensity = shares ? context_.lobeDensity(next.direction)
+                                                        : std::numeric_limits<float>::infinity();
             path.straight = false;
         }
         ShadingContext::changeMedia(next, ray.direction, surface,

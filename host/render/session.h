@@ -38,7 +38,8 @@ struct RenderReport {
 
 /// Keeps a scene prepared for rendering. The scene stays its owner's, outlives the session, and may
 /// be edited between two calls of `render`:
-/// - a parameter's value, the camera, film, settings and environment: nothing to tell
+/// - a parameter's value, the camera, film and settings: nothing to tell
+/// - the environment: `environmentChanged`
 /// - lights: `lightsChanged`
 /// - another shader in a material's place: `materialChanged`
 /// - instances moved, added, removed, or given another mesh or material: `instancesChanged`
@@ -54,6 +55,7 @@ public:
 
     Scene const& scene() const { return prepared_.scene(); }
     void materialChanged(std::size_t index) { prepared_.materialChanged(index); }
+    void environmentChanged() { prepared_.environmentChanged(); }
     void lightsChanged() { prepared_.lightsChanged(); }
     void instancesChanged(BuildProgress const& progress = {})
     {

@@ -38,6 +38,21 @@ inline Vec3f lobeDirection(Vec3f axis, float alpha, float turn, Vec2f u)
     return around(axis, std::cos(turn * tilt), u.y);
 }
 
+/// Density of `lobeDirection` at `cosine` from its axis, 1/sr.
+inline float lobeDensity(float cosine, float alpha, float turn)
+{
+    float const angle = std::acos(minOf(cosine, 1.0f));
+    float const tilt = angle / turn;
+    if (!(tilt < 1.5707f))
+        return 0.0f;
+    float const t = std::tan(tilt), a2 = alpha * alpha, t2 = t * t;
+    // u = t^2 / (a^2 + t^2): du by the angle, over the circle 2 pi sin(angle); at the axis its
+    // limit.
+    float const du = 2.0f * a2 * (1.0f + t2) / ((a2 + t2) * (a2 + t2) * turn);
+    float const ratio = angle > 1e-4f ? t / std::sin(angle) : 1.0f / turn;
+    return du * ratio / 6.28318531f;
+}
+
 /// `d` mirrored to the side of the plane that `n` points to, where it is not there.
 inline Vec3f towardsSide(Vec3f d, Vec3f n)
 {

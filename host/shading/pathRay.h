@@ -10,9 +10,10 @@
 namespace zsi::host {
 
 struct PathRay {
-    Vec3f E; ///< where it began, as the record tells
-    Vec3f origin; ///< from where it is traced: `E` off its surface, or behind an ignored hit
-    Vec3f direction; ///< unit
+    Vec3f E{0, 0, 0}; ///< where it began, as the record tells
+    Vec3f origin{0, 0,
+                 0}; ///< from where it is traced: `E` off its surface, or behind an ignored hit
+    Vec3f direction{0, 0, 1}; ///< unit
     std::uint32_t type = kRayCamera;
     std::uint32_t depth = 0; ///< bends and bounces before it; going on straight does not count
     int passes = 0; ///< how often it went on straight through a surface
@@ -24,6 +25,9 @@ struct PathRay {
     /// of a surface light's emission the ray stands for, and what the light list does, adds up to
     /// one (balance heuristic; Veach 1997, 9.2.2). Infinite: the ray stands for all of it.
     float lobeDensity = std::numeric_limits<float>::infinity();
+    /// Likewise for the sky, which rays that meet nothing at all share with directions drawn from
+    /// the sky itself.
+    float skyDensity = std::numeric_limits<float>::infinity();
 };
 
 /// Who answers what light comes along a ray that a shading service sends out: the integrator.

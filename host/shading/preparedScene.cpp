@@ -1,5 +1,7 @@
 #include "shading/preparedScene.h"
 
+#include "shading/shadingContext.h"
+
 #include <cstring>
 #include <string_view>
 
@@ -47,6 +49,24 @@ PreparedMaterial prepare(Shader const& shader)
 
 } // namespace
 
+namespace {
+
+/// Asks shaders of a scene while nothing is rendered.
+class Inquiry final : public RadianceSource {
+public:
+    explicit Inquiry(PreparedScene const& scene)
+        : context(scene, *this)
+    {
+        context.start(sampler, 0, 0);
+    }
+    Vec4f radiance(PathRay) override { return {0, 0, 0, 0}; }
+
+    Sampler sampler{0, 0, 0};
+    ShadingContext context;
+};
+
+} // namespace
+
 PreparedScene::PreparedScene(Scene const& scene, BuildProgress const& progress)
     : scene_(scene)
     , rays_(scene, progress)
@@ -54,6 +74,32 @@ PreparedScene::PreparedScene(Scene const& scene, BuildProgress const& progress)
 {
     for (Shader const& shader : scene_.materials)
         materials_.push_back(prepare(shader));
+    findMixtures();
+    environmentChanged();
+}
+
+void PreparedScene::findMixtures()
+{
+    constexpr std::uint32_t kDraws = 64;
+    Inquiry inquiry(*this);
+    for (PreparedMaterial& material : materials_)
+        for (std::uint32_t i = 0; i < kDraws && material.scatters() && !material.mixes; ++i) {
+            inquiry.sampler.start(i);
+            material.mixes = inquiry.context.drawsMixture(material);
+        }
+}
+
+void PreparedScene::environmentChanged()
+{
+    reflectedSky_ = diffuseSky_ = {};
+    if (!environment())
+        return;
+    Inquiry inquiry(*this);
+    auto const map = [&](std::uint32_t type) {
+        return DirectionMap([&](Vec3f d) { return maxComponent(inquiry.context.sky(type, d)); });
+    };
+    reflectedSky_ = map(kRayReflection);
+    diffuseSky_ = map(kRayDiffuse);
 }
 
 void PreparedScene::materialChanged(std::size_t index)
@@ -62,6 +108,7 @@ void PreparedScene::materialChanged(std::size_t index)
     materials_[index] = prepare(scene_.materials[index]);
     if (((materials_[index].entryPoints & kTransmission) != 0) != wasClear)
         rays_.rebuildInstances({});
+    findMixtures();
 }
 
 void PreparedScene::instancesChanged(BuildProgress const& progress)

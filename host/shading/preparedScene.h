@@ -1,6 +1,7 @@
 /// A scene made ready for rendering: acceleration structure and what each material needs.
 #pragma once
 
+#include "light/directionMap.h"
 #include "light/lights.h"
 #include "trace/rayScene.h"
 
@@ -19,6 +20,9 @@ struct PreparedMaterial {
     /// that bounds none.
     float const* ior;
     std::vector<Slot> attributes;
+    /// Whether its samples are drawn from the lobes that `transfer` tells, so that both may share
+    /// lights between them: some of its draws say so (kSampleMixture).
+    bool mixes = false;
 
     /// Whether paths can go on by `sample` with light taken by `transfer`.
     bool scatters() const { return (entryPoints & kSample) && (entryPoints & kTransfer); }
@@ -39,6 +43,9 @@ public:
     void instancesChanged(BuildProgress const& progress = {});
     /// Lights are others, or surface lights stand elsewhere.
     void lightsChanged() { lights_ = LightSet(scene_); }
+    /// The environment or its parameters are others. Not told, pictures stay right but take longer
+    /// to become smooth.
+    void environmentChanged();
     /// Meshes are others. Renews all that stands on them.
     void meshesChanged(BuildProgress const& progress = {});
 
@@ -49,6 +56,11 @@ public:
     {
         return scene_.environment ? scene_.environment->environment() : nullptr;
     }
+    /// Where the environment is brightest, as rays of the type see it.
+    DirectionMap const& sky(std::uint32_t rayType) const
+    {
+        return rayType == kRayDiffuse ? diffuseSky_ : reflectedSky_;
+    }
     PreparedMaterial const& materialOf(SurfacePoint const& s) const
     {
         return materials_[static_cast<std::size_t>(scene_.instances[s.instance].material)];
@@ -58,10 +70,13 @@ public:
                         ShadeState& state) const;
 
 private:
+    void findMixtures();
+
     Scene const& scene_;
     RayScene rays_;
     LightSet lights_;
     std::vector<PreparedMaterial> materials_;
+    DirectionMap reflectedSky_, diffuseSky_;
 };
 
 } // namespace zsi::host

@@ -183,6 +183,7 @@ bool ShadingContext::child(Vec3f const* origin, Vec3f const* direction, float im
         ray.importance = full;
     }
     ray.scatteredAt = *origin;
+    ray.skyDensity = std::numeric_limits<float>::infinity();
     bool const listed = scene_.lights().hasSurfaces() && call_->askedLights_;
     ray.lobeDensity = listed && call_->material.scatters() ? lobeDensity(ray.direction)
                                                            : std::numeric_limits<float>::infinity();
@@ -202,6 +203,7 @@ bool ShadingContext::continuation(Vec3f const* origin, Vec3f const* direction, f
         return false;
     ray.E = *origin;
     ray.ignored = 0;
+    ray.skyDensity = std::numeric_limits<float>::infinity(); // what lies behind is its alone
     ray.origin = rayStart(*origin, ray.direction);
     ray.passes += 1;
     ray.importance *= importance < 1.0f ? maxOf(importance, 0.0f) : 1.0f;
@@ -252,20 +254,39 @@ Vec3f ShadingContext::traceLobe(Vec3f const* origin, Vec3f const* direction, flo
     Vec3f axis = *direction;
     if (!call_ || !unit(axis))
         return {0, 0, 0};
-    if (spread > 0.0f) {
-        Vec3f const Ng = call_->surface.Ng;
-        Vec3f const side = dot(axis, Ng) < 0.0f ? -Ng : Ng;
-        axis =
-            towardsSide(lobeDirection(axis, minOf(spread, 1.0f), turn, sampler_->next2D()), side);
-    }
+    Vec3f const Ng = call_->surface.Ng;
+    Vec3f const side = dot(axis, Ng) < 0.0f ? -Ng : Ng;
+    float const width = minOf(spread, 1.0f);
+    Vec3f const way = spread > 0.0f
+        ? towardsSide(lobeDirection(axis, width, turn, sampler_->next2D()), side)
+        : axis;
     PathRay ray;
     float scale;
-    if (!child(origin, &axis, importance, ray, scale))
+    if (!child(origin, &way, importance, ray, scale))
         return {0, 0, 0};
     ray.type = kRayReflection;
-    if (spread > 0.0f)
-        leaveToLightList(ray);
-    return rgb(source_.radiance(ray)) * scale;
+    if (!(spread > 0.0f))
+        return rgb(source_.radiance(ray)) * scale;
+    leaveToLightList(ray);
+    if (!(*origin == call_->surface.P))
+        return rgb(source_.radiance(ray)) * scale;
+    auto const density = [&](Vec3f d) {
+        return dot(d, side) < 0.0f ? 0.0f
+                                   : host::lobeDensity(dot(axis, d), width, turn)
+                + host::lobeDensity(dot(axis, d - side * (2.0f * dot(d, side))), width, turn);
+    };
+    return gather(ray, density) * scale;
+}
+
+template <class Density>
+Vec3f ShadingContext::gather(PathRay ray, Density const& density)
+{
+    if (scene_.sky(ray.type).isEmpty())
+        return rgb(source_.radiance(ray));
+    ray.skyDensity = density(ray.direction);
+    Vec3f const sky = fromSky(
+        ray.type, [&](Vec3f d) { return Vec3f(1, 1, 1) * density(d); }, density);
+    return rgb(source_.radiance(ray)) + sky;
 }
 
 void ShadingContext::leaveToLightList(PathRay& ray) const
@@ -326,6 +347,12 @@ Vec3f ShadingContext::indirectDiffuse(Vec3f const* P, Vec3f const* N, float impo
     int const count = call_->ray.depth == 0 ? std::max(1, settings_.indirectSamples) : 1;
     Vec3f const side = gatherNormal(*P, axis);
     Sampler::Points const points = sampler_->next2D(count);
+    auto const density = [&](Vec3f d) {
+        return dot(d, side) < 0.0f
+            ? 0.0f
+            : (maxOf(dot(axis, d), 0.0f) + maxOf(dot(axis, d - side * (2.0f * dot(d, side))), 0.0f))
+                / 3.14159265f;
+    };
     Vec3f sum{0, 0, 0};
     for (int i = 0; i < count; ++i) {
         Vec3f const direction = towardsSide(cosineDirection(axis, points[i]), side);
@@ -336,7 +363,10 @@ Vec3f ShadingContext::indirectDiffuse(Vec3f const* P, Vec3f const* N, float impo
         ray.type = kRayDiffuse;
         leaveToLightList(ray);
         ray.origin = shadowStart(*P, direction);
-        sum += rgb(source_.radiance(ray)) * scale;
+        if (*P == call_->surface.P)
+            sum += gather(ray, density) * scale;
+        else
+            sum += rgb(source_.radiance(ray)) * scale;
     }
     sum = sum / static_cast<float>(count);
     Call::Gathered& gathered = call_->gathered_;

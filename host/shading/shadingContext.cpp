@@ -1,5 +1,8 @@
 #include "shading/shadingContext.h"
 
+#include <algorithm>
+#include <cstring>
+
 namespace zsi::host {
 namespace {
 
@@ -102,7 +105,43 @@ Vec4f ShadingContext::environment(PathRay const& ray)
         ++nonFiniteOf_.back();
         return withAlpha({0, 0, 0}, state.Ci.w);
     }
-    return state.Ci;
+    if (std::isinf(ray.skyDensity))
+        return state.Ci;
+    float const shared = scene_.sky(ray.type).density(ray.direction);
+    if (!(shared > 0.0f))
+        return state.Ci;
+    return withAlpha(rgb(state.Ci) * (ray.skyDensity / (ray.skyDensity + shared)), state.Ci.w);
+}
+
+Vec3f ShadingContext::sky(std::uint32_t rayType, Vec3f d)
+{
+    PathRay ray;
+    if (call_)
+        ray = call_->ray;
+    ray.type = rayType;
+    ray.depth += 1;
+    ray.direction = d;
+    ray.skyDensity = std::numeric_limits<float>::infinity();
+    return rgb(environment(ray));
+}
+
+bool ShadingContext::drawsMixture(PreparedMaterial const& material)
+{
+    PathRay ray;
+    ray.direction = {0, 0, -1};
+    ShadeState state = record(ray);
+    Vec2f const place = sampler_->next2D();
+    state.P = state.Pref = {place.x, place.y, 0};
+    state.E = state.P - ray.direction;
+    state.N = state.Ng = state.Nref = {0, 0, 1};
+    for (PreparedMaterial::Slot const& slot : material.attributes)
+        if (slot.source == PreparedMaterial::Source::Uv
+            || slot.source == PreparedMaterial::Source::Uv1)
+            std::memcpy(state.attributes + slot.offset, &place, sizeof place);
+    std::fill_n(state.allowReflection, 3, std::uint8_t(1));
+    std::fill_n(state.allowTransmission, 3, std::uint8_t(1));
+    material.shader->sample(this, state);
+    return state.sampleType == kSampleMixture;
 }
 
 bool ShadingContext::shade(PathRay const& ray, SurfacePoint const& surface, Vec4f& result)

@@ -81,12 +81,24 @@ public:
     /// Per steradian, how likely the running call's material sends light on towards unit `L`:
     /// `transfer`, infinite where that gives nothing, since the light list then does neither.
     float lobeDensity(Vec3f L);
+    /// What a ray of the type sees in unit direction `d` where nothing stands in its way.
+    Vec3f sky(std::uint32_t rayType, Vec3f d);
+    /// Light of the sky for a lobe at the running call's surface: one direction drawn from the sky,
+    /// for rays of type `rayType` that carry the lobe's density as `skyDensity`. `value(d)` is what
+    /// the lobe sends on of radiance from unit `d`, times its density there, 1/sr; `density(d)`
+    /// that density.
+    template <class Value, class Density>
+    Vec3f fromSky(std::uint32_t rayType, Value const& value, Density const& density);
+    /// One draw of the material at a place of its own choice: is it one of kSampleMixture?
+    bool drawsMixture(PreparedMaterial const& material);
     /// As the service, for one's own choice of lights.
     LightSample* lightSamples(Vec3f P, Vec3f normal, bool surfaceLights);
 
     /// Where a ray starts that leaves `origin`: moved off the running call's surface where it lies
     /// on it, any other place as it is.
     Vec3f rayStart(Vec3f origin, Vec3f direction) const;
+    /// As `rayStart`, from the curved surface that the normals of a mesh describe.
+    Vec3f shadowStart(Vec3f origin, Vec3f direction) const;
     /// The media of `next`, which leaves `s`, when a ray along `arrived` met it. `ior`: of what
     /// lies behind the surface, null where it bounds no medium.
     static void changeMedia(PathRay& next, Vec3f arrived, SurfacePoint const& s, float const* ior);
@@ -130,10 +142,13 @@ private:
     bool continuation(Vec3f const* origin, Vec3f const* direction, float importance, PathRay& ray);
     Vec3f traceLobe(Vec3f const* origin, Vec3f const* direction, float spread, float turn,
                     float importance);
+    /// Light along a ray drawn from a lobe at the running call's surface, together with what a
+    /// direction drawn from the sky brings; `density(d)` is the lobe's.
+    template <class Density>
+    Vec3f gather(PathRay ray, Density const& density);
     /// Where the running call has counted surface lights in its list and cannot tell how much of
     /// them its lobe stands for, the ray does not see them.
     void leaveToLightList(PathRay& ray) const;
-    Vec3f shadowStart(Vec3f origin, Vec3f direction) const;
     Vec3f gatherNormal(Vec3f P, Vec3f N) const;
     Vec3f transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMax);
 
@@ -151,6 +166,25 @@ private:
     std::uint64_t nonFinite_ = 0;
     std::vector<std::uint64_t> nonFiniteOf_;
 };
+
+template <class Value, class Density>
+Vec3f ShadingContext::fromSky(std::uint32_t rayType, Value const& value, Density const& density)
+{
+    DirectionMap const& map = scene_.sky(rayType);
+    if (map.isEmpty())
+        return {0, 0, 0};
+    Vec3f const d = map.sample(sampler_->next2D());
+    Vec3f const sent = value(d);
+    if (!(maxComponent(sent) > 0.0f))
+        return {0, 0, 0};
+    Vec3f const light = sky(rayType, d);
+    if (!(maxComponent(light) > 0.0f))
+        return {0, 0, 0};
+    ++rays_;
+    if (scene_.rays().occluded({shadowStart(call_->surface.P, d), d}, Visibility::All))
+        return {0, 0, 0};
+    return finite(sent * light / (map.density(d) + density(d)));
+}
 
 inline bool isFinite(Vec3f v)
 {

@@ -7,6 +7,7 @@
 #include "support/temporaryFolder.h"
 #include "texture/textureStore.h"
 
+#include <OpenImageIO/imageio.h>
 #include <csignal>
 #include <gtest/gtest.h>
 #include <random>
@@ -45,6 +46,26 @@ TEST(PictureFile, EveryFormatShowsTheScene)
             EXPECT_NEAR(seen.z, place.want.z, place.tolerance) << name;
         }
     }
+}
+
+TEST(PictureFile, ACropKeepsItsPlaceAndLayersTheirNames)
+{
+    test::TemporaryFolder const folder;
+    Picture picture{40, 30, {8, 5, 10, 6}, {{"beauty", {"R", "G", "B", "A"}, {}}}};
+    picture.layers[0].values = {1, 2, 3, 1, 4, 5, 6, 1};
+    picture.layers.push_back({"depth", {"Z"}, {7, 9}});
+    writePicture(folder.path / "a.exr", picture, {});
+    auto const file = OIIO::ImageInput::open((folder.path / "a.exr").string());
+    ASSERT_TRUE(file);
+    OIIO::ImageSpec const& s = file->spec();
+    EXPECT_TRUE(s.x == 8 && s.y == 5 && s.width == 2 && s.height == 1);
+    EXPECT_TRUE(s.full_x == 0 && s.full_y == 0 && s.full_width == 40 && s.full_height == 30);
+    std::vector<float> values(10);
+    int const depth = s.channelindex("depth.Z"), green = s.channelindex("G");
+    ASSERT_TRUE(file->read_image(0, 0, 0, -1, OIIO::TypeDesc::FLOAT, values.data()) && depth >= 0
+                && green >= 0);
+    EXPECT_EQ(values[static_cast<std::size_t>(5 + depth)], 9);
+    EXPECT_EQ(values[static_cast<std::size_t>(5 + green)], 5);
 }
 
 TEST(PictureFile, WhatCannotBeWrittenLeavesNothing)

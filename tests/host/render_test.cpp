@@ -312,6 +312,51 @@ TEST(Render, IndirectLightIsOccludedOnce)
     }
 }
 
+// Within a ball of albedo a, around a point light that brings c, every point shows a c / (1 - a).
+TEST(Render, LightBouncesUntilItIsUsedUp)
+{
+    host::Mesh inside = host::sphereMesh(2, 64);
+    for (Vec3f& n : inside.normals)
+        n = -n;
+    for (auto& t : inside.triangles)
+        std::swap(t[1], t[2]);
+    for (float const albedo : {0.5f, 0.8f})
+        for (char const* integrator : kIntegrators) {
+            Stage stage;
+            stage.scene.settings.integrator = integrator;
+            stage.scene.settings.samples = 64;
+            stage.add(inside, stage.matte(), {0, 0, 0});
+            stage.scene.materials[0].set("u_diffuseColor", grey(albedo));
+            stage.scene.lights.push_back(host::PointLight{{0, 0, 0}, grey(4)});
+            stage.watch({0, 0, -2}, {0, 0, 1});
+            EXPECT_NEAR(mean(stage.render()).x * (1 - albedo) / albedo, 1, 0.03f)
+                << integrator << albedo;
+        }
+}
+
+// A sky of one lamp of 1e5, 1.4 degrees across: drawn by chance one ray in 13,000 would meet it. A
+// surface under it shows its irradiance, by the light's own direction and by the surface's.
+TEST(Render, SmallLampsInTheSkyAreFound)
+{
+    Vec3f const lamp = normalize(Vec3f(0.48f, 0.6f, 0.64f));
+    float const edge = std::cos(0.012217f);
+    Sky const sky([&](Vec3f d) { return dot(d, lamp) > edge ? grey(1e5f) : grey(0.1f); });
+    float const want = 0.1f + 1e5f * 2 * (1 - edge) * 0.64f; // solid angle times cosine over pi
+    for (char const* integrator : kIntegrators) {
+        Stage stage;
+        stage.scene.settings.integrator = integrator;
+        stage.scene.settings.samples = 64;
+        stage.scene.settings.maxDepth = 1;
+        stage.sky(sky);
+        stage.card(stage.matte());
+        stage.watch({0, 0, 0}, {0, 0, 1});
+        EXPECT_NEAR(mean(stage.render()).x / want, 1, 0.05f) << integrator;
+        stage.card(0, 1, 4); // a lid
+        stage.watch({0, 0, 0}, {0, 0, 0.5f});
+        EXPECT_NEAR(mean(stage.render()).x, 0, 0.02f) << "shadow, " << integrator;
+    }
+}
+
 TEST(Render, SurfaceLightsAreSeenAndLightTheirSurroundings)
 {
     struct Row {
@@ -347,6 +392,10 @@ TEST(Render, SurfaceLightsAreSeenAndLightTheirSurroundings)
             stage.watch(r.at + Vec3f(0, 0, 1), {0, 0, 1});
             if (r.mesh.positions.size() < 200)
                 expectNear(stage.middle(), {0, 0, 0, 1}, 0, "black from behind");
+            stage.slab(0, r.at.z + 2.5f, 0.5f, 1);
+            stage.watch(r.at + Vec3f(0, 0, 2), {0, 0, -0.5f});
+            EXPECT_EQ(mean(stage.render()).x > 0, r.mesh.positions.size() > 200)
+                << "lights what lies behind: " << r.why;
         }
 }
 

@@ -1,0 +1,107 @@
+#include "light/directionMap.h"
+
+#include <algorithm>
+#include <cmath>
+
+namespace zsi::host {
+namespace {
+
+constexpr int kWidth = 512, kHeight = 256;
+/// Directions asked for along each side of a cell.
+constexpr int kFine = 2;
+/// Below this share of all light above the mean, drawing costs more than it saves.
+constexpr double kWorthwhile = 0.05;
+constexpr float kPi = 3.14159265f;
+
+/// Cells of equal height in the cosine have one solid angle.
+constexpr float kCell = 4 * kPi / (kWidth * kHeight);
+
+Vec3f direction(float column, float row)
+{
+    float const z = 1.0f - 2.0f * row / kHeight;
+    float const r = std::sqrt(maxOf(0.0f, 1.0f - z * z)), phi = 2 * kPi * column / kWidth;
+    return {r * std::cos(phi), r * std::sin(phi), z};
+}
+
+int clampedIndex(float x, int n) { return std::clamp(static_cast<int>(x), 0, n - 1); }
+
+/// The first entry above `u` of `n` ascending shares that end with 1; `rest` is the place within.
+int pick(float const* shares, int n, float u, float& rest)
+{
+    auto const i = static_cast<int>(std::upper_bound(shares, shares + n - 1, u) - shares);
+    float const before = i > 0 ? shares[i - 1] : 0.0f;
+    float const share = shares[i] - before;
+    rest = share > 0.0f ? clamp((u - before) / share, 0.0f, 1.0f) : 0.5f;
+    return i;
+}
+
+} // namespace
+
+DirectionMap::DirectionMap(std::function<float(Vec3f)> const& radiance)
+{
+    std::vector<double> cells(std::size_t(kWidth) * kHeight);
+    double sum = 0;
+    for (int y = 0; y < kHeight; ++y)
+        for (int x = 0; x < kWidth; ++x) {
+            double& cell =
+                cells[static_cast<std::size_t>(y) * kWidth + static_cast<std::size_t>(x)];
+            for (int i = 0; i < kFine * kFine; ++i) {
+                float const value =
+                    radiance(direction(static_cast<float>(x) + (float(i % kFine) + 0.5f) / kFine,
+                                       static_cast<float>(y) + (float(i / kFine) + 0.5f) / kFine));
+                cell += value > 0.0f && std::isfinite(value) ? static_cast<double>(value) : 0.0;
+            }
+            sum += cell;
+        }
+    double const mean = sum / static_cast<double>(cells.size());
+    double above = 0;
+    for (double& cell : cells) {
+        cell = std::max(0.0, cell - mean);
+        above += cell;
+    }
+    if (!(above > kWorthwhile * sum))
+        return;
+    double before = 0;
+    for (int y = 0; y < kHeight; ++y) {
+        double const* const row = &cells[static_cast<std::size_t>(y) * kWidth];
+        double inRow = 0;
+        for (int x = 0; x < kWidth; ++x)
+            inRow += row[x];
+        double part = 0;
+        for (int x = 0; x < kWidth; ++x) {
+            part += row[x];
+            columns_.push_back(static_cast<float>(inRow > 0 ? part / inRow : (x + 1.0) / kWidth));
+        }
+        before += inRow;
+        rows_.push_back(static_cast<float>(before / above));
+    }
+}
+
+Vec3f DirectionMap::sample(Vec2f u) const
+{
+    float inRow, inColumn;
+    int const row = pick(rows_.data(), kHeight, u.y, inRow);
+    int const column =
+        pick(&columns_[static_cast<std::size_t>(row) * kWidth], kWidth, u.x, inColumn);
+    return direction(static_cast<float>(column) + inColumn, static_cast<float>(row) + inRow);
+}
+
+float DirectionMap::density(Vec3f d) const
+{
+    if (isEmpty())
+        return 0.0f;
+    float const turn = std::atan2(d.y, d.x) / (2 * kPi);
+    return cellDensity(clampedIndex((1.0f - d.z) * 0.5f * kHeight, kHeight),
+                       clampedIndex((turn < 0.0f ? turn + 1.0f : turn) * kWidth, kWidth));
+}
+
+float DirectionMap::cellDensity(int row, int column) const
+{
+    auto const r = static_cast<std::size_t>(row), c = static_cast<std::size_t>(column);
+    float const* const columns = &columns_[r * kWidth];
+    float const inRows = rows_[r] - (r > 0 ? rows_[r - 1] : 0.0f);
+    float const inColumns = columns[c] - (c > 0 ? columns[c - 1] : 0.0f);
+    return inRows * inColumns / kCell;
+}
+
+} // namespace zsi::host

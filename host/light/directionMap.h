@@ -1,0 +1,32 @@
+/// Directions drawn in proportion to a radiance.
+#pragma once
+
+#include <functional>
+#include <vector>
+#include <zsi/vecmath.h>
+
+namespace zsi::host {
+
+/// A density over the sphere that follows what a radiance has above its mean, made to be combined
+/// with another way of drawing directions that covers the rest: what multiple importance sampling
+/// gives to that one needs no draws of this (Karlik et al. 2019, "MIS Compensation").
+class DirectionMap {
+public:
+    /// Nothing stands out: `density` is 0 everywhere and `sample` must not be called.
+    DirectionMap() = default;
+    /// Asks `radiance` for several unit directions of each cell of a map of 512 x 256.
+    explicit DirectionMap(std::function<float(Vec3f)> const& radiance);
+
+    bool isEmpty() const { return rows_.empty(); }
+    /// A unit direction for `u` in [0, 1)^2; neighbours stay neighbours.
+    Vec3f sample(Vec2f u) const;
+    float density(Vec3f d) const; ///< of `sample` at unit `d`, 1/sr
+
+private:
+    float cellDensity(int row, int column) const;
+
+    std::vector<float> rows_; ///< shares up to and with each row
+    std::vector<float> columns_; ///< shares up to and with each cell within its row
+};
+
+} // namespace zsi::host
