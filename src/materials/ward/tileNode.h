@@ -6,43 +6,45 @@
 
 namespace zsi {
 
-/// The numbers of a brickwork, names behind `prefix`.
-#define TILE_SHAPE_ROWS(U, prefix)                                                              \
-    U(float, prefix##verticalCount, "rows of bricks in the square")                             \
-    U(float, prefix##horizontalCount, "bricks of a row in the square")                          \
-    U(float, prefix##colorVariance, "spread of the brightness of bricks, 0 none .. 1")          \
-    U(float, prefix##fadeVariance, "second, independent spread of the brightness, 0 none .. 1") \
-    U(float, prefix##horizontalGap, "mortar on each side of a brick, in cells; 0.5 hides it")   \
-    U(float, prefix##verticalGap, "mortar above and below a brick, in cells; 0.5 hides it")     \
-    U(float, prefix##edgeRoughness, "waviness of edges, in thousandths of the square")          \
-    U(int, prefix##randomSeed, "chooses another wall")                                          \
-    U(float, prefix##lineShift, "shift of every second row, in bricks, beyond the half brick")  \
-    U(float, prefix##randomShift, "spread of the random shift of rows, in bricks")              \
-    U(float, prefix##changeRow, "width of the bricks of edited rows, times; above 0")           \
-    U(int, prefix##perRow, "every how many rows one is edited")                                 \
-    U(bool, prefix##useColumnEdit, "edit columns")                                              \
-    U(bool, prefix##useRowEdit, "edit rows")                                                    \
-    U(float, prefix##changeColumn, "height of the bricks of edited columns, times; above 0")    \
-    U(int, prefix##perColumn, "every how many columns one is edited")                           \
-    U(int, prefix##holes, "n of n + 1 bricks are missing; 100 all, 0 none")                     \
-    U(float, prefix##brickHeight, "height of a brick in cells; 0 and below count as 1")         \
-    U(float, prefix##brickWidth, "width of a brick in cells; 0 and below count as 1")           \
-    U(bool, prefix##repeatX, "go on beyond 0..1 in x; transparent there otherwise")             \
-    U(bool, prefix##repeatY, "go on beyond 0..1 in y; transparent there otherwise")
+/// The numbers of a brickwork: X(U, path, type, name, meaning).
+#define TILE_SHAPE(X, U, path)                                                                   \
+    X(U, path, float, verticalCount, "rows of bricks in the square")                             \
+    X(U, path, float, horizontalCount, "bricks of a row in the square")                          \
+    X(U, path, float, colorVariance, "spread of the brightness of bricks, 0 none .. 1")          \
+    X(U, path, float, fadeVariance, "second, independent spread of the brightness, 0 none .. 1") \
+    X(U, path, float, horizontalGap, "mortar on each side of a brick, in cells; 0.5 hides it")   \
+    X(U, path, float, verticalGap, "mortar above and below a brick, in cells; 0.5 hides it")     \
+    X(U, path, float, edgeRoughness, "waviness of edges, in thousandths of the square")          \
+    X(U, path, int, randomSeed, "chooses another wall")                                          \
+    X(U, path, float, lineShift, "shift of every second row, in bricks, beyond the half brick")  \
+    X(U, path, float, randomShift, "spread of the random shift of rows, in bricks")              \
+    X(U, path, float, changeRow, "width of the bricks of edited rows, times; above 0")           \
+    X(U, path, int, perRow, "every how many rows one is edited")                                 \
+    X(U, path, bool, useColumnEdit, "edit columns")                                              \
+    X(U, path, bool, useRowEdit, "edit rows")                                                    \
+    X(U, path, float, changeColumn, "height of the bricks of edited columns, times; above 0")    \
+    X(U, path, int, perColumn, "every how many columns one is edited")                           \
+    X(U, path, int, holes, "n of n + 1 bricks are missing; 100 all, 0 none")                     \
+    X(U, path, float, brickHeight, "height of a brick in cells; 0 and below count as 1")         \
+    X(U, path, float, brickWidth, "width of a brick in cells; 0 and below count as 1")           \
+    X(U, path, bool, repeatX, "go on beyond 0..1 in x; transparent there otherwise")             \
+    X(U, path, bool, repeatY, "go on beyond 0..1 in y; transparent there otherwise")
 
+#define TILE_ROW(U, path, T, name, meaning) U(T, path##_Tile_##name, meaning)
 #define TILE_ROWS(U, path)                                                               \
     U(Mat4f, path##_Tile_xform, "(u, v, 1, 1) to the square that the bricks fill, 0..1") \
-    TILE_SHAPE_ROWS(U, path##_Tile_)
+    TILE_SHAPE(TILE_ROW, U, path)
 
-#define TILE_FIELD_VALUE(T, name, meaning) name,
-#define TILE_VALUE(site, path, brickColor, mortarColor)                                        \
-    tileNode(site, {brickColor, mortarColor}, path##_Tile_xform,                               \
-             {TILE_SHAPE_ROWS(TILE_FIELD_VALUE, path##_Tile_)}, attribute_tangent(site.state), \
-             attribute_bitangent(site.state))
-
+#define TILE_FIELD(U, path, T, name, meaning) T name{};
 struct TileShape {
-    TILE_SHAPE_ROWS(ZSI_ROW_UNSET, )
+    TILE_SHAPE(TILE_FIELD, ZSI_ROW_NONE, none)
 };
+
+#define TILE_FIELD_VALUE(U, path, T, name, meaning) path##_Tile_##name,
+#define TILE_VALUE(site, path, brickColor, mortarColor)                                         \
+    tileNode(site, {brickColor, mortarColor}, path##_Tile_xform,                                \
+             {TILE_SHAPE(TILE_FIELD_VALUE, ZSI_ROW_NONE, path)}, attribute_tangent(site.state), \
+             attribute_bitangent(site.state))
 
 /// Bricks in mortar, each channel in 0..1; (0, 0, 0, 0) outside the square.
 /// footprint: width and height of the area of uv that the result stands for, over which the mortar
