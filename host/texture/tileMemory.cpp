@@ -98,8 +98,8 @@ void TileBlock::firstTouch(Window& window) const
 {
     if (window.exchange(true, std::memory_order_relaxed))
         return;
-    std::size_t const touched = ++memory_.touched_;
-    if (touched << kWindowBits > memory_.limit_ - std::min(memory_.limit_, memory_.held_))
+    ++memory_.touched_;
+    if (memory_.isFull())
         memory_.dropPages();
 }
 
@@ -111,11 +111,18 @@ void TileBlock::dropPages()
     madvise(data_, size_, MADV_DONTNEED);
 }
 
+bool TileMemory::isFull() const
+{
+    return touched_ << TileBlock::kWindowBits > limit_ - std::min(limit_, held_);
+}
+
 void TileMemory::dropPages()
 {
-    std::unique_lock const lock(mutex_, std::try_to_lock);
-    if (!lock)
-        return; // another thread is at it
+    // Who comes meanwhile waits: else all of a picture might be touched while this goes on, and
+    // nothing be touched first afterwards.
+    std::lock_guard const lock(mutex_);
+    if (!isFull())
+        return;
     touched_ = 0;
     for (TileBlock* const block : scratch_)
         block->dropPages();

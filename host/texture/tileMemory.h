@@ -57,8 +57,7 @@ private:
 
 /// Makes blocks and keeps what all of them hold in memory under a limit. Scratch files have no name
 /// and vanish with the program. The system's page cache stands behind them: to drop a page and take
-/// it up again costs about a microsecond while the machine has memory to spare, and no reader
-/// waits.
+/// it up again costs about a microsecond while the machine has memory to spare.
 class TileMemory {
 public:
     explicit TileMemory(std::size_t limit)
@@ -75,6 +74,7 @@ public:
 
 private:
     friend class TileBlock;
+    bool isFull() const;
     void dropPages();
 
     std::size_t limit_;

@@ -11,6 +11,7 @@
 #include <gtest/gtest.h>
 #include <random>
 #include <thread>
+#include <unistd.h>
 
 namespace zsi::host {
 namespace {
@@ -217,23 +218,32 @@ struct ScratchFolder {
     ~ScratchFolder() { unsetenv("TMPDIR"); }
 };
 
+/// Of files, in the memory of this process.
+std::size_t mappedBytes()
+{
+    std::size_t total, resident, shared;
+    std::ifstream("/proc/self/statm") >> total >> resident >> shared;
+    return shared * static_cast<std::size_t>(sysconf(_SC_PAGESIZE));
+}
+
 TEST(Texture, ALimitOfMemoryChangesNothingThatIsSeen)
 {
     test::TemporaryFolder const folder;
     fs::path const file = folder.path / "a.ppm", scratch = folder.path / "scratch";
     fs::create_directory(scratch);
-    Values(1500, 700, 8, anyCode).write(file);
-    TextureStore roomy;
+    Values(2000, 1400, 8, anyCode).write(file); // 13 MB of tiles
+    TextureStore roomy({.cacheBytes = 64 << 20});
     auto const* const want = roomy.load2D(file, ColorSpace::Auto);
     struct Case {
         fs::path scratch;
         std::size_t limit, warnings;
     };
-    for (Case const& c : {Case{scratch, 0, 0}, Case{scratch, 300000, 0},
-                          Case{folder.path / "missing", 300000, 1}}) {
+    for (Case const& c : {Case{scratch, 0, 0}, Case{scratch, 1000000, 0},
+                          Case{folder.path / "missing", 1000000, 1}}) {
         ScratchFolder const set(c.scratch);
         TextureStore store({.cacheBytes = c.limit});
         auto const* const texture = store.load2D(file, ColorSpace::Auto);
+        std::size_t const before = mappedBytes();
         EXPECT_EQ(store.warnings().size(), c.warnings);
         EXPECT_TRUE(fs::is_empty(scratch)) << "a program that is killed leaves nothing";
         std::atomic<int> wrong = 0;
@@ -251,6 +261,7 @@ TEST(Texture, ALimitOfMemoryChangesNothingThatIsSeen)
             });
         threads.clear();
         EXPECT_EQ(wrong, 0);
+        EXPECT_LT(mappedBytes(), before + 4000000) << "of 13 MB";
     }
 }
 
@@ -294,6 +305,23 @@ TEST(Texture, AFootprintAveragesLight)
             EXPECT_NEAR(lookup(slope, Vec2f(0.25f, 0.5f)).x, 0.25f, 0.011f) << texels;
         }
     }
+}
+
+TEST(Texture, AFootprintPicksTheLevelOfItsWidth)
+{
+    test::TemporaryFolder const folder;
+    // Stripes two texels wide: whole texels of level 1, grey in level 2.
+    Values(128, 64, 8, [](int i) { return i / 6 % 2 ? -1 : 0; }).write(folder.path / "a.ppm");
+    TextureStore store;
+    auto const* const texture = store.load2D(folder.path / "a.ppm", ColorSpace::Linear);
+    auto const contrast = [&](float texels) {
+        TextureFootprint const footprint(texels / 128);
+        return lookup(texture, Vec2f(3 / 128.0f, 0.5f)).x
+            - lookup(texture, Vec2f(1 / 128.0f, 0.5f)).x;
+    };
+    EXPECT_NEAR(contrast(2), 1, 1e-5);
+    EXPECT_NEAR(contrast(2.8284271f), 0.5, 1e-5) << "half way between levels";
+    EXPECT_NEAR(contrast(4), 0, 1e-5);
 }
 
 TEST(TextureCube, BlursKeepTheLightAndTheDirections)
