@@ -41,8 +41,8 @@ private:
 };
 
 /// Where to look for shader libraries: the option when not empty, else ZSI_SHADER_PATH (colon
-/// separated), else `shaders` beside the program, else the folder that the installation has for them
-/// (such as ../lib/zsi/shaders from the program).
+/// separated), else `shaders` beside the program, else the folder that the installation has for
+/// them (such as ../lib/zsi/shaders from the program).
 std::vector<std::filesystem::path> shaderDirectories(std::string const& option);
 
 } // namespace zsi::host
