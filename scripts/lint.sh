@@ -21,7 +21,7 @@ if [ "$check_spdx" = yes ]; then
     while read -r file; do
         head -3 "$file" | grep -q 'SPDX-License-Identifier: Apache-2.0' ||
             complain "$file: no line SPDX-License-Identifier: Apache-2.0 among the first three"
-    done < <(find "${dirs[@]}" scripts -name '*.h' -o -name '*.cpp' -o -name '*.py' -o -name '*.sh' \
+    done < <(find "${dirs[@]}" scripts cmake -name '*.h' -o -name '*.cpp' -o -name '*.py' -o -name '*.sh' \
         -o -name CMakeLists.txt -o -name '*.cmake')
 fi
 while read -r file; do

@@ -138,9 +138,8 @@ std::vector<fs::path> shaderDirectories(std::string const& option)
         fs::path const folder = fs::read_symlink("/proc/self/exe", failed).parent_path();
         fs::path const installed = (folder / ZSI_INSTALLED_SHADERS).lexically_normal();
         fs::path const beside = folder / "shaders";
-        directories.push_back(!fs::exists(beside, failed) && fs::exists(installed, failed)
-                                  ? installed
-                                  : beside);
+        directories.push_back(
+            !fs::exists(beside, failed) && fs::exists(installed, failed) ? installed : beside);
     }
     return directories;
 }
