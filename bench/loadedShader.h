@@ -8,11 +8,12 @@
 #include <memory>
 #include <string>
 #include <vector>
+#include <zsi/registration.h>
 #include <zsi/zsi.h>
 
 namespace bench {
 
-class LoadedShader final : zsi::IShaderManager {
+class LoadedShader final : zsi::GenericManager<LoadedShader> {
 public:
     LoadedShader(void* library, std::string const& className)
     {
@@ -70,39 +71,20 @@ public:
     }
 
 private:
-    using Base = zsi::IShaderBase*;
-    void declareEntryPoints(Base, int mask) override { mask_ = mask; }
-    void registerBool(Base, char const* n, bool* f) override { fields_[n] = f; }
-    void registerInt(Base, char const* n, int* f) override { fields_[n] = f; }
-    void registerFloat(Base, char const* n, float* f) override { fields_[n] = f; }
-    void registerVec2f(Base, char const* n, zsi::Vec2f* f) override { fields_[n] = f; }
-    void registerVec3f(Base, char const* n, zsi::Vec3f* f) override { fields_[n] = f; }
-    void registerVec4f(Base, char const* n, zsi::Vec4f* f) override { fields_[n] = f; }
-    void registerMat3f(Base, char const* n, zsi::Mat3f* f) override
+    friend zsi::GenericManager<LoadedShader>;
+    void declareEntryPoints(zsi::IShaderBase*, int mask) override { mask_ = mask; }
+    void registerAttribute(zsi::IShaderBase*, int, char const* name, long offset) override
     {
-        fields_[n] = f;
-        matrices3_.push_back(f);
+        attributes_[name] = offset;
     }
-    void registerMat4f(Base, char const* n, zsi::Mat4f* f) override
+    template <class T>
+    void parameter(zsi::IShaderBase*, char const* name, T* field)
     {
-        fields_[n] = f;
-        matrices4_.push_back(f);
-    }
-    void registerTexture1D(Base, char const* n, zsi::TextureSampler1D* f) override
-    {
-        fields_[n] = f;
-    }
-    void registerTexture2D(Base, char const* n, zsi::TextureSampler2D* f) override
-    {
-        fields_[n] = f;
-    }
-    void registerTextureCube(Base, char const* n, zsi::TextureSamplerCube* f) override
-    {
-        fields_[n] = f;
-    }
-    void registerAttribute(Base, int, char const* n, long offset) override
-    {
-        attributes_[n] = offset;
+        fields_[name] = field;
+        if constexpr (std::is_same_v<T, zsi::Mat3f>)
+            matrices3_.push_back(field);
+        if constexpr (std::is_same_v<T, zsi::Mat4f>)
+            matrices4_.push_back(field);
     }
 
     std::unique_ptr<zsi::IShaderBase> object_;

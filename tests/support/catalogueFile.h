@@ -94,7 +94,7 @@ private:
         static std::map<std::string, std::size_t> const kSizes{
             {"bool", 1},       {"int", 4},        {"float", 4},       {"Vec2f", 8},
             {"Vec3f", 12},     {"Vec4f", 16},     {"Mat3f", 36},      {"Mat4f", 64},
-            {"Texture1D", 16}, {"Texture2D", 16}, {"TextureCube", 16}};
+            {"texture1D", 16}, {"texture2D", 16}, {"textureCube", 16}};
         CatalogueRow row{type, name, {}, 0, 0};
         std::size_t const size = kSizes.at(type);
         auto const append = [&](auto value) {

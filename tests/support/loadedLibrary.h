@@ -11,6 +11,7 @@
 #include <stdexcept>
 #include <string>
 #include <vector>
+#include <zsi/registration.h>
 #include <zsi/zsi.h>
 
 namespace zsi::test {
@@ -121,7 +122,7 @@ struct Registered {
 };
 
 /// A manager that writes down what a shader registers.
-class RecordingManager final : public IShaderManager {
+class RecordingManager final : public GenericManager<RecordingManager> {
 public:
     std::vector<int> masks;
     std::vector<Registered> rows;
@@ -134,44 +135,27 @@ public:
         shader.registerShader(this);
     }
 
-    using S = IShaderBase*;
-    using Name = char const*;
-    void declareEntryPoints(S s, int mask) override
+    void declareEntryPoints(IShaderBase* s, int mask) override
     {
         sameShader = sameShader && s == shader_;
         maskFirst = masks.empty() && rows.empty();
         masks.push_back(mask);
     }
-    void registerBool(S s, Name n, bool* f) override { add(s, "bool", n, f); }
-    void registerInt(S s, Name n, int* f) override { add(s, "int", n, f); }
-    void registerFloat(S s, Name n, float* f) override { add(s, "float", n, f); }
-    void registerVec2f(S s, Name n, Vec2f* f) override { add(s, "Vec2f", n, f); }
-    void registerVec3f(S s, Name n, Vec3f* f) override { add(s, "Vec3f", n, f); }
-    void registerVec4f(S s, Name n, Vec4f* f) override { add(s, "Vec4f", n, f); }
-    void registerMat3f(S s, Name n, Mat3f* f) override { add(s, "Mat3f", n, f); }
-    void registerMat4f(S s, Name n, Mat4f* f) override { add(s, "Mat4f", n, f); }
-    void registerTexture1D(S s, Name n, TextureSampler1D* f) override { add(s, "Texture1D", n, f); }
-    void registerTexture2D(S s, Name n, TextureSampler2D* f) override { add(s, "Texture2D", n, f); }
-    void registerTextureCube(S s, Name n, TextureSamplerCube* f) override
-    {
-        add(s, "TextureCube", n, f);
-    }
-    void registerAttribute(S s, int kind, Name name, long offset) override
+    void registerAttribute(IShaderBase* s, int kind, char const* name, long offset) override
     {
         sameShader = sameShader && s == shader_;
         rows.push_back({"attribute", name, nullptr, 0, 0, kind, offset});
     }
+    template <class T>
+    void parameter(IShaderBase* s, char const* name, T* field)
+    {
+        sameShader = sameShader && s == shader_;
+        rows.push_back({kParameterTypeNames[parameterTypeIndex<T>()], name,
+                        reinterpret_cast<unsigned char*>(field), sizeof(T), alignof(T), 0, 0});
+    }
 
 private:
     IShaderBase* shader_;
-
-    template <class T>
-    void add(S s, char const* type, Name name, T* field)
-    {
-        sameShader = sameShader && s == shader_;
-        rows.push_back(
-            {type, name, reinterpret_cast<unsigned char*>(field), sizeof(T), alignof(T), 0, 0});
-    }
 };
 
 /// An entry point: its bit in the mask, the kind of class that has it, and how to call it.

@@ -172,11 +172,11 @@ inline void fillParameters(RecordingManager const& registered, Supply& supply, b
             put(supply.chance(2));
         else if (row.type == "int")
             put(supply.integer());
-        else if (row.type == "Texture1D")
+        else if (row.type == "texture1D")
             put(steadyTexture<float>(supply, hostile));
-        else if (row.type == "Texture2D")
+        else if (row.type == "texture2D")
             put(steadyTexture<Vec2f>(supply, hostile));
-        else if (row.type == "TextureCube")
+        else if (row.type == "textureCube")
             put(steadyTexture<Vec3f>(supply, hostile));
         else
             for (std::size_t at = 0; at < row.size; at += sizeof(float)) {
