@@ -13,14 +13,6 @@ constexpr std::size_t kLongestName = 128;
 constexpr std::size_t kShownLength = 200;
 constexpr std::size_t kFewNames = 12;
 
-std::string lowered(std::string_view text)
-{
-    std::string out(text);
-    for (char& c : out)
-        c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
-    return out;
-}
-
 /// Optimal string alignment distance, three rows at a time.
 std::size_t editDistance(std::string_view a, std::string_view b)
 {
@@ -41,7 +33,44 @@ std::size_t editDistance(std::string_view a, std::string_view b)
     return last[b.size()];
 }
 
+/// "u_roughValue" as "u", "rough", "value".
+std::vector<std::string> words(std::string_view name)
+{
+    std::vector<std::string> found(1);
+    bool afterLower = false;
+    for (char const c : name) {
+        bool const upper = std::isupper(static_cast<unsigned char>(c)) != 0;
+        if (c == '_' || (upper && afterLower))
+            found.emplace_back();
+        afterLower = !upper;
+        if (c != '_')
+            found.back() += static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
+    }
+    return found;
+}
+
+/// Whether a word of one begins a word of the other, as "rough" does "roughness".
+bool shareStem(std::string_view a, std::string_view b)
+{
+    constexpr std::size_t kShortestStem = 4;
+    for (std::string const& x : words(a))
+        for (std::string const& y : words(b)) {
+            std::size_t const stem = std::min(x.size(), y.size());
+            if (stem >= kShortestStem && x.compare(0, stem, y, 0, stem) == 0)
+                return true;
+        }
+    return false;
+}
+
 } // namespace
+
+std::string lowered(std::string_view text)
+{
+    std::string out(text);
+    for (char& c : out)
+        c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
+    return out;
+}
 
 std::vector<std::string> nearestNames(std::string_view name,
                                       std::vector<std::string> const& candidates)
@@ -50,7 +79,7 @@ std::vector<std::string> nearestNames(std::string_view name,
         return {};
     std::string const wanted = lowered(name);
     std::size_t const limit = std::max<std::size_t>(1, wanted.size() / 3);
-    std::vector<std::pair<std::size_t, std::string const*>> near;
+    std::vector<std::pair<std::size_t, std::string const*>> near, related;
     for (std::string const& candidate : candidates) {
         if (candidate.size() > kLongestName)
             continue;
@@ -61,7 +90,11 @@ std::vector<std::string> nearestNames(std::string_view name,
             distance = limit;
         if (distance <= limit)
             near.emplace_back(distance, &candidate);
+        else if (distance <= wanted.size() / 2 && shareStem(name, candidate))
+            related.emplace_back(distance, &candidate);
     }
+    if (near.empty())
+        near = std::move(related);
     std::stable_sort(near.begin(), near.end(),
                      [](auto const& a, auto const& b) { return a.first < b.first; });
     std::vector<std::string> names;

@@ -107,7 +107,7 @@ std::vector<std::string> unwrittenParameters(Shader const& shader,
 {
     std::vector<std::string> names;
     for (Parameter const& p : shader.parameters())
-        if (!p.hasDefault && !written.contains(p.name) && isRead(shader, p))
+        if (!p.about.hasDefault && !written.contains(p.name) && isRead(shader, p))
             names.push_back(p.name);
     return names;
 }

@@ -4,79 +4,35 @@
 
 #include <array>
 #include <cstring>
+#include <zsi/registration.h>
 
 namespace zsi::host {
 
 namespace {
 
-/// In the order of both `ParameterType` and the alternatives of `ParameterValue`.
-constexpr std::array kTypeNames{"bool",  "int",   "float",     "Vec2f",     "Vec3f",      "Vec4f",
-                                "Mat3f", "Mat4f", "texture1D", "texture2D", "textureCube"};
-static_assert(kTypeNames.size() == std::variant_size_v<ParameterValue>);
-static_assert(kTypeNames.size() == static_cast<std::size_t>(ParameterType::TextureCube) + 1);
+static_assert(std::tuple_size_v<ParameterTypes> == std::variant_size_v<ParameterValue>);
+static_assert(
+    std::tuple_size_v<ParameterTypes> == static_cast<std::size_t>(ParameterType::TextureCube) + 1);
 
 /// Writes down what a shader registers. Nothing is thrown through the shader's code.
-class RecordingManager final : public IShaderManager {
+class RecordingManager final : public GenericManager<RecordingManager> {
 public:
     int entryPoints = 0;
     std::vector<Parameter> parameters;
     std::vector<Attribute> attributes;
 
     void declareEntryPoints(IShaderBase*, int mask) override { entryPoints = mask; }
-    void registerBool(IShaderBase*, char const* name, bool* field) override
-    {
-        add(name, ParameterType::Bool, field);
-    }
-    void registerInt(IShaderBase*, char const* name, int* field) override
-    {
-        add(name, ParameterType::Int, field);
-    }
-    void registerFloat(IShaderBase*, char const* name, float* field) override
-    {
-        add(name, ParameterType::Float, field);
-    }
-    void registerVec2f(IShaderBase*, char const* name, Vec2f* field) override
-    {
-        add(name, ParameterType::Vec2f, field);
-    }
-    void registerVec3f(IShaderBase*, char const* name, Vec3f* field) override
-    {
-        add(name, ParameterType::Vec3f, field);
-    }
-    void registerVec4f(IShaderBase*, char const* name, Vec4f* field) override
-    {
-        add(name, ParameterType::Vec4f, field);
-    }
-    void registerMat3f(IShaderBase*, char const* name, Mat3f* field) override
-    {
-        add(name, ParameterType::Mat3f, field);
-    }
-    void registerMat4f(IShaderBase*, char const* name, Mat4f* field) override
-    {
-        add(name, ParameterType::Mat4f, field);
-    }
-    void registerTexture1D(IShaderBase*, char const* name, TextureSampler1D* field) override
-    {
-        add(name, ParameterType::Texture1D, field);
-    }
-    void registerTexture2D(IShaderBase*, char const* name, TextureSampler2D* field) override
-    {
-        add(name, ParameterType::Texture2D, field);
-    }
-    void registerTextureCube(IShaderBase*, char const* name, TextureSamplerCube* field) override
-    {
-        add(name, ParameterType::TextureCube, field);
-    }
     void registerAttribute(IShaderBase*, int kind, char const* name, long offset) override
     {
         attributes.push_back({name, kind, offset});
     }
-
-private:
-    void add(char const* name, ParameterType type, void* field)
+    template <class T>
+    void parameter(IShaderBase*, char const* name, T* field)
     {
-        bool const matrix = type == ParameterType::Mat3f || type == ParameterType::Mat4f;
-        parameters.push_back({name, type, field, !matrix, {}});
+        constexpr bool kMatrix = std::is_same_v<T, Mat3f> || std::is_same_v<T, Mat4f>;
+        constexpr auto kType = static_cast<ParameterType>(parameterTypeIndex<T>());
+        parameters.push_back({name, kType, field});
+        parameters.back().about.hasDefault = !kMatrix;
     }
 };
 
@@ -96,7 +52,10 @@ void checkAttribute(std::string const& className, Attribute const& a)
 
 } // namespace
 
-char const* typeName(ParameterType type) { return kTypeNames[static_cast<std::size_t>(type)]; }
+char const* typeName(ParameterType type)
+{
+    return kParameterTypeNames[static_cast<std::size_t>(type)];
+}
 
 Shader::Shader(std::string className, std::unique_ptr<IShaderBase> object,
                std::shared_ptr<void const> library)
@@ -117,6 +76,9 @@ Shader::Shader(std::string className, std::unique_ptr<IShaderBase> object,
     attributes_ = std::move(manager.attributes);
 }
 
+Shader::Shader(Shader&&) noexcept = default;
+Shader::~Shader() = default;
+
 Shader& Shader::operator=(Shader&& other) noexcept
 {
     // The object goes before the library that holds its destructor.
@@ -126,6 +88,8 @@ Shader& Shader::operator=(Shader&& other) noexcept
     entryPoints_ = other.entryPoints_;
     parameters_ = std::move(other.parameters_);
     attributes_ = std::move(other.attributes_);
+    summary_ = std::move(other.summary_);
+    text_ = std::move(other.text_);
     return *this;
 }
 
@@ -152,12 +116,12 @@ void Shader::describe(LibraryDescription const& description)
     auto const found = description.find(className_);
     if (found == description.end())
         return;
-    for (Parameter& p : parameters_) {
-        if (auto const row = found->second.find(p.name); row != found->second.end()) {
-            p.meaning = row->second.meaning;
-            p.hasDefault = row->second.hasDefault;
-        }
-    }
+    summary_ = found->second.summary;
+    text_ = found->second.text;
+    auto const& rows = found->second.parameters;
+    for (Parameter& p : parameters_)
+        if (auto const row = rows.find(p.name); row != rows.end())
+            p.about = row->second;
 }
 
 void Shader::set(std::string_view name, ParameterValue const& value)

@@ -13,6 +13,7 @@
 
 namespace zsi::host {
 
+/// In the order of `zsi::ParameterTypes` and of the alternatives of `ParameterValue`.
 enum class ParameterType {
     Bool,
     Int,
@@ -34,8 +35,7 @@ struct Parameter {
     std::string name;
     ParameterType type;
     void* field;
-    bool hasDefault = true; ///< false: the host must write it before the shader reads it
-    std::string meaning = {}; ///< from the library's description, empty without one
+    ParameterDescription about = {}; ///< from the library's description
 };
 
 struct Attribute {
@@ -58,7 +58,8 @@ public:
     /// outside the attribute block.
     Shader(std::string className, std::unique_ptr<IShaderBase> object,
            std::shared_ptr<void const> library = {});
-    Shader(Shader&&) noexcept = default;
+    Shader(Shader&&) noexcept;
+    ~Shader();
     Shader& operator=(Shader&& other) noexcept;
 
     std::string const& className() const { return className_; }
@@ -68,7 +69,9 @@ public:
     std::vector<Attribute> const& attributes() const { return attributes_; }
     Parameter const* find(std::string_view name) const; ///< null when there is none
     std::vector<std::string> parameterNames() const; ///< registered order
-    void describe(LibraryDescription const& description); ///< meanings and missing defaults
+    std::string const& summary() const { return summary_; } ///< a line, empty if not described
+    std::string const& text() const { return text_; } ///< what the class models, likewise
+    void describe(LibraryDescription const& description);
 
     /// Writes the field. Throws InputError for an unknown name (with the nearest ones) or a type
     /// that does not fit; an int is taken for a float.
@@ -86,6 +89,7 @@ private:
     int entryPoints_ = 0;
     std::vector<Parameter> parameters_;
     std::vector<Attribute> attributes_;
+    std::string summary_, text_;
 };
 
 } // namespace zsi::host

@@ -42,15 +42,20 @@ inline Vec3f gradeChannel(Vec3f c, ChannelGrade const& grade)
     return c;
 }
 
-/// Rows of the grade that all cubes of a material have, and of their rotation.
-#define GLOBAL_IBL(P, U, A)                                                                 \
-    P(Vec3f, globalIBLContrastPivot, (1.0f, 1.0f, 1.0f), "all cubes: contrast pivot")       \
-    P(float, globalIBLContrastValue, (1.0f), "all cubes: contrast, 1 unchanged")            \
-    P(Vec3f, globalIBLGainColor, (1.0f, 1.0f, 1.0f), "all cubes: gain colour")              \
-    P(float, globalIBLSatValue, (1.0f), "all cubes: saturation, 1 unchanged, 0 grey")       \
-    P(int, globalIBLGainSource, (0), "all cubes: 0 value, 1 colour, 2 colour of luminance") \
-    P(float, globalIBLGainValue, (1.0f), "all cubes: gain")                                 \
-    U(Mat3f, globalIBLMatrix, "rotation of directions before cube lookups")
+/// Rows of the grade that all cubes of a material have, and of their rotation. After P, U and A
+/// comes when that is read: with which cubes.
+#define GLOBAL_IBL(P, U, A, ...)                                                               \
+    P(Vec3f, globalIBLContrastPivot, (1.0f, 1.0f, 1.0f), "all cubes: contrast pivot",          \
+      group("grading of all cubes"))                                                           \
+    P(float, globalIBLContrastValue, (1.0f), "all cubes: contrast, 1 unchanged", slider(0, 2)) \
+    P(Vec3f, globalIBLGainColor, (1.0f, 1.0f, 1.0f), "all cubes: gain colour")                 \
+    P(float, globalIBLSatValue, (1.0f), "all cubes: saturation, 1 unchanged, 0 grey",          \
+      slider(0, 2))                                                                            \
+    P(int, globalIBLGainSource, (0), "all cubes: 0 value, 1 colour, 2 colour of luminance",    \
+      slider(0, 2))                                                                            \
+    P(float, globalIBLGainValue, (1.0f), "all cubes: gain", slider(0, 4))                      \
+    U(Mat3f, globalIBLMatrix, "rotation of directions before cube lookups",                    \
+      groupEnd() __VA_OPT__(, ) __VA_ARGS__)
 
 /// Light from a world direction by a cube of a shader that has these rows, graded for all its
 /// cubes.

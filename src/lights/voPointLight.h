@@ -9,7 +9,7 @@ namespace zsi {
 #define POINT_LIGHT(P, U, A)                                                        \
     P(Vec3f, color, (1.0f, 0.5f, 0.1f), "colour and intensity, linear RGB")         \
     P(bool, castShadows, (true), "ask the host for shadow transmission")            \
-    P(float, range, (10000.0f), "world units; dark beyond")                         \
+    P(float, range, (10000.0f), "world units; dark beyond", slider(0, 10000))       \
     P(Vec3f, attenuationFactors, (1.0f, 0.0f, 0.0f),                                \
       "times 1 - (distance / x)^y within 0..1, dark where y is 0; x: world units; " \
       "z: not used")

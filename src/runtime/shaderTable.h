@@ -5,6 +5,14 @@
 ///   U(type, name, "meaning")              a parameter that has no default: the host writes it;
 ///                                         zeroed, so that nothing ever reads undefined memory
 ///   A(type, name)                         a vertex attribute
+/// After the meaning, P and U take facts for people and for programs that show parameters:
+///   slider(0, 1)                          where a person would drag it; values outside are legal
+///   group("masking"), groupEnd()          the group that begins or ends with this row
+///   when("maskingMode", 2, 4)             the shader reads it only with these values of another
+///   when("maskingTexture")                ... with this texture bound, or this switch on
+///   whenAny("diffuseCube", "specularCube")    ... with at least one of up to three
+/// Several conditions must all hold. Facts cost the library nothing; `tools/describe.cpp` reads
+/// them.
 /// Shared blocks are such macros too; a class puts them where its order wants them. From the rows
 /// derive the fields (flat members, same order), registration, copy, the attribute offsets, and an
 /// `attribute_<name>(state)` reader for each attribute.
@@ -17,6 +25,31 @@
 #include <zsi/zsi.h>
 
 namespace zsi {
+
+struct Slider {
+    float minimum, maximum, step;
+};
+/// A step of 0 tells nothing: whatever suits the type and the range.
+constexpr Slider slider(float minimum, float maximum, float step = 0.0f)
+{
+    return {minimum, maximum, step};
+}
+
+struct Group {
+    char const* name;
+};
+constexpr Group group(char const* name) { return {name}; }
+struct GroupEnd { };
+constexpr GroupEnd groupEnd() { return {}; }
+
+struct When {
+    char const* parameters[3]; ///< the first ones are not null
+    bool ranged = false;
+    int from = 0, to = 0;
+};
+constexpr When when(char const* mode, int from, int to) { return {{mode}, true, from, to}; }
+constexpr When when(char const* parameter) { return {{parameter}}; }
+constexpr When whenAny(auto... parameters) { return {{parameters...}}; }
 
 /// Tells the host's manager about each row; one overload per parameter and attribute type.
 struct Registrar {
@@ -44,7 +77,8 @@ struct Registrar {
         manager->registerTextureCube(shader, name, &f);
     }
 
-    void parameter(char const* name, auto& f, char const* /*meaning*/, bool /*hasDefault*/)
+    void parameter(char const* name, auto& f, char const* /*meaning*/, bool /*hasDefault*/,
+                   auto const&... /*facts*/)
     {
         field(name, f);
     }
@@ -74,16 +108,18 @@ inline T readAttribute(ShadeState const& state, std::size_t offset)
 } // namespace zsi
 
 #define ZSI_ROW_NONE(...)
-#define ZSI_ROW_FIELD(T, name, init, meaning) T name = T init;
-#define ZSI_ROW_UNSET(T, name, meaning) T name{};
+#define ZSI_ROW_FIELD(T, name, init, meaning, ...) T name = T init;
+#define ZSI_ROW_UNSET(T, name, meaning, ...) T name{};
 #define ZSI_ROW_ATTRIBUTE(T, name) T name;
 #define ZSI_ROW_READER(T, name)                                     \
     static T attribute_##name(ShadeState const& state)              \
     {                                                               \
         return readAttribute<T>(state, offsetof(Attributes, name)); \
     }
-#define ZSI_VISIT_FIELD(T, name, init, meaning) visitor.parameter(#name, self.name, meaning, true);
-#define ZSI_VISIT_UNSET(T, name, meaning) visitor.parameter(#name, self.name, meaning, false);
+#define ZSI_VISIT_FIELD(T, name, init, meaning, ...) \
+    visitor.parameter(#name, self.name, meaning, true __VA_OPT__(, ) __VA_ARGS__);
+#define ZSI_VISIT_UNSET(T, name, meaning, ...) \
+    visitor.parameter(#name, self.name, meaning, false __VA_OPT__(, ) __VA_ARGS__);
 #define ZSI_VISIT_ATTRIBUTE(T, name) \
     visitor.template attribute<T>(#name, offsetof(Attributes, name));
 

@@ -85,33 +85,52 @@ TEST_F(Command, InfoTellsWhatTheLibrariesRegister)
         EXPECT_EQ(entry.at("kind"), kinds[shader.kind()]) << shader.className();
     }
 
-    auto const row = [](char const* name, char const* type, Json value, char const* meaning = "") {
-        return Json{{"name", name},
-                    {"type", type},
-                    {"meaning", meaning},
-                    {"hasDefault", !value.is_null() || std::string(type).starts_with("texture")},
-                    {"default", value}};
+    auto const row = [](char const* name, char const* type, Json value,
+                        Json more = Json::object()) {
+        Json json{{"name", name},
+                  {"type", type},
+                  {"meaning", ""},
+                  {"hasDefault", !value.is_null() || std::string(type).starts_with("texture")},
+                  {"default", value}};
+        json.update(more);
+        return json;
     };
     Json const tiny = Json::parse(zsi("info --json TinyMaterial", "ZSI_SHADER_PATH=" + kTiny).out);
-    EXPECT_EQ(tiny.at("parameters"),
-              (Json{row("flag", "bool", true), row("count", "int", 3),
-                    row("amount", "float", 0.1, "how much, 0..1"), row("pair", "Vec2f", {1.0, 2.0}),
-                    row("tint", "Vec3f", nullptr, "linear RGB"),
-                    row("quad", "Vec4f", {1.0, 2.0, 3.0, 4.0}), row("uvMatrix", "Mat3f", nullptr),
-                    row("matrix", "Mat4f", std::vector<double>(16), "position to texture"),
-                    row("ramp", "texture1D", nullptr), row("map", "texture2D", nullptr),
-                    row("cube", "textureCube", nullptr)}));
+    EXPECT_EQ(
+        tiny.at("parameters"),
+        (Json{row("flag", "bool", true), row("count", "int", 3),
+              row("amount", "float", 0.1,
+                  {{"meaning", "how much"},
+                   {"minimum", 0},
+                   {"maximum", 2},
+                   {"step", 0.5},
+                   {"group", "look"}}),
+              row("pair", "Vec2f", {1.0, 2.0}),
+              row("tint", "Vec3f", nullptr, {{"meaning", "linear RGB"}}),
+              row("quad", "Vec4f", {1.0, 2.0, 3.0, 4.0}),
+              row("uvMatrix", "Mat3f", nullptr,
+                  {{"when",
+                    {{{"parameters", Json::array({"count"})}, {"from", 2}, {"to", 5}},
+                     {{"parameters", {"map", "ramp"}}}}}}),
+              row("matrix", "Mat4f", std::vector<double>(16), {{"meaning", "position to texture"}}),
+              row("ramp", "texture1D", nullptr), row("map", "texture2D", nullptr),
+              row("cube", "textureCube", nullptr)}));
     EXPECT_EQ(tiny.at("attributes"),
               (Json{{{"name", "uv"}, {"type", "Vec2f"}, {"offset", 0}},
                     {{"name", "vtxcolor"}, {"type", "Vec4f"}, {"offset", 8}}}));
 
     expectContains(zsi("info voSpotLight").out,
-                   {"voSpotLight: light", "entry points: illumination",
-                    "color               Vec3f  (0.1, 1, 0.5)  ", "no vertex attributes"});
+                   {"voSpotLight: light\nSpot light: ", "entry points: illumination",
+                    "cosPenumbra         float  0.9            0 .. 1      cosine",
+                    "no vertex attributes"});
     expectContains(
         zsi("--shader-path " + kTiny + " info TinyMaterial", "ZSI_SHADER_PATH=/nowhere").out,
-        {"entry points: shade, transmission", "tint      Vec3f        none   ", "  linear RGB\n",
-         "vtxcolor  Vec4f  offset 8"});
+        {"entry points: shade, transmission", " [look]\n  amount    float        0.1 ",
+         "0 .. 2 by 0.5  how much\n [others]", "  linear RGB\n",
+         "read with count 2 to 5, map or ramp\n", "vtxcolor  Vec4f  8\n"});
+    // A word finds the classes that are about it.
+    std::string const found = zsi("info CRYSTAL --shader-path " + kTiny).out;
+    EXPECT_EQ(found, "  TinyMaterial  material  A material of one colour.\n");
     // A class whose object cannot be made has nothing to show, but keeps no other away.
     Result const all = zsi("info --shader-path " + kTiny);
     EXPECT_EQ(all.status, 0);

@@ -162,7 +162,8 @@ TEST(Plugin, ReadsDamagedSharedObjects)
 
 TEST(Names, NearOnesFirst)
 {
-    std::vector<std::string> const names{"u_ior", "u_roughMap", "u_color", "corvid_Mtl_Solid"};
+    std::vector<std::string> const names{"u_ior", "u_roughMapTransform", "u_roughValue", "u_color",
+                                         "corvid_Mtl_Solid"};
     struct Case {
         char const* typed;
         std::vector<std::string> want;
@@ -172,6 +173,7 @@ TEST(Names, NearOnesFirst)
         {"U_IOR", {"u_ior"}},
         {"u_colour", {"u_color"}},
         {"Solid", {"corvid_Mtl_Solid"}},
+        {"u_roughness", {"u_roughValue"}},
         {"zzz", {}},
         {"", {}},
     };

@@ -97,7 +97,7 @@ TEST(Ward, EveryMapIsReadThroughItsOwnTransformTimesItsOwnAmount)
     w.host.onTrace = w.host.onIndirect = [](Vec3f, Vec3f d) { return grey(0.5f) + d * 0.3f; };
     std::map<std::string, test::FunctionTexture<Vec2f>*> textures;
     for (auto const& [name, row] : w.byName)
-        if (row.type == "Texture2D") {
+        if (row.type == "texture2D") {
             textures[name] = &w.texture(name, [](Vec2f p) {
                 return Vec4f(0.4f + 0.3f * std::sin(90 * p.x), 0.4f + 0.3f * std::sin(80 * p.y),
                              0.5f, 0.6f);

@@ -6,9 +6,10 @@ namespace zsi {
 
 /// Shadow catcher: invisible but for the shadow and occlusion that fall on it; the alpha is the
 /// strength of the shadow, ready to be laid over a plate.
-#define SHADOW_PLANE(P, U, A)                                                           \
-    P(Vec3f, shadowColor, (0.0f, 0.0f, 0.0f), "what full shadow and occlusion tend to") \
-    P(float, shadowIntensity, (0.7f), "how far full shadow goes from white to shadowColor, 0..1")
+#define SHADOW_PLANE(P, U, A)                                                               \
+    P(Vec3f, shadowColor, (0.0f, 0.0f, 0.0f), "what full shadow and occlusion tend to")     \
+    P(float, shadowIntensity, (0.7f), "how far full shadow goes from white to shadowColor", \
+      slider(0, 1))
 
 class corvid_Mtl_ShadowPlane final : public MaterialShader {
 public:

@@ -9,7 +9,7 @@ namespace zsi {
 #define SOLID(P, U, A)                                                          \
     P(bool, reverseNormal, (false), "negate the shading normal")                \
     P(bool, faceForward, (false), "turn the shading normal towards the viewer") \
-    P(int, patchState, (0), "0 and 1: lilac, 2: light grey, others: black")
+    P(int, patchState, (0), "0 and 1: lilac, 2: light grey, others: black", slider(0, 3))
 
 class corvid_Mtl_Solid final : public MaterialShader {
 public:

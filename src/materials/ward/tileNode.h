@@ -6,7 +6,7 @@
 
 namespace zsi {
 
-/// The numbers of a brickwork: X(U, path, type, name, meaning).
+/// The numbers of a brickwork: X(U, path, type, name, meaning and facts).
 #define TILE_SHAPE(X, U, path)                                                                   \
     X(U, path, float, verticalCount, "rows of bricks in the square")                             \
     X(U, path, float, horizontalCount, "bricks of a row in the square")                          \
@@ -30,17 +30,17 @@ namespace zsi {
     X(U, path, bool, repeatX, "go on beyond 0..1 in x; transparent there otherwise")             \
     X(U, path, bool, repeatY, "go on beyond 0..1 in y; transparent there otherwise")
 
-#define TILE_ROW(U, path, T, name, meaning) U(T, path##_Tile_##name, meaning)
+#define TILE_ROW(U, path, T, name, ...) U(T, path##_Tile_##name, __VA_ARGS__)
 #define TILE_ROWS(U, path)                                                               \
     U(Mat4f, path##_Tile_xform, "(u, v, 1, 1) to the square that the bricks fill, 0..1") \
     TILE_SHAPE(TILE_ROW, U, path)
 
-#define TILE_FIELD(U, path, T, name, meaning) T name{};
+#define TILE_FIELD(U, path, T, name, ...) T name{};
 struct TileShape {
     TILE_SHAPE(TILE_FIELD, ZSI_ROW_NONE, none)
 };
 
-#define TILE_FIELD_VALUE(U, path, T, name, meaning) path##_Tile_##name,
+#define TILE_FIELD_VALUE(U, path, T, name, ...) path##_Tile_##name,
 #define TILE_VALUE(site, path, brickColor, mortarColor)                                         \
     tileNode(site, {brickColor, mortarColor}, path##_Tile_xform,                                \
              {TILE_SHAPE(TILE_FIELD_VALUE, ZSI_ROW_NONE, path)}, attribute_tangent(site.state), \

@@ -7,15 +7,20 @@
 namespace zsi {
 
 #define AMBIENT_OCCLUSION_BAKED(P, U, A)                                                           \
-    P(TextureSampler2D, ambientOcclusionTexture, (), "baked occlusion in its red channel, by uv1") \
-    P(int, ambientOcclusionMode, (0), "baked source: 1 texture, 2 vertex colour, others none")     \
-    P(float, ambientOcclusionFactor, (1.0f), "strength of the occlusion, 0..1")                    \
+    P(TextureSampler2D, ambientOcclusionTexture, (), "baked occlusion in its red channel, by uv1", \
+      group("ambient occlusion"))                                                                  \
+    P(int, ambientOcclusionMode, (0), "baked source: 1 texture, 2 vertex colour, others none",     \
+      slider(0, 2))                                                                                \
+    P(float, ambientOcclusionFactor, (1.0f), "strength of the occlusion", slider(0, 1))            \
     P(Vec3f, ambientOcclusionColor, (0.0f, 0.0f, 0.0f), "colour of fully occluded areas")          \
-    P(bool, usePrecalcAO, (true), "use the baked source that ambientOcclusionMode tells")
+    P(bool, usePrecalcAO, (true), "use the baked source that ambientOcclusionMode tells",          \
+      groupEnd())
 
-#define AMBIENT_OCCLUSION_SWITCHES(P, U, A)                                                   \
-    P(bool, showAmbientOnly, (false), "show the occlusion alone, where a material offers it") \
-    P(bool, usingRaytracedAO, (false), "ask the host for occlusion where no baked source applies")
+#define AMBIENT_OCCLUSION_SWITCHES(P, U, A)                                                        \
+    P(bool, showAmbientOnly, (false), "show the occlusion alone, where a material offers it",      \
+      group("ambient occlusion"))                                                                  \
+    P(bool, usingRaytracedAO, (false), "ask the host for occlusion where no baked source applies", \
+      groupEnd())
 
 #define AMBIENT_OCCLUSION_PARAMETERS(P, U, A) \
     AMBIENT_OCCLUSION_BAKED(P, U, A)          \
