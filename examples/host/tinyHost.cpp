@@ -10,6 +10,7 @@
 #include <map>
 #include <memory>
 #include <random>
+#include <zsi/registration.h>
 #include <zsi/vecmath.h>
 #include <zsi/zsi.h>
 
@@ -19,21 +20,20 @@ using V = Vec3f const*;
 constexpr int kSize = 256, kSamples = 16, kMaxDepth = 6;
 
 /// What a shader registers. Parameters made of floats can be set; matrices come without a default.
-struct Manager final : IShaderManager {
+struct Manager final : GenericManager<Manager> {
     std::map<std::string, std::pair<float*, int>> floats; ///< field and count
     std::map<std::string, std::pair<long, int>> vertex; ///< attributes: offset and kind
     void declareEntryPoints(IShaderBase*, int) override { } // every material can shade
-    void registerBool(IShaderBase*, char const*, bool*) override { }
-    void registerInt(IShaderBase*, char const*, int*) override { }
-    void registerFloat(IShaderBase*, char const* n, float* f) override { floats[n] = {f, 1}; }
-    void registerVec2f(IShaderBase*, char const* n, Vec2f* f) override { floats[n] = {&f->x, 2}; }
-    void registerVec3f(IShaderBase*, char const* n, Vec3f* f) override { floats[n] = {&f->x, 3}; }
-    void registerVec4f(IShaderBase*, char const* n, Vec4f* f) override { floats[n] = {&f->x, 4}; }
-    void registerMat3f(IShaderBase*, char const*, Mat3f* f) override { *f = Mat3f::identity(); }
-    void registerMat4f(IShaderBase*, char const*, Mat4f* f) override { *f = Mat4f::identity(); }
-    void registerTexture1D(IShaderBase*, char const*, TextureSampler1D*) override { }
-    void registerTexture2D(IShaderBase*, char const*, TextureSampler2D*) override { }
-    void registerTextureCube(IShaderBase*, char const*, TextureSamplerCube*) override { }
+    template <class T>
+    void parameter(IShaderBase*, char const* n, T* f)
+    {
+        if constexpr (std::is_same_v<T, Mat3f> || std::is_same_v<T, Mat4f>)
+            *f = T::identity();
+        else if constexpr (std::is_same_v<T, float>)
+            floats[n] = {f, 1};
+        else if constexpr (requires { f->x; })
+            floats[n] = {&f->x, static_cast<int>(sizeof(T) / sizeof(float))};
+    }
     void registerAttribute(IShaderBase*, int k, char const* n, long o) override
     {
         vertex[n] = {o, k};
