@@ -15,8 +15,10 @@
 #include "mesh/meshShapes.h"
 #include "texture/textureStore.h"
 
+#include <algorithm>
 #include <cmath>
 #include <fmt/format.h>
+#include <map>
 #include <unordered_map>
 
 namespace zsi::host {
@@ -26,6 +28,7 @@ namespace {
 constexpr int kLargestFilm = 32768; // pixels a side
 constexpr int kMostSamples = 1 << 20;
 constexpr int kMostSegments = 4096;
+constexpr float kRadians = 0.0174532925f; // of a degree
 
 Vec3f readPosition(JsonReader const& reader)
 {
@@ -248,14 +251,13 @@ public:
             }
         if (auto const v = root.find("instances"))
             for (auto const& [name, instance] : v->members())
-                addInstance(instance, readInstance(instance));
+                readInstance(instance);
         if (auto const v = root.find("lights"))
             for (auto const& [name, light] : v->members())
                 readLight(light);
-        if (auto const v = root.find("environment")) {
-            v->expectKeys({"class", "parameters"});
-            scene_.environment = readShader(*v, kEnvironment);
-        }
+        if (auto const v = root.find("environment"))
+            readEnvironment(*v);
+        dropWholeMeshes();
     }
 
 private:
@@ -311,13 +313,127 @@ private:
                         names.size() == 1 ? "has" : "have", names.size() == 1 ? "is" : "are"));
     }
 
-    Instance readInstance(JsonReader const& reader) const
+    void readEnvironment(JsonReader const& reader)
     {
-        reader.expectKeys({"mesh", "material", "transform"});
-        Instance instance{meshes_.indexOf(reader.at("mesh")),
-                          materials_.indexOf(reader.at("material")), Mat4f::identity()};
-        instance.objectToWorld = readPlacing(reader);
-        return instance;
+        reader.onlyOf({"class", "file"});
+        auto const visible = reader.find("visible");
+        if (!reader.find("file")) {
+            reader.expectKeys({"class", "parameters", "visible"});
+            scene_.environmentVisible = visible && visible->toBool();
+            scene_.environment = readShader(reader, kEnvironment);
+            return;
+        }
+        reader.expectKeys(
+            {"file", "colorSpace", "visible", "rotate", "intensity", "diffuseBlur", "background"});
+        begin(reader);
+        scene_.environmentVisible = !visible || visible->toBool();
+        auto const rotate = reader.find("rotate"), intensity = reader.find("intensity");
+        auto const blur = reader.find("diffuseBlur"), background = reader.find("background");
+        Vec3f gain{1, 1, 1};
+        if (intensity && intensity->kind() == JsonValue::Kind::Array)
+            gain = intensity->toVec3f();
+        else if (intensity)
+            gain = gain * intensity->toFloat(0);
+        Shader shader = [&] {
+            try {
+                return shaders_.create("corvid_Env_Default");
+            } catch (InputError const& error) {
+                reader.fail(error.what());
+            }
+        }();
+        shader.set("globalIBLMatrix", turnAroundZ(rotate ? rotate->toFloat() : 0.0f));
+        shader.set("reflectionCube", readPictureAround(reader, 0.0f, *scene_.textures));
+        shader.set("diffuseCube",
+                   readPictureAround(reader, blur ? blur->toFloat(0, 90) * kRadians : 0.0f,
+                                     *scene_.textures));
+        for (char const* kind : {"reflect", "diffuse"}) {
+            shader.set(std::string(kind) + "IBLGainMode", 1); // by channel
+            shader.set(std::string(kind) + "IBLGain", gain);
+        }
+        shader.set("backgroundColor", background ? background->toVec3f() : Vec3f(0, 0, 0));
+        scene_.environment = std::move(shader);
+    }
+
+    void readInstance(JsonReader const& reader)
+    {
+        reader.expectKeys({"mesh", "material", "materials", "transform"});
+        int const mesh = meshes_.indexOf(reader.at("mesh"));
+        JsonReader const material = reader.onlyOf({"material", "materials"});
+        Mat4f const toWorld = readPlacing(reader);
+        if (reader.find("material"))
+            addInstance(reader, {mesh, materials_.indexOf(material), toWorld});
+        else
+            readParts(reader, material, mesh, toWorld);
+    }
+
+    /// An instance of each part of the mesh; `chosen`: scene materials by the parts' names.
+    void readParts(JsonReader const& reader, JsonReader const& chosen, int mesh,
+                   Mat4f const& toWorld)
+    {
+        std::vector<MeshPart> const parts = scene_.meshes[static_cast<std::size_t>(mesh)].parts;
+        if (parts.empty())
+            chosen.fail("the mesh has no parts; give it a \"material\"");
+        std::vector<std::string> names, known;
+        for (MeshPart const& part : parts) {
+            names.push_back(fmt::format("{} ({})", printable(part.node), printable(part.material)));
+            known.insert(known.end(), {part.node, part.material});
+        }
+        std::map<std::string, int> materials;
+        for (auto const& [name, material] : chosen.members()) {
+            if (name != "*" && std::find(known.begin(), known.end(), name) == known.end())
+                material.fail(fmt::format("no part and no material of the file has this name; its "
+                                          "parts, with their materials: {}",
+                                          fmt::join(names, ", ")));
+            materials[name] = materials_.indexOf(material);
+        }
+        std::vector<int> const& meshes = splitMesh(mesh);
+        for (std::size_t i = 0; i < parts.size(); ++i) {
+            auto found = materials.find(parts[i].node);
+            for (std::string const& other : {parts[i].material, std::string("*")})
+                if (found == materials.end())
+                    found = materials.find(other);
+            if (found == materials.end())
+                chosen.fail(fmt::format("no material for the part {}; name it, its material, or "
+                                        "\"*\" for all others",
+                                        names[i]));
+            if (meshes[i] >= 0)
+                addInstance(reader, {meshes[i], found->second, toWorld});
+        }
+    }
+
+    /// Meshes of the parts, -1 for one without triangles.
+    std::vector<int> const& splitMesh(int whole)
+    {
+        auto const [split, isNew] = split_.try_emplace(whole);
+        if (!isNew)
+            return split->second;
+        Mesh const& mesh = scene_.meshes[static_cast<std::size_t>(whole)];
+        std::vector<Mesh> parts = partsOf(mesh);
+        for (std::size_t i = 0; i < parts.size(); ++i) {
+            bool const isThere = !parts[i].triangles.empty();
+            split->second.push_back(isThere ? static_cast<int>(scene_.meshes.size()) : -1);
+            if (isThere) {
+                Mesh const& from = scene_.meshes[static_cast<std::size_t>(whole)];
+                parts[i].name = from.name + '/' + from.parts[i].node;
+                scene_.meshes.push_back(std::move(parts[i]));
+            }
+        }
+        return split->second;
+    }
+
+    /// What stands in the scene only in parts needs no memory as a whole.
+    void dropWholeMeshes()
+    {
+        std::set<int> used;
+        for (Instance const& instance : scene_.instances)
+            used.insert(instance.mesh);
+        for (auto const& [whole, parts] : split_)
+            if (!used.contains(whole)) {
+                Mesh& mesh = scene_.meshes[static_cast<std::size_t>(whole)];
+                Mesh empty;
+                empty.name = mesh.name;
+                mesh = std::move(empty);
+            }
     }
 
     /// The key "transform".
@@ -487,6 +603,7 @@ private:
     ShaderSource const& shaders_;
     LoadOptions const& options_;
     std::vector<float> largest_; ///< coordinate of each mesh, as far as asked for
+    std::map<int, std::vector<int>> split_; ///< meshes that stand in the scene in parts
     Names meshes_{"mesh"}, materials_{"material"};
 };
 

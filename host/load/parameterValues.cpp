@@ -100,4 +100,12 @@ ParameterValue readParameterValue(JsonReader const& reader, ParameterType type,
     reader.fail("a parameter of unknown type");
 }
 
+HostTextureCube const* readPictureAround(JsonReader const& reader, float halfAngle,
+                                         TextureStore& textures)
+{
+    ColorSpace const space = readColorSpace(reader);
+    return loaded(reader.at("file"),
+                  [&](auto const& file) { return textures.loadCube(file, space, halfAngle); });
+}
+
 } // namespace zsi::host

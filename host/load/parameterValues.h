@@ -14,4 +14,9 @@ class TextureStore;
 ParameterValue readParameterValue(JsonReader const& reader, ParameterType type,
                                   TextureStore& textures);
 
+/// A cube of the picture that the key "file" of an object names, with its "colorSpace";
+/// `halfAngle`: radians over which it is averaged. Throws as above.
+HostTextureCube const* readPictureAround(JsonReader const& reader, float halfAngle,
+                                         TextureStore& textures);
+
 } // namespace zsi::host

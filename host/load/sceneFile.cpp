@@ -40,6 +40,8 @@ Level below(Level level, std::string_view section, std::string_view key)
         return section == "instances" ? Level::Keys : Level::Shader;
     case Level::Shader:
         return key == "parameters" ? Level::Keys : Level::Value;
+    case Level::Keys:
+        return section == "instances" && key == "materials" ? Level::Keys : Level::Value;
     default:
         return Level::Value;
     }
@@ -64,6 +66,13 @@ bool changesClass(JsonValue const& base, JsonValue const& over)
 void merge(JsonValue& base, JsonReader const& over, Level level, std::string_view section)
 {
     if (level == Level::Value || base.kind != JsonValue::Kind::Object || !over.isObject()) {
+        base = over.value();
+        return;
+    }
+    // An environment is a class or a file.
+    bool const otherKind = level == Level::Shader
+        && ((base.find("file") && over.find("class")) || (base.find("class") && over.find("file")));
+    if (otherKind) {
         base = over.value();
         return;
     }

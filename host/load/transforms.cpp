@@ -200,4 +200,11 @@ Mat3f readTransform3(JsonReader const& reader)
     return toMatrix<Mat3f>(m);
 }
 
+Mat3f turnAroundZ(float degrees)
+{
+    double sine, cosine;
+    sineAndCosine(degrees, sine, cosine);
+    return toMatrix<Mat3f>(Square<3>{{{cosine, sine, 0}, {-sine, cosine, 0}, {0, 0, 1}}});
+}
+
 } // namespace zsi::host

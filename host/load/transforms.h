@@ -15,4 +15,7 @@ Mat4f readTransform(JsonReader const& reader);
 /// vectors like those of `readTransform`.
 Mat3f readTransform3(JsonReader const& reader);
 
+/// A turn of directions around the z axis, counterclockwise from above.
+Mat3f turnAroundZ(float degrees);
+
 } // namespace zsi::host

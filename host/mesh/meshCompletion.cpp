@@ -60,7 +60,7 @@ std::string counted(std::size_t count, char const* thing)
 void dropBadTriangles(Mesh& mesh, std::vector<std::string>& warnings)
 {
     std::size_t missing = 0, notFinite = 0, flat = 0;
-    std::erase_if(mesh.triangles, [&](Triangle const& t) {
+    auto const isBad = [&](Triangle const& t) {
         for (std::uint32_t const i : t)
             if (i >= mesh.positions.size())
                 return ++missing, true;
@@ -71,7 +71,16 @@ void dropBadTriangles(Mesh& mesh, std::vector<std::string>& warnings)
         if (!std::isfinite(length(c)))
             return ++notFinite, true;
         return isDirection(c) ? false : (++flat, true);
-    });
+    };
+    std::size_t kept = 0;
+    for (std::size_t i = 0; i < mesh.triangles.size(); ++i)
+        if (!isBad(mesh.triangles[i])) {
+            if (!mesh.partOf.empty())
+                mesh.partOf[kept] = mesh.partOf[i];
+            mesh.triangles[kept++] = mesh.triangles[i];
+        }
+    mesh.triangles.resize(kept);
+    mesh.partOf.resize(mesh.partOf.empty() ? 0 : kept);
     auto const warn = [&](std::size_t count, char const* why) {
         if (count > 0)
             warnings.push_back(fmt::format("{} {} left out", counted(count, "triangle"), why));
@@ -255,6 +264,41 @@ Vec2f projected(Vec3f p, std::size_t side)
 }
 
 } // namespace
+
+std::vector<Mesh> partsOf(Mesh const& mesh)
+{
+    std::vector<Mesh> parts(mesh.parts.size());
+    std::vector<std::vector<std::uint32_t>> from(parts.size()); // vertices of each part
+    std::vector<std::uint32_t> to(mesh.positions.size()), owner(mesh.positions.size(), kNone);
+    // The triangles of a part stand together, so that a vertex has one owner at a time.
+    for (std::size_t i = 0; i < mesh.triangles.size(); ++i) {
+        std::uint32_t const part = mesh.partOf[i];
+        Triangle t = mesh.triangles[i];
+        for (std::uint32_t& corner : t) {
+            if (owner[corner] != part) {
+                owner[corner] = part;
+                to[corner] = static_cast<std::uint32_t>(from[part].size());
+                from[part].push_back(corner);
+            }
+            corner = to[corner];
+        }
+        parts[part].triangles.push_back(t);
+    }
+    auto const take = [&](auto Mesh::*array) {
+        if (!(mesh.*array).empty())
+            for (std::size_t part = 0; part < parts.size(); ++part)
+                for (std::uint32_t const i : from[part])
+                    (parts[part].*array).push_back((mesh.*array)[i]);
+    };
+    take(&Mesh::positions);
+    take(&Mesh::normals);
+    take(&Mesh::tangents);
+    take(&Mesh::bitangents);
+    take(&Mesh::uv);
+    take(&Mesh::uv1);
+    take(&Mesh::colors);
+    return parts;
+}
 
 void projectUv(Mesh& mesh)
 {

@@ -23,6 +23,9 @@ enum class NormalSource {
 /// Appends to `warnings` one line for each kind of repair. The mesh may be empty afterwards.
 void completeMesh(Mesh& mesh, NormalSource source, std::vector<std::string>& warnings);
 
+/// A mesh for each of `mesh.parts`, without triangles where none are left of it.
+std::vector<Mesh> partsOf(Mesh const& mesh);
+
 /// uv by box projection: each triangle along the axis of object space that its normal is nearest
 /// to, one uv unit to an object unit; seen from outside, u to the right and v along +z, or along
 /// +y for faces up or down. Vertices that lie between sides are split.

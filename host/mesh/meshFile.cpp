@@ -7,6 +7,7 @@
 #include <algorithm>
 #include <assimp/Importer.hpp>
 #include <assimp/config.h>
+#include <assimp/material.h>
 #include <assimp/postprocess.h>
 #include <assimp/scene.h>
 #include <cctype>
@@ -117,8 +118,12 @@ std::vector<Mesh> placedParts(aiScene const& scene)
         aiMatrix4x4 const toWorld = parentToWorld * node->mTransformation;
         for (unsigned i = 0; i < node->mNumMeshes; ++i)
             if (Mesh part = toMesh(*scene.mMeshes[node->mMeshes[i]], toWorld);
-                !part.triangles.empty())
+                !part.triangles.empty()) {
+                aiMaterial const& material =
+                    *scene.mMaterials[scene.mMeshes[node->mMeshes[i]]->mMaterialIndex];
+                part.parts = {{node->mName.C_Str(), material.GetName().C_Str()}};
                 parts.push_back(std::move(part));
+            }
         for (unsigned i = node->mNumChildren; i-- > 0;) // the first child is taken next
             open.emplace_back(node->mChildren[i], toWorld);
     }
@@ -151,6 +156,9 @@ Mesh joined(std::vector<Mesh>& parts)
             part.uv1 = part.uv;
         if (hasColors && part.colors.empty())
             part.colors.assign(part.positions.size(), Vec4f(1, 1, 1, 1));
+        mesh.partOf.insert(mesh.partOf.end(), part.triangles.size(),
+                           static_cast<std::uint32_t>(mesh.parts.size()));
+        mesh.parts.push_back(part.parts.front());
         std::size_t const before = mesh.positions.size();
         std::size_t const after = before + part.positions.size();
         append(mesh.positions, part.positions, before);

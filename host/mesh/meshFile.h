@@ -10,6 +10,7 @@ namespace zsi::host {
 /// Reads an OBJ, PLY, STL, glTF or GLB file as one mesh: polygons as triangles, the nodes of the
 /// file at their places, points and lines left out. Arrays that the file has for some parts only
 /// are filled for the others; what it does not have at all stays empty. v runs upwards.
+/// `parts` are the nodes, each as often as it has materials, in the file's order.
 /// Throws InputError that names the file when it is missing, of another kind, or broken.
 Mesh readMeshFile(std::filesystem::path const& file);
 

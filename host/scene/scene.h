@@ -19,7 +19,12 @@ class TextureStore;
 /// Coordinates go up to this: rays are traced within 1.8e18, and squares are still finite.
 constexpr float kFarthest = 1e18f;
 
-/// Triangles with per-vertex data. Every array but `triangles` is either empty or as long as
+/// What one node of a mesh file shows in one material.
+struct MeshPart {
+    std::string node, material; ///< names in the file
+};
+
+/// Triangles with per-vertex data. Every array of a vertex is either empty or as long as
 /// `positions`; the loader fills normals, uv, tangents and bitangents that a file lacks.
 struct Mesh {
     std::string name;
@@ -31,6 +36,8 @@ struct Mesh {
     std::vector<Vec3f> bitangents;
     std::vector<Vec4f> colors; ///< empty: (1, 1, 1, 1)
     std::vector<std::array<std::uint32_t, 3>> triangles;
+    std::vector<MeshPart> parts; ///< of a file
+    std::vector<std::uint32_t> partOf; ///< each triangle's, index into `parts`; empty without parts
 };
 
 struct Instance {
@@ -116,6 +123,9 @@ struct Scene {
     std::vector<Instance> instances;
     std::vector<Light> lights;
     std::optional<Shader> environment; ///< none: black
+    /// The camera sees the environment as a ray does that has reached its depth, which for some
+    /// shaders is the picture that is reflected.
+    bool environmentVisible = false;
     std::shared_ptr<TextureStore> textures; ///< owns what the shaders' handles point to
     std::vector<std::string> warnings; ///< such as a matrix that a shader will read left unwritten
 };

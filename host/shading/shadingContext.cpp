@@ -99,6 +99,9 @@ Vec4f ShadingContext::environment(PathRay const& ray)
     if (!environment)
         return {0, 0, 0, 0};
     ShadeState state = record(ray);
+    if (scene_.scene().environmentVisible
+        && (ray.type == kRayCamera || ray.type == kRayTransmission))
+        state.maxRayDepth = state.rayDepth;
     environment->shade(this, state);
     if (!isFinite(rgb(state.Ci))) {
         ++nonFinite_;

@@ -399,6 +399,19 @@ TEST(Render, SurfaceLightsAreSeenAndLightTheirSurroundings)
         }
 }
 
+TEST(Render, AVisibleEnvironmentIsSeenAsItIsReflected)
+{
+    Sky const sky([](Vec3f d) { return d.z < -0.5f ? Vec3f(2, 3, 4) : kWhite; });
+    for (char const* integrator : kIntegrators) {
+        Stage stage;
+        stage.scene.settings.integrator = integrator;
+        stage.sky(sky, {1, 0, 0});
+        expectNear(stage.middle(), {1, 0, 0, 0}, 0, "the background");
+        stage.scene.environmentVisible = true;
+        expectNear(stage.middle(), {2, 3, 4, 1}, 1e-6f, "what lies below");
+    }
+}
+
 /// A picture that tells where it is looked up.
 class Plate final : public HostTexture2D {
 public:

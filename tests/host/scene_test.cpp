@@ -135,6 +135,61 @@ TEST_F(SceneFile, AnIncludingSceneChangesTheIncludedOne)
     EXPECT_TRUE(scene.lights.empty());
 }
 
+TEST_F(SceneFile, PartsOfAFileTakeMaterialsByName)
+{
+    std::string const head = R"({"meshes": {"car": {"file": "parts.gltf", "up": "z"}},
+        "materials": {"a": {"class": "corvid_Mtl_Unlit"}, "b": {"class": "corvid_Mtl_Unlit"},
+                      "c": {"class": "corvid_Mtl_Unlit"}},
+        "instances": {"car": {"mesh": "car", )";
+    Scene const scene = load(head + R"("materials": {"Glass": "b", "Left": "c", "*": "a"}}}})");
+    struct Part {
+        int material;
+        Vec3f corner;
+    };
+    // Body in paint and glass, the wheel twice.
+    Part const parts[] = {{0, {0, 0, 0}}, {1, {0, 0, 1}}, {2, {10, 0, 0}}, {0, {20, 0, 0}}};
+    ASSERT_EQ(scene.instances.size(), 4u);
+    for (std::size_t i = 0; i < 4; ++i) {
+        Mesh const& mesh = scene.meshes[static_cast<std::size_t>(scene.instances[i].mesh)];
+        EXPECT_EQ(scene.instances[i].material, parts[i].material) << i;
+        EXPECT_EQ(mesh.triangles.size(), 1u);
+        EXPECT_TRUE(std::count(mesh.positions.begin(), mesh.positions.end(), parts[i].corner)) << i;
+        EXPECT_EQ(mesh.normals.size(), 3u);
+    }
+    EXPECT_TRUE(scene.meshes[0].positions.empty()) << "nothing shows it as a whole";
+    Scene const whole = load(head + R"("material": "b"}}})");
+    ASSERT_EQ(whole.instances.size(), 1u);
+    EXPECT_EQ(whole.meshes[0].triangles.size(), 4u);
+    expectContains(errorOf([&] { load(head + R"("materials": {"Glas": "b"}}}})"); }),
+                   {"materials.Glas", "Body (Paint), Body (Glass), Left (Rubber), Right (Rubber)"});
+    expectContains(errorOf([&] { load(head + R"("materials": {"Body": "b", "Left": "a"}}}})"); }),
+                   {"no material for the part Right (Rubber)"});
+}
+
+TEST_F(SceneFile, AnEnvironmentCanBeAPicture)
+{
+    Scene const brief = load(R"({"environment": {"file": "a.png", "rotate": 30,
+                                 "intensity": [1, 2, 3], "diffuseBlur": 20}})");
+    Scene const full = load(R"({"environment": {"class": "corvid_Env_Default", "parameters": {
+        "globalIBLMatrix": {"rotate": [0, 0, 1, 30]}, "backgroundColor": [0, 0, 0],
+        "reflectIBLGainMode": 1, "reflectIBLGain": [1, 2, 3],
+        "diffuseIBLGainMode": 1, "diffuseIBLGain": [1, 2, 3]}}})");
+    expectNear(numbers(value<Mat3f>(*brief.environment, "globalIBLMatrix")),
+               numbers(value<Mat3f>(*full.environment, "globalIBLMatrix")));
+    for (char const* name : {"reflectIBLGain", "diffuseIBLGain", "backgroundColor"})
+        expectNear(numbers(value<Vec3f>(*brief.environment, name)),
+                   numbers(value<Vec3f>(*full.environment, name)));
+    for (char const* name : {"reflectIBLGainMode", "diffuseIBLGainMode"})
+        EXPECT_EQ(value<int>(*brief.environment, name), 1);
+    auto const sharp = value<TextureSamplerCube>(*brief.environment, "reflectionCube").texture;
+    auto const blurred = value<TextureSamplerCube>(*brief.environment, "diffuseCube").texture;
+    EXPECT_TRUE(sharp && blurred && sharp != blurred);
+    EXPECT_TRUE(brief.environmentVisible);
+    EXPECT_FALSE(full.environmentVisible);
+    expectContains(errorOf([&] { load(R"({"environment": {"file": "no.exr"}})"); }),
+                   {"environment.file", "no.exr"});
+}
+
 TEST_F(SceneFile, AssignmentsStandInThePlaceOfTheFile)
 {
     fs::path const file = folder.write("scene.json", R"({
