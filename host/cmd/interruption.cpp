@@ -13,14 +13,28 @@ std::atomic<bool> requested{false};
 std::atomic<int> received{0};
 static_assert(std::atomic<bool>::is_always_lock_free && std::atomic<int>::is_always_lock_free);
 
+[[noreturn]] void end(int signal)
+{
+    host::ReplacedFile::removeAll();
+    _exit(128 + signal);
+}
+
+/// There was no occasion for a second: a single sample can take as long as a scene wants.
+void onAlarm(int)
+{
+    constexpr char kMessage[] = "zsi: interrupted, no picture written\n";
+    if (write(STDERR_FILENO, kMessage, sizeof(kMessage) - 1) < 0)
+        end(received); // nowhere to tell it
+    end(received);
+}
+
 void onSignal(int signal)
 {
-    if (!deferred || requested) { // the second one ends the program where it stands
-        host::ReplacedFile::removeAll();
-        _exit(128 + signal);
-    }
+    if (!deferred || requested) // the second one ends the program where it stands
+        end(signal);
     received = signal;
     requested = true;
+    alarm(1);
 }
 
 constexpr int kSignals[] = {SIGINT, SIGTERM, SIGHUP};
@@ -32,6 +46,7 @@ Interruption::Interruption()
     struct sigaction action = {};
     action.sa_handler = onSignal;
     action.sa_flags = SA_RESTART;
+    std::signal(SIGALRM, onAlarm);
     for (std::size_t i = 0; i < std::size(kSignals); ++i) {
         sigaction(kSignals[i], nullptr, &before_[i]);
         // Whoever started the program with a signal ignored, as nohup does, has it stay so.
@@ -57,6 +72,7 @@ std::atomic<bool> const& Interruption::defer()
 int Interruption::resume()
 {
     deferred = false;
+    alarm(0);
     return received ? 128 + received : 0;
 }
 

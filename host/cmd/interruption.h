@@ -7,8 +7,9 @@
 namespace zsi::cmd {
 
 /// While one lives, SIGINT, SIGTERM and SIGHUP end the program with status 128 + signal, without
-/// leaving anything half-written: at once, but at the next occasion between `defer` and `resume`; a
-/// second one at once in any case. A signal that was ignored before stays so. One at a time.
+/// leaving anything half-written: at once, but between `defer` and `resume` at the next occasion,
+/// at the latest after a second; a second one at once in any case. A signal that was ignored before
+/// stays so. One at a time.
 class Interruption {
 public:
     Interruption();
