@@ -6,12 +6,15 @@
 
 namespace zsi {
 
-#define BITMAP_ROWS(U, path)                                                           \
-    U(Mat4f, path##_UnifiedBitmap_xform,                                               \
-      "uv, or the reference position if isCube, to the picture")                       \
-    U(TextureSampler2D, path##_UnifiedBitmap_texture, "the picture, linear RGBA")      \
-    U(float, path##_UnifiedBitmap_amount, "multiplier of the picture, alpha included") \
-    U(bool, path##_UnifiedBitmap_isCube, "lay the picture on the six faces of a box, not along uv")
+#define BITMAP_ROWS(U, path)                                                                    \
+    U(Mat4f, path##_UnifiedBitmap_xform,                                                        \
+      "uv, or the reference position if isCube, to the picture", group(#path "_UnifiedBitmap"), \
+      when(#path "_UnifiedBitmap_texture"))                                                     \
+    U(TextureSampler2D, path##_UnifiedBitmap_texture, "the picture, linear RGBA")               \
+    U(float, path##_UnifiedBitmap_amount, "multiplier of the picture, alpha included",          \
+      slider(0, 2))                                                                             \
+    U(bool, path##_UnifiedBitmap_isCube,                                                        \
+      "lay the picture on the six faces of a box, not along uv", groupEnd())
 
 #define BITMAP_VALUE(site, path)                                               \
     bitmapNode(site, path##_UnifiedBitmap_xform, path##_UnifiedBitmap_texture, \

@@ -17,15 +17,20 @@ namespace zsi {
     U(Vec4f, path##_Noise_color2, "colour of high noise, linear RGBA") \
     NOISE_SHAPE_ROWS(U, path)
 
-#define NOISE_PLACE_ROWS(U, path)                                                  \
-    U(Mat4f, path##_Noise_xform, "reference position to noise space, before size") \
-    U(int, path##_Noise_type, "0 plain, 1 fractal, 2 turbulence; others a noise value of 0")
-#define NOISE_SHAPE_ROWS(U, path)                                                               \
-    U(float, path##_Noise_size, "size of a noise cell, in units of noise space; 0 counts as 1") \
-    U(float, path##_Noise_thresholdLow, "noise value below which color1 is pure")               \
-    U(float, path##_Noise_thresholdHigh, "noise value above which color2 is pure")              \
-    U(float, path##_Noise_levels, "octaves of types 1 and 2; a fraction counts as a whole one") \
-    U(float, path##_Noise_phase, "fourth coordinate of the noise, to animate it")
+#define NOISE_PLACE_ROWS(U, path)                                                            \
+    U(Mat4f, path##_Noise_xform, "reference position to noise space, before size",           \
+      group(#path "_Noise"))                                                                 \
+    U(int, path##_Noise_type, "0 plain, 1 fractal, 2 turbulence; others a noise value of 0", \
+      slider(0, 2))
+#define NOISE_SHAPE_ROWS(U, path)                                                                \
+    U(float, path##_Noise_size, "size of a noise cell, in units of noise space; 0 counts as 1",  \
+      slider(0, 10))                                                                             \
+    U(float, path##_Noise_thresholdLow, "noise value below which color1 is pure", slider(0, 1))  \
+    U(float, path##_Noise_thresholdHigh, "noise value above which color2 is pure", slider(0, 1)) \
+    U(float, path##_Noise_levels, "octaves of types 1 and 2; a fraction counts as a whole one",  \
+      slider(1, 10), when(#path "_Noise_type", 1, 2))                                            \
+    U(float, path##_Noise_phase, "fourth coordinate of the noise, to animate it", slider(0, 10), \
+      groupEnd())
 
 #define NOISE_VALUE(site, path, color1, color2)                                               \
     noiseNode(site, {color1, color2}, path##_Noise_thresholdLow, path##_Noise_thresholdHigh,  \
