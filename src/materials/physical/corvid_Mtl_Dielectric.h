@@ -6,35 +6,44 @@ namespace zsi {
 
 /// Glass: a smooth or rough refracting interface with highlights of lights, traced reflection and
 /// refraction, and coloured absorption inside.
-#define DIELECTRIC(P, U, A)                                                                      \
-    PHYSICAL_FRONT(P, U, A)                                                                      \
-    P(bool, u_transmittanceMapEnable, (false), "absorption from the map, for traced refraction") \
-    P(TextureSampler2D, u_transmittanceMap, (), "colour kept after u_absorptionCoef of depth")   \
-    U(Mat3f, u_transmittanceTransform, "UV transform of that map")                               \
-    P(float, u_transmittanceAmount, (1.0f), "multiplier of the map's colour")                    \
-    P(int, u_procedureMapEnable, (0), "1: cast ripple, where the first bump map is off")         \
-    P(Vec3f, u_procedureMapTiling, (1.0f, 1.0f, 1.0f), "repeats of the ripple per world unit")   \
-    P(float, u_procedureMapAmount, (0.0f), "depth of the ripple, either sign, about 0..0.5")     \
-    P(bool, u_normal0MapEnable, (false), "first bump map on")                                    \
-    P(TextureSampler2D, u_normal0Map, (), "first bump map: height, r + g + b")                   \
-    U(Mat3f, u_normal0Transform, "UV transform of the first bump map")                           \
-    P(float, u_normal0Amount, (0.0f), "depth of the first bump, either sign")                    \
-    P(float, u_normal0UVScale, (1.0f), "further scale of the first bump's coordinate")           \
-    P(bool, u_normal1MapEnable, (false), "second bump map on, on top of the first")              \
-    P(TextureSampler2D, u_normal1Map, (), "second bump map: height, r + g + b")                  \
-    U(Mat3f, u_normal1Transform, "UV transform of the second bump map")                          \
-    P(float, u_normal1Amount, (0.0f), "depth of the second bump, either sign")                   \
-    P(bool, u_roughMapEnable, (false), "roughness from the map")                                 \
-    P(TextureSampler2D, u_roughMap, (), "roughness in its red channel")                          \
-    P(float, u_roughValue, (0.0004f), "roughness without a map, above 0; below 0.01 smooth")     \
-    U(Mat3f, u_roughTransform, "UV transform of the roughness map")                              \
-    P(float, u_glossyValue, (0.0f), "not read by this material")                                 \
-    P(float, u_roughAmount, (1.0f), "multiplier of the roughness map")                           \
-    P(float, u_ior, (1.52f), "refractive index, above 0")                                        \
-    P(float, u_reflectance, (0.1f), "reflectance at normal incidence, 0..1")                     \
-    P(Vec3f, u_absorptionCoef, (0.0f, 0.0f, 0.0f), "decades per world unit and channel")         \
-    P(bool, u_falloffEnable, (false), "absorb along traced paths too, not only shadow rays")     \
-    P(Vec3f, u_refractColor, (1.0f, 1.0f, 1.0f), "tint of transmitted light, linear RGB")        \
+#define DIELECTRIC(P, U, A)                                                                        \
+    PHYSICAL_FRONT(P, U, A)                                                                        \
+    P(bool, u_transmittanceMapEnable, (false), "absorption from the map, for traced refraction",   \
+      group("absorption map"))                                                                     \
+    P(TextureSampler2D, u_transmittanceMap, (), "colour kept after u_absorptionCoef of depth")     \
+    U(Mat3f, u_transmittanceTransform, "UV transform of that map",                                 \
+      when("u_transmittanceMapEnable"), when("u_transmittanceMap"))                                \
+    P(float, u_transmittanceAmount, (1.0f), "multiplier of the map's colour", slider(0, 2))        \
+    P(int, u_procedureMapEnable, (0), "1: cast ripple, where the first bump map is off",           \
+      slider(0, 1), group("bump"))                                                                 \
+    P(Vec3f, u_procedureMapTiling, (1.0f, 1.0f, 1.0f), "repeats of the ripple per world unit")     \
+    P(float, u_procedureMapAmount, (0.0f), "depth of the ripple, either sign, about 0..0.5",       \
+      slider(-0.5f, 0.5f))                                                                         \
+    P(bool, u_normal0MapEnable, (false), "first bump map on")                                      \
+    P(TextureSampler2D, u_normal0Map, (), "first bump map: height, r + g + b")                     \
+    U(Mat3f, u_normal0Transform, "UV transform of the first bump map", when("u_normal0MapEnable"), \
+      when("u_normal0Map"))                                                                        \
+    P(float, u_normal0Amount, (0.0f), "depth of the first bump, either sign", slider(-1, 1))       \
+    P(float, u_normal0UVScale, (1.0f), "further scale of the first bump's coordinate",             \
+      slider(0, 10))                                                                               \
+    P(bool, u_normal1MapEnable, (false), "second bump map on, on top of the first")                \
+    P(TextureSampler2D, u_normal1Map, (), "second bump map: height, r + g + b")                    \
+    U(Mat3f, u_normal1Transform, "UV transform of the second bump map",                            \
+      when("u_normal1MapEnable"), when("u_normal1Map"))                                            \
+    P(float, u_normal1Amount, (0.0f), "depth of the second bump, either sign", slider(-1, 1))      \
+    P(bool, u_roughMapEnable, (false), "roughness from the map", group("roughness"))               \
+    P(TextureSampler2D, u_roughMap, (), "roughness in its red channel")                            \
+    P(float, u_roughValue, (0.0004f), "roughness without a map, above 0; below 0.01 smooth",       \
+      slider(0, 1))                                                                                \
+    U(Mat3f, u_roughTransform, "UV transform of the roughness map", when("u_roughMapEnable"),      \
+      when("u_roughMap"))                                                                          \
+    P(float, u_glossyValue, (0.0f), "not read by this material", slider(0, 1))                     \
+    P(float, u_roughAmount, (1.0f), "multiplier of the roughness map", slider(0, 2))               \
+    P(float, u_ior, (1.52f), "refractive index, above 0", slider(1, 3), group("glass"))            \
+    P(float, u_reflectance, (0.1f), "reflectance at normal incidence, 0..1", slider(0, 1))         \
+    P(Vec3f, u_absorptionCoef, (0.0f, 0.0f, 0.0f), "decades per world unit and channel")           \
+    P(bool, u_falloffEnable, (false), "absorb along traced paths too, not only shadow rays")       \
+    P(Vec3f, u_refractColor, (1.0f, 1.0f, 1.0f), "tint of transmitted light, linear RGB")          \
     P(Vec3f, u_reflectColor, (1.0f, 1.0f, 1.0f), "tint of reflected light, linear RGB")
 
 class corvid_Mtl_Dielectric final : public MaterialShader,
