@@ -40,6 +40,30 @@ TEST(Plugin, FindsTheClassesOfAnyLibrary)
     EXPECT_TRUE(shader.material() && !shader.light() && !shader.environment());
 }
 
+TEST(Plugin, EveryNumberOfTheLibraryHasASliderAroundItsDefault)
+{
+    ShaderLibraries own;
+    own.load(ZSI_SHADER_LIBRARY);
+    for (std::string const& name : own.classNames()) {
+        Shader const shader = own.create(name);
+        EXPECT_TRUE(shader.summary().ends_with('.')) << name;
+        for (Parameter const& p : shader.parameters()) {
+            bool const isFloat = p.type == ParameterType::Float;
+            EXPECT_EQ(p.about.slider.has_value(), isFloat || p.type == ParameterType::Int)
+                << name << ' ' << p.name;
+            if (!p.about.slider)
+                continue;
+            float const value = isFloat ? *static_cast<float*>(p.field)
+                                        : static_cast<float>(*static_cast<int*>(p.field));
+            auto const minimum = static_cast<float>(p.about.slider->minimum);
+            auto const maximum = static_cast<float>(p.about.slider->maximum);
+            EXPECT_LT(minimum, maximum) << name << ' ' << p.name;
+            EXPECT_TRUE(!p.about.hasDefault || (value >= minimum && value <= maximum))
+                << name << ' ' << p.name;
+        }
+    }
+}
+
 TEST(Plugin, ObjectsOutliveTheirLibraries)
 {
     // A file of its own, which nothing else keeps loaded.
