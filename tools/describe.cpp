@@ -63,7 +63,7 @@ struct Describer {
     Json parameters = Json::object();
     std::string group = {};
 
-    void parameter(char const* name, auto const&, char const* meaning, bool hasDefault,
+    void parameter(char const* name, auto const&, bool hasDefault, char const* meaning,
                    auto const&... facts)
     {
         Json& row = parameters[name] = {{"meaning", meaning}, {"default", hasDefault}};

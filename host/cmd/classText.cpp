@@ -253,6 +253,7 @@ Json classJson(host::Shader const& shader)
 std::string listText(std::vector<host::Shader> const& shaders)
 {
     std::vector<Row> rows;
+    rows.reserve(shaders.size());
     for (host::Shader const& shader : shaders)
         rows.push_back({shader.className(), kindName(shader.kind()), shader.summary()});
     return columns(rows);

@@ -54,8 +54,7 @@ inline Vec3f gradeChannel(Vec3f c, ChannelGrade const& grade)
     P(int, globalIBLGainSource, (0), "all cubes: 0 value, 1 colour, 2 colour of luminance",    \
       slider(0, 2))                                                                            \
     P(float, globalIBLGainValue, (1.0f), "all cubes: gain", slider(0, 4))                      \
-    U(Mat3f, globalIBLMatrix, "rotation of directions before cube lookups",                    \
-      groupEnd() __VA_OPT__(, ) __VA_ARGS__)
+    U(Mat3f, globalIBLMatrix, "rotation of directions before cube lookups", groupEnd(), __VA_ARGS__)
 
 /// Light from a world direction by a cube of a shader that has these rows, graded for all its
 /// cubes.

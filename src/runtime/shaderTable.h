@@ -77,7 +77,7 @@ struct Registrar {
         manager->registerTextureCube(shader, name, &f);
     }
 
-    void parameter(char const* name, auto& f, char const* /*meaning*/, bool /*hasDefault*/,
+    void parameter(char const* name, auto& f, bool /*hasDefault*/, char const* /*meaning*/,
                    auto const&... /*facts*/)
     {
         field(name, f);
@@ -108,18 +108,16 @@ inline T readAttribute(ShadeState const& state, std::size_t offset)
 } // namespace zsi
 
 #define ZSI_ROW_NONE(...)
-#define ZSI_ROW_FIELD(T, name, init, meaning, ...) T name = T init;
-#define ZSI_ROW_UNSET(T, name, meaning, ...) T name{};
+#define ZSI_ROW_FIELD(T, name, init, ...) T name = T init;
+#define ZSI_ROW_UNSET(T, name, ...) T name{};
 #define ZSI_ROW_ATTRIBUTE(T, name) T name;
 #define ZSI_ROW_READER(T, name)                                     \
     static T attribute_##name(ShadeState const& state)              \
     {                                                               \
         return readAttribute<T>(state, offsetof(Attributes, name)); \
     }
-#define ZSI_VISIT_FIELD(T, name, init, meaning, ...) \
-    visitor.parameter(#name, self.name, meaning, true __VA_OPT__(, ) __VA_ARGS__);
-#define ZSI_VISIT_UNSET(T, name, meaning, ...) \
-    visitor.parameter(#name, self.name, meaning, false __VA_OPT__(, ) __VA_ARGS__);
+#define ZSI_VISIT_FIELD(T, name, init, ...) visitor.parameter(#name, self.name, true, __VA_ARGS__);
+#define ZSI_VISIT_UNSET(T, name, ...) visitor.parameter(#name, self.name, false, __VA_ARGS__);
 #define ZSI_VISIT_ATTRIBUTE(T, name) \
     visitor.template attribute<T>(#name, offsetof(Attributes, name));
 
