@@ -178,53 +178,35 @@ TEST(AnyShader, ThreadsThatShareAnObjectGetTheSameBits)
     });
 }
 
-/// Networks of the Ward variants, by the beginning of their parameters' names and the flag that
-/// switches their channel on.
-constexpr std::pair<char const*, char const*> kNetworks[] = {
-    {"_ward_diffuse_color_", "u_diffuseMapEnable"},
-    {"_ward_normal0_map_", "u_normal0MapEnable"},
-    {"_ward_cutout_map_", "u_cutoutMapEnable"},
+constexpr std::pair<char const*, float> kWall[] = {
+    {"useColumnEdit", 1},   {"useRowEdit", 1},     {"repeatX", 1},
+    {"repeatY", 1},         {"perColumn", 1},      {"perRow", 1},
+    {"holes", 1},           {"brickHeight", 0.7f}, {"brickWidth", 0.7f},
+    {"changeColumn", 0.7f}, {"changeRow", 0.7f},   {"horizontalCount", 3},
+    {"verticalCount", 3},   {"edgeRoughness", 3},  {"horizontalGap", 0.2f},
+    {"verticalGap", 0.2f},
 };
 
-/// What the name of a parameter says must be set for it to matter. A channel is a group of
-/// parameters whose names begin alike.
-void setUpFor(std::string const& name, test::RecordingManager const& registered)
+/// A node of a network rarely matters at random: its channel must be on, and a wall have whole
+/// bricks.
+void setUpNode(std::string const& name, test::RecordingManager const& registered)
 {
-    auto const put = [&](std::string const& other, auto value) {
-        for (test::Registered const& row : registered.rows)
-            if (row.name == other && row.name != name)
-                std::memcpy(row.field, &value, sizeof value);
-    };
-    auto const channel = [&](std::string const& ending) {
-        return name.ends_with(ending) ? name.substr(0, name.size() - ending.size()) : "-";
-    };
-    for (char const* ending : {"Map", "MapTransform", "Transform", "Amount"})
-        put(channel(ending) + "MapEnable", true);
-    for (char const* ending : {"Value", "Color", "Reflectivity"})
-        put(channel(ending) + "MapEnable", false);
-    put(channel("Color") + "Mode", 0);
-    for (char const* ending : {"Texture", "UVMatrix"})
-        put(channel(ending) + "Mode", 1);
-    put(channel("TextureMatrix") + "Mode", 2);
-    for (char const* ending : {"AngularRepeat", "TextureMatrixInverse"})
-        put(channel(ending) + "Mode", 4);
-    // A node of a network: its channel is on, and a wall has some whole bricks.
-    for (auto const& [network, flag] : kNetworks)
-        if (name.starts_with(network))
-            put(flag, true);
-    if (std::size_t const tile = name.find("_Tile_"); tile != std::string::npos) {
-        std::string const node = name.substr(0, tile + 6);
-        put(node + "xform", Mat4f::identity());
-        for (char const* parameter : {"useColumnEdit", "useRowEdit", "repeatX", "repeatY"})
-            put(node + parameter, true);
-        for (char const* parameter : {"perColumn", "perRow", "holes"})
-            put(node + parameter, 1);
-        for (char const* parameter : {"brickHeight", "brickWidth", "changeColumn", "changeRow"})
-            put(node + parameter, 0.7f);
-        for (char const* parameter : {"horizontalCount", "verticalCount", "edgeRoughness"})
-            put(node + parameter, 3.0f);
-        for (char const* parameter : {"horizontalGap", "verticalGap"})
-            put(node + parameter, 0.2f);
+    std::size_t const tile = name.find("_Tile_");
+    for (test::Registered const& row : registered.rows) {
+        if (!name.starts_with("_ward_") || row.name == name || !row.field)
+            continue;
+        std::string const rest = row.name.substr(std::min(tile, row.name.size() - 1) + 1);
+        auto const* found = std::find_if(std::begin(kWall), std::end(kWall), [&](auto const& w) {
+            return tile != std::string::npos && rest == std::string("Tile_") + w.first;
+        });
+        if (row.name.ends_with("MapEnable"))
+            *row.field = true;
+        else if (found != std::end(kWall) && row.type == "bool")
+            *row.field = true;
+        else if (found != std::end(kWall) && row.type == "int")
+            std::memset(row.field, 0, 4), *row.field = 1;
+        else if (found != std::end(kWall))
+            std::memcpy(row.field, &found->second, sizeof(float));
     }
 }
 
@@ -290,7 +272,7 @@ bool matters(std::string const& className, std::size_t row, unsigned tries)
         test::RecordingManager const registered(*one), changed(*two);
         test::Supply supply(seed, false);
         test::fillParameters(registered, supply, false);
-        setUpFor(registered.rows[row].name, registered);
+        setUpNode(registered.rows[row].name, registered);
         two->copy(one.get());
         changeParameter(changed.rows[row]);
         ShadeState const before = test::fillRecord(supply);

@@ -1,5 +1,5 @@
 #include "environments/BackgroundGeometry.h"
-#include "support/scriptedHost.h"
+#include "support/textTable.h"
 
 namespace zsi {
 namespace {
@@ -26,34 +26,30 @@ testing::AssertionResult shows(Ground& ground, Vec3d want)
 
 TEST(BackgroundGeometry, FacesCutsAndBlendsByAlpha)
 {
-    struct Case {
-        char const* why;
-        Vec3f I;
-        float alpha;
-        bool kept;
-        int through;
-    };
-    Case const cases[] = {
-        {"front", {0, 0, -1}, 1.0f, true, 0},         {"back", {0, 0, 1}, 1.0f, false, 0},
-        {"edge on", {1, 0, 0}, 1.0f, false, 0},       {"cut out", {0, 0, -1}, 0.04f, false, 0},
-        {"at the limit", {0, 0, -1}, 0.05f, true, 1}, {"half clear", {0, 0, -1}, 0.5f, true, 1},
-    };
-    for (Case const& c : cases) {
+    // height of I, alpha: kept, rays through
+    for (test::Line const& c : test::table(R"(
+        front        | | -1 1     1 0
+        back         | | 1 1      0 0
+        edge on      | | 0 1      0 0
+        cut out      | | -1 0.04  0 0
+        at the limit | | -1 0.05  1 1
+        half clear   | | -1 0.5   1 1)")) {
         SCOPED_TRACE(c.why);
-        Picture picture([&](Vec2f) { return Vec4f(0.2f, 0.4f, 0.6f, c.alpha); });
+        float const a = c.want[1], b = 1 - a;
+        bool const kept = c.want[2] != 0, through = c.want[3] != 0;
+        Picture picture([&](Vec2f) { return Vec4f(0.2f, 0.4f, 0.6f, a); });
         Ground g;
-        g.state.I = c.I;
+        g.state.I = {1 - std::fabs(c.want[0]), 0, c.want[0]};
         g.shader.diffuseMode = 1;
         g.shader.diffuseTexture.texture = &picture;
         g.host.addLight({0, 0, 1}, {1, 1, 1});
         g.host.onThrough = [](Vec3f, Vec3f) { return Vec4f(1, 2, 3, 0.5f); };
-        float const a = c.alpha, b = 1 - c.alpha;
-        Vec3f const seen = Vec3f(0.2f, 0.4f, 0.6f) * a + Vec3f(1, 2, 3) * b;
-        EXPECT_TRUE(test::near(g.shade(),
-                               c.kept ? withAlpha(seen, a + 0.5f * b) : Vec4f(7, 7, 7, 7), 1e-6));
-        EXPECT_EQ(g.state.discardHit, c.kept ? 0 : 1);
-        ASSERT_EQ(g.host.count("traceThrough"), c.through);
-        EXPECT_TRUE(!c.through || g.host.calls[0].scalars[0] == 1.0f) << "importance";
+        Vec4f const seen =
+            withAlpha(Vec3f(0.2f, 0.4f, 0.6f) * a + Vec3f(1, 2, 3) * b, a + 0.5f * b);
+        EXPECT_TRUE(test::near(g.shade(), kept ? seen : Vec4f(7, 7, 7, 7), 1e-6));
+        EXPECT_EQ(g.state.discardHit, !kept);
+        ASSERT_EQ(g.host.count("traceThrough"), through);
+        EXPECT_TRUE(!through || g.host.calls[0].scalars[0] == 1.0f) << "importance";
     }
 }
 
@@ -61,39 +57,32 @@ TEST(BackgroundGeometry, FacesCutsAndBlendsByAlpha)
 /// normal's rim, and a sky of (0.5, 1, 0) that is half open.
 TEST(BackgroundGeometry, LightsAddUpInTheirShadowAndTheSkyInItsOcclusion)
 {
-    struct Case {
-        char const* why;
-        Vec3f shadow, tint;
-        float intensity;
-        bool sky;
-        Vec3d want;
-    };
-    constexpr Case kCases[] = {
-        {"open", {1, 1, 1}, {0, 0, 0}, 1, false, {2, 1, 2.5}},
-        {"sky", {1, 1, 1}, {0, 0, 0}, 1, true, {2.25, 1.5, 2.5}},
-        {"shadow", {0, 0.5f, 1}, {0, 0, 0}, 1, true, {0.25, 1, 2.5}},
-        {"half as strong", {0, 0.5f, 1}, {0, 0, 0}, 0.5f, true, {1.25, 1.25, 2.5}},
-        {"tinted", {0, 0.5f, 0}, {0.5f, 0, 1}, 1, false, {1, 0.5, 2.5}},
-    };
+    // shadow, tint, its intensity, sky: light
     for (std::uint32_t const rayType : {1u, 2u, 4u, 32u})
-        for (Case const& c : kCases) {
+        for (test::Line const& c : test::table(R"(
+            open           | | 1 1 1    0 0 0    1    0  2 1 2.5
+            sky            | | 1 1 1    0 0 0    1    1  2.25 1.5 2.5
+            shadow         | | 0 0.5 1  0 0 0    1    1  0.25 1 2.5
+            half as strong | | 0 0.5 1  0 0 0    0.5  1  1.25 1.25 2.5
+            tinted         | | 0 0.5 0  0.5 0 1  1    0  1 0.5 2.5)")) {
             Ground g;
             g.state.rayType = rayType;
             g.shader.diffuseColor = {1, 1, 1};
-            g.shader.shadowColor = c.tint;
-            g.shader.shadowIntensity = c.intensity;
-            g.host.addLight({0, 0.6f, 0.8f}, {4, 2, 1}, c.shadow, 0.5f);
+            g.shader.shadowColor = test::vec3(c.want, 3);
+            g.shader.shadowIntensity = c.want[6];
+            g.host.addLight({0, 0.6f, 0.8f}, {4, 2, 1}, test::vec3(c.want), 0.5f);
             g.host.addLight({1, 0, 0}, {0, 0, 2}, {1, 1, 1}, 1);
             g.host.onOcclusion = [](Vec3f, Vec3f) { return Vec3f(0.5f, 0.5f, 0.5f); };
             Cube cube([](Vec3f at) { return Vec4f(0.25f * at.y, 0.5f, 0, 1); }); // up is y
-            if (c.sky)
+            if (c.want[7] != 0)
                 g.shader.diffuseCube.texture = &cube;
             g.shader.globalIBLGainValue = 4;
             g.shader.diffuseIBLGainValue = 0.5f;
-            EXPECT_TRUE(shows(g, c.want)) << c.why << rayType;
+            Vec3f const want = test::vec3(c.want, 8);
+            EXPECT_TRUE(shows(g, want)) << c.why << rayType;
             EXPECT_EQ(g.host.calls[0].scalars[0], 0.0f); // the common list
             g.shader.diffuseColor = {0.5f, 0, 0.25f}; // the picture scales all of it
-            EXPECT_TRUE(shows(g, {c.want.x / 2, 0, c.want.z / 4})) << c.why;
+            EXPECT_TRUE(shows(g, want * Vec3f(0.5f, 0, 0.25f))) << c.why;
         }
 }
 
@@ -123,95 +112,67 @@ TEST(BackgroundGeometry, BumpShadesTheLights)
     }
 }
 
+/// Texels that lean by 45 degrees towards rising u, then v, of the picture: where that is in the
+/// world, with a texture turned by 90 degrees (u along y of the object, v against x), repeated
+/// twice, and an object that is turned by 90 degrees about x (y of it is up).
 TEST(BackgroundGeometry, BumpTiltsTheNormalAlongRisingTextureCoordinates)
 {
-    // A texel that leans towards rising u at 45 degrees, then one that leans towards rising v.
-    test::Random random;
-    for (int i = 0; i < 400; ++i) {
-        int const mode = 1 + i % 4;
-        bool const alongU = i % 8 < 4;
-        Picture bump([&](Vec2f) { return alongU ? Vec4f(1, 0.5f, 1, 1) : Vec4f(0.5f, 1, 1, 1); });
-        Ground g;
-        BackgroundGeometry& s = g.shader;
-        s.bumpMode = mode;
-        s.bumpTexture.texture = &bump;
-        // A rotation about z of everything, the texture transform turned by another.
-        auto const turn = [](float a, float scale) {
-            float const c = std::cos(a) * scale, n = std::sin(a) * scale;
-            return Mat4f(c, n, 0, 0, -n, c, 0, 0, 0, 0, scale, 0, 0, 0, 0, 1);
-        };
-        float const a = random.in(-3, 3), scale = random.in(0.5f, 3);
-        s.bumpTextureMatrix = turn(a, scale);
-        s.bumpTextureMatrixInverse = turn(-a, 1 / scale);
-        s.bumpUVMatrix = Mat3f(s.bumpTextureMatrix);
-        g.state.objectToWorld = turn(random.in(-3, 3), 2);
-        test::setAttribute(g.state, 8, Vec3f(1, 0, 0)); // uv = object xy
-        test::setAttribute(g.state, 20, Vec3f(0, 1, 0));
-        // Angular: the cylinder's wall, seen from where its normal is; others: the xy plane.
-        Vec3f object(random.in(-1, 1), random.in(-1, 1), random.in(-1, 1));
-        Vec3f normal(0, 0, 1);
-        if (mode == 4) {
-            // tangentU is taken about the origin: far out, it and the seam's axis agree.
-            object = object * 1e4f;
-            normal = normalize(Vec3f(object.x, object.y, 0));
-        }
-        g.state.Pref = object;
-        g.state.Nref = normal;
-        Vec3f const n = normalize(transformDirection(g.state.objectToWorld, normal));
-        g.state.N = g.state.Ng = n;
-        g.state.I = -n;
-        g.state.rayType = i % 3 ? 1 : 32; // whatever the ray
-        Vec3f seen(0, 0, 0);
-        g.host.onOcclusion = [&](Vec3f, Vec3f N) { return seen = N, Vec3f(1, 1, 1); };
-        g.shade();
-        EXPECT_NEAR(dot(seen, n), std::sqrt(0.5f), 1e-5f) << "mode " << mode;
-        // A step along the lean, on the surface, must raise that texture coordinate by most.
-        Vec3f const lean = normalize(seen - dot(seen, n) * n);
-        Mat3f back(g.state.objectToWorld); // transposed: a rotation's inverse, up to scale
-        std::swap(back.m[1], back.m[3]);
-        Vec3f const step = transformDirection(back, lean) * (mode == 4 ? 10.0f : 1e-2f);
-        auto const coordinate = [&](Vec3f p) {
-            Picture probe([](Vec2f at) { return Vec4f(at.x, at.y, 0, 1); });
-            TextureSampler2D sampler;
-            sampler.texture = &probe;
-            Vec3i axes;
-            Vec3f u, v;
-            Vec4f const t =
-                s.f_evalMapping(nullptr, g.state, mode, {}, sampler, s.bumpTextureMatrix, 1, p,
-                                normal, false, {p.x, p.y}, axes, u, v, s.bumpUVMatrix);
-            return Vec2f(t.x, t.y);
-        };
-        Vec2f const rise = coordinate(object + step) - coordinate(object);
-        if (mode == 4 && std::fabs(rise.x) > 0.5f)
-            continue; // across the seam
-        float const along = alongU ? rise.x : rise.y, across = alongU ? rise.y : rise.x;
-        EXPECT_GT(along, 0.0f) << "mode " << mode;
-        if (mode != 4) {
-            EXPECT_LT(std::fabs(across), 1e-3f * along) << "mode " << mode;
-        }
-    }
+    // mode, normal of the object, position: world directions of rising u and v
+    for (test::Line const& c : test::table(R"(
+        uv           | | 1  0 0 1  0 0 0   0 0 1   -1 0 0
+        planar       | | 2  0 0 1  0 0 0   0 0 1   -1 0 0
+        box, z       | | 3  0 0 1  0 0 0   0 0 1   -1 0 0
+        box, y       | | 3  0 -1 0  0 0 0  0 -1 0  -1 0 0
+        cylinder, x  | | 4  1 0 0  9 0 0   0 0 -1  0 -1 0
+        cylinder, -y | | 4  0 -1 0  0 -9 0 -1 0 0  0 -1 0)"))
+        for (int const along : {0, 1})
+            for (std::uint32_t const rayType : {1u, 32u}) { // whatever the ray
+                Picture bump(
+                    [&](Vec2f) { return Vec4f(along ? 0.5f : 1, along ? 1 : 0.5f, 1, 1); });
+                Ground g;
+                BackgroundGeometry& s = g.shader;
+                s.bumpMode = static_cast<int>(c.want[0]);
+                s.bumpTexture.texture = &bump;
+                s.bumpTextureMatrix = Mat4f(0, -2, 0, 0, 2, 0, 0, 0, 0, 0, 2, 0, 0, 0, 0, 1);
+                s.bumpTextureMatrixInverse =
+                    Mat4f(0, 0.5f, 0, 0, -0.5f, 0, 0, 0, 0, 0, 0.5f, 0, 0, 0, 0, 1);
+                s.bumpUVMatrix = Mat3f(s.bumpTextureMatrix);
+                g.state.objectToWorld = Mat4f(3, 0, 0, 0, 0, 0, 3, 0, 0, -3, 0, 0, 0, 0, 0, 1);
+                test::setAttribute(g.state, 8, Vec3f(1, 0, 0)); // uv = object xy
+                test::setAttribute(g.state, 20, Vec3f(0, 1, 0));
+                g.state.Nref = test::vec3(c.want, 1);
+                g.state.Pref = test::vec3(c.want, 4);
+                g.state.N = g.state.Ng =
+                    normalize(transformDirection(g.state.objectToWorld, g.state.Nref));
+                g.state.I = -g.state.N;
+                g.state.rayType = rayType;
+                Vec3f seen(0, 0, 0);
+                g.host.onOcclusion = [&](Vec3f, Vec3f N) { return seen = N, Vec3f(1, 1, 1); };
+                g.shade();
+                Vec3f const rise = test::vec3(c.want, along ? 10 : 7);
+                EXPECT_TRUE(test::near(seen, normalize(g.state.N + rise), 1e-5)) << c.why << along;
+            }
 }
 
 TEST(BackgroundGeometry, ReflectivityIsSplitBetweenBlurredAndSharp)
 {
-    test::Random random;
     Cube one([](Vec3f) { return Vec4f(1, 1, 1, 1); });
-    for (int i = 0; i < 200; ++i) {
+    Vec3f const reflectivity(0.1f, 0.2f, 0.3f);
+    for (bool const cube : {false, true}) {
         Ground g;
-        float const c = random.in(0.05f, 1);
-        g.state.I = {std::sqrt(1 - c * c), 0, -c};
+        g.state.I = {0.8f, 0, -0.6f};
         g.shader.diffuseColor = {0, 0, 0};
-        g.shader.specularColor = {0.1f, 0.2f, 0.3f};
+        g.shader.specularColor = reflectivity;
         g.host.onTrace = [](Vec3f, Vec3f) { return Vec3f(1, 1, 1); };
         g.shader.specularCube.texture = &one;
-        g.shader.useCubeReflection = i % 2;
+        g.shader.useCubeReflection = cube;
         g.shader.reflectCube.texture = &one;
-        EXPECT_TRUE(shows(g, Vec3f(0.1f, 0.2f, 0.3f))); // in a white room, the reflectivity
-        EXPECT_EQ(g.host.count("traceReflection"), i % 2 ? 0 : 1);
+        EXPECT_TRUE(shows(g, reflectivity)); // in a white room
+        EXPECT_EQ(g.host.count("traceReflection"), !cube);
         g.shader.specularCube = {};
-        float const sharp = std::pow(1 - c, 5.0f); // only the sharp share is left
-        EXPECT_TRUE(shows(g, Vec3f(0.1f, 0.2f, 0.3f) * sharp));
-        if (i % 2 == 0) {
+        float const sharp = 0.01024f; // (1 - 0.6)^5: only the sharp share is left
+        EXPECT_TRUE(shows(g, reflectivity * sharp));
+        if (!cube) {
             EXPECT_NEAR(g.host.calls.back().scalars[0], 0.3f * sharp, 1e-6f) << "importance";
         }
         g.state.rayType = 32;
@@ -261,19 +222,20 @@ TEST(BackgroundGeometry, GradesContrastThenGainThenSaturation)
 
 TEST(BackgroundGeometry, ShadowRaysStopAtGroundThatFacesUp)
 {
-    struct Case {
-        std::uint32_t rayType;
-        float nz, want;
-    };
-    constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
-    constexpr Case kCases[] = {{16, 0.9f, 0}, {16, 0.89f, 1}, {16, 1, 0}, {16, -1, 1},
-                               {16, kNan, 0}, {1, 1, 1},      {32, 1, 1}};
-    for (Case const& c : kCases) {
+    // ray type, height of the normal, light that passes
+    constexpr float kCases[][3] = {{16, 0.9f, 0},
+                                   {16, 0.89f, 1},
+                                   {16, 1, 0},
+                                   {16, -1, 1},
+                                   {16, std::numeric_limits<float>::quiet_NaN(), 0},
+                                   {1, 1, 1},
+                                   {32, 1, 1}};
+    for (auto const& [rayType, height, want] : kCases) {
         Ground g;
-        g.state.rayType = c.rayType;
-        g.state.N = {0, 0, c.nz};
+        g.state.rayType = static_cast<std::uint32_t>(rayType);
+        g.state.N = {0, 0, height};
         g.shader.transmission(&g.host, g.state);
-        EXPECT_EQ(g.state.transmissionColor, Vec3f(c.want, c.want, c.want)) << c.nz;
+        EXPECT_EQ(g.state.transmissionColor, grey(want)) << height;
     }
     Ground g;
     g.shader.sample(&g.host, g.state);

@@ -1,301 +1,198 @@
+// Numbers of the tables: Walter et al. 2007, eq. 21, 33 and 34, and Schlick's reflectance, in
+// double precision, for an index of 1.5 and a reflectance of 1/4.
 #include "materials/physical/corvid_Mtl_Dielectric.h"
-#include "support/reference.h"
-#include "support/scriptedHost.h"
+#include "support/textTable.h"
 
 namespace zsi {
 namespace {
 
-using test::D3;
-using test::minus;
-using test::plus;
-using test::times;
-
-corvid_Mtl_Dielectric randomGlass(test::Random& random)
-{
-    corvid_Mtl_Dielectric glass;
-    glass.maskingMode = -1;
-    glass.u_ior = random.in(1.3f, 1.9f);
-    glass.u_reflectance = random.in(0, 0.5f);
-    glass.u_roughValue = random.in(0.05f, 0.8f);
-    glass.u_reflectColor = random.color();
-    glass.u_refractColor = random.color();
-    glass.u_absorptionCoef = random.color();
-    return glass;
-}
-
-struct Indices {
-    double outer, inner;
+/// The tangent leans out of the surface and the object is turned: in the world, the frame of the
+/// front is (0, 1, 0), (-1, 0, 0), (0, 0, 1). The geometric normal is not the shading normal.
+struct Glass : test::Trial<corvid_Mtl_Dielectric> {
+    explicit Glass(Vec3f I)
+    {
+        shader.maskingMode = -1;
+        shader.u_ior = 1.5f;
+        shader.u_reflectance = 0.25f;
+        state.I = I;
+        state.Ng = {0, 0.28f, 0.96f};
+        state.objectToWorld = Mat4f(0, 2, 0, 0, -2, 0, 0, 0, 0, 0, 2, 0, 9, 9, 9, 1);
+        test::setAttribute(state, 36, Vec3f(1, 0, 1));
+        test::setAttribute(state, 48, Vec2f(0.5f, 0.25f));
+    }
 };
-Indices indicesOf(corvid_Mtl_Dielectric const& glass, ShadeState const& s, bool front)
-{
-    return front ? Indices{double(s.incomingIor), double(glass.u_ior)}
-                 : Indices{double(glass.u_ior), double(s.beyondIor)};
-}
-
-/// Walter et al. 2007, eq. 21, with V in the outer medium.
-double transmittedOf(double a2, D3 v, D3 l, Indices n)
-{
-    D3 const h = test::unitOf(times(plus(times(l, n.inner), times(v, n.outer)), -1));
-    double const i = inner(v, h), o = inner(l, h);
-    return smithG1(a2, v, h) * smithG1(a2, l, h) * test::ggxOf(a2, h.z) * n.inner * n.inner
-        * std::fabs(i * o) / (std::fabs(v.z * l.z) * std::pow(n.outer * i + n.inner * o, 2));
-}
 
 TEST(Dielectric, TransferIsTheFacetModelOnBothSides)
 {
-    test::Random random;
-    test::ScriptedHost host;
-    int transmitted = 0;
-    for (int i = 0; i < 8000; ++i) {
-        corvid_Mtl_Dielectric const glass = randomGlass(random);
-        bool const front = i % 2;
-        ShadeState s = test::randomHit(random, front);
-        test::DFrame const frame = test::frameOf(s, front ? 1 : -1);
-        D3 const v = frame.in(times(s.I, -1));
-        // Half of the directions about straight on, where transmission is.
-        s.sampleDirection = i % 4 < 2 ? random.unit() : normalize(s.I + random.unit() * 0.6f);
-        D3 const l = frame.in(s.sampleDirection);
-        if (std::fabs(l.z) < 1e-2)
-            continue;
-        glass.transfer(&host, s);
-        double const r = double(glass.u_roughValue),
-                     F = test::schlickOf(double(glass.u_reflectance), v.z);
-        double const through = transmittedOf(r * r, v, l, indicesOf(glass, s, front));
-        double const want =
-            F * reflectedOf(r * r, v, l, test::unitOf(plus(v, l))) + (1 - F) * through;
-        // 1e-7 of rounding in h, over the width of the lobe (0.05 at least) and the length of the
-        // unnormalised half-vector (0.1 at least for these indices).
-        EXPECT_NEAR(double(s.outBrdf.x), want, 1e-3 * want + 1e-6) << front;
-        EXPECT_EQ(s.outBrdf, grey(s.outBrdf.x)) << "no tint";
-        EXPECT_NEAR(double(s.sampleCosine), std::fabs(l.z), 1e-4);
-        transmitted += through > 1e-3;
+    // I, direction, index, index outside: value
+    for (test::Line const& c : test::table(R"(
+        mirror                        | | 0.6,0,-0.8  0.6,0,0.8       1.5 1     0.1164087
+        off the mirror                | | 0.6,0,-0.8  0,0.6,0.8       1.5 1     0.04231901
+        as Snell bends                | | 0.6,0,-0.8  0.4,0,-0.916515 1.5 1     6.214723
+        straight on                   | | 0.6,0,-0.8  0.6,0,-0.8      2   1.25  2.293094
+        from inside, reflected        | | 0.6,0,0.8   0,0.6,-0.8      1.5 1     0.04231901
+        from inside nothing comes out | | 0.6,0,0.8   0.6,0,0.8       1.5 1.25  0)")) {
+        Glass g(test::vec3(c.want));
+        g.shader.u_ior = c.want[6];
+        g.shader.u_roughValue = 0.5f;
+        (g.state.I.z < 0 ? g.state.incomingIor : g.state.beyondIor) = c.want[7];
+        g.state.sampleDirection = test::vec3(c.want, 3);
+        g.shader.transfer(&g.host, g.state);
+        EXPECT_TRUE(test::near(g.state.outBrdf, grey(c.want[8]), 1e-5 * double(c.want[8])))
+            << c.why;
+        EXPECT_NEAR(g.state.sampleCosine, std::fabs(c.want[5]), 1e-6f) << c.why;
     }
-    EXPECT_GT(transmitted, 300);
 }
 
-TEST(Dielectric, SamplesWhatTheStepsSay)
+/// Facets are drawn from the first two numbers, the event from the last.
+TEST(Dielectric, SamplesFacetThenEvent)
 {
-    test::Random random;
-    int seen[4] = {}; // polished, rough, ended by the facet, totally reflected
-    for (int i = 0; i < 12000; ++i) {
-        corvid_Mtl_Dielectric glass = randomGlass(random);
-        bool const front = i % 2, mayReflect = i % 3, mayTransmit = (i / 3) % 3;
-        if (i % 5 == 0)
-            glass.u_roughValue = i % 10 ? 0.01f : 0.0099f;
-        ShadeState s = test::randomHit(random, front);
-        if (i % 7 == 0)
-            s.incomingIor = 2.4f; // from the denser side, so that facets reflect totally too
-        s.allowReflection[i % 3 ? i % 2 : 2] = mayReflect;
-        s.allowTransmission[i % 3] = mayTransmit;
-        test::ScriptedHost host;
-        double const u[3] = {0.875 * double(random.in(0, 1)), double(random.in(0, 1)),
-                             double(random.in(0, 1))};
-        bool const rough = front && glass.u_roughValue >= 0.01f;
-        host.randoms = {float(u[0]), float(u[1]), float(u[2])};
-        if (!rough)
-            host.randoms = {float(u[2])};
-        ShadeState const before = s;
-        glass.sample(&host, s);
-
-        test::DFrame const frame = test::frameOf(s, front ? 1 : -1);
-        D3 const v = frame.in(times(s.I, -1));
-        double const r = double(glass.u_roughValue), a2 = r * r;
-        Indices const n = indicesOf(glass, before, front);
-        double const eta = n.outer / n.inner;
-        D3 m(0, 0, 1);
-        if (rough) {
-            double const t = std::sqrt(a2 * u[0] / (1 - u[0])), phi = 2 * std::numbers::pi * u[1];
-            m = times({t * std::cos(phi), t * std::sin(phi), 1}, 1 / std::sqrt(1 + t * t));
+    // I, roughness, reflection and transmission allowed, numbers drawn (-1: none): type, direction,
+    // value, index of the medium that it goes on in
+    for (test::Line const& c : test::table(R"(
+        nothing allowed    | | 0.6,0,-0.8 0       0 0 -1 -1 -1      0
+        reflection         | | 0.6,0,-0.8 0       1 0 -1 -1 -1      32 0.6,0,0.8        0.25024 1
+        refraction         | | 0.6,0,-0.8 0       0 1 -1 -1 -1      32 0.4,0,-0.916515  0.74976 1.5
+        chance             | | 0.6,0,-0.8 0       1 1 0.2501 -1 -1  32 0.6,0,0.8        1 1
+        other chance       | | 0.6,0,-0.8 0       1 1 0.2503 -1 -1  32 0.4,0,-0.916515  1 1.5
+        a tie reflects     | | 0,0,-1     0       1 1 0.25 -1 -1    32 0,0,1            1 1
+        0.01 is rough      | | 0,0,-1     0.01    1 0 0 0 -1        16 0,0,1            0.25 1
+        less is not        | | 0,0,-1     0.00999 1 0 -1 -1 -1      32 0,0,1            0.25 1
+        out, never rough   | | 0.28,0,0.96 0.5    0 1 -1 -1 -1      32 0.35,0,0.936750  0.75 1.2
+        total              | | 0.96,0,0.28 0.5    1 1 0.99 -1 -1    32 0.96,0,-0.28     1 1.5
+        total, not allowed | | 0.96,0,0.28 0.5    0 1 -1 -1 -1      0
+        rough reflection   | | 0.6,0,-0.8 0.5     1 0 0.5 0.25 -1   16 -0.28,0,0.96     0.331015 1
+        rough refraction   | | 0.6,0,-0.8 0.5     1 1 0.5 0.25 0.5  16 0.550689,0,-0.834711 1.295456 1.5
+        weight of 7 ends at 4 | | 0,-0.998749,-0.05 0.2 1 0 0.95 0 -1   16 0,-0.0866601,0.996238 3.321343 1
+        facet faces away   | | 0,-0.998749,-0.05 0.2 1 0 0.95 0.5 -1 0)"))
+        for (int which : {0, 1, 2}) { // any of the three switches
+            SCOPED_TRACE(c.why);
+            Glass g(test::vec3(c.want));
+            g.shader.u_roughValue = c.want[3];
+            g.state.beyondIor = 1.2f;
+            g.state.allowReflection[which] = c.want[4] != 0;
+            g.state.allowTransmission[2 - which] = c.want[5] != 0;
+            g.host.randoms = {c.want[6], c.want[7], c.want[8], -1};
+            auto const drawn = std::find(g.host.randoms.begin(), g.host.randoms.end(), -1.0f);
+            g.shader.sample(&g.host, g.state);
+            EXPECT_EQ(g.host.randomCalls, drawn - g.host.randoms.begin());
+            ASSERT_EQ(g.state.sampleType, static_cast<unsigned>(c.want[9]));
+            if (g.state.sampleType == 0)
+                continue;
+            EXPECT_TRUE(test::near(g.state.sampleDirection, test::vec3(c.want, 10), 2e-6));
+            EXPECT_TRUE(test::near(g.state.outBrdf, grey(c.want[13]), 1e-5));
+            EXPECT_EQ(g.state.beyondIor, c.want[14]);
+            EXPECT_EQ(g.state.sampleCosine * g.state.sampleInvPdf, 1);
         }
-        double const c = inner(v, m), F = test::schlickOf(double(glass.u_reflectance), v.z);
-        bool refracts = mayReflect && mayTransmit ? F < u[2] : mayTransmit;
-        double weight = mayReflect && mayTransmit ? 1 : mayReflect ? F : 1 - F;
-        double const k = (c * c - 1) * eta * eta + 1;
-        if (std::fabs(c) < 1e-4 || std::fabs(k) < 1e-4 || std::fabs(F - u[2]) < 1e-5)
-            continue; // too near to a decision for single precision
-        bool const total = refracts && k < 0;
-        if ((!mayReflect && !mayTransmit) || c < 0 || (total && !mayReflect)) {
-            EXPECT_EQ(s.sampleType, 0u);
-            ++seen[2];
-            continue;
-        }
-        if (total) {
-            refracts = false;
-            weight = 1;
-            ++seen[3];
-        }
-        D3 d = minus(times(m, 2 * c), v);
-        if (refracts)
-            d = test::unitOf(minus(times(m, eta * c - std::sqrt(k)), times(v, eta)));
-        if (std::fabs(d.z) < 1e-3)
-            continue;
-        if (rough) {
-            double const w = c * smithG1(a2, v, m) * smithG1(a2, d, m) / (v.z * m.z);
-            weight *= w < 0 ? 0 : w > 4 ? 4 : w;
-        }
-        ++seen[rough];
-        EXPECT_EQ(s.sampleType, rough ? 16u : 32u);
-        EXPECT_EQ(s.sampleCosine, 1);
-        EXPECT_EQ(s.sampleInvPdf, 1);
-        EXPECT_EQ(double(s.beyondIor), refracts ? n.inner : n.outer) << "the medium it goes on in";
-        // sqrt(k) with k of 1e-4 at least carries 1e-7 / 1e-2; tangents may be short.
-        EXPECT_LT(test::distance(s.sampleDirection, frame.out(d)), 2e-4);
-        EXPECT_NEAR(double(s.outBrdf.y), weight, 1e-3 * weight + 1e-5);
-        EXPECT_EQ(s.outBrdf, grey(s.outBrdf.y));
-    }
-    for (int n : seen)
-        EXPECT_GT(n, 200);
 }
 
-TEST(Dielectric, ShadesLightsReflectionAndAbsorbedRefractionAndLetsShadowRaysThrough)
+TEST(Dielectric, ShadesLightsReflectionAndAbsorbedRefraction)
 {
-    test::Random random;
-    int totals = 0;
-    for (int i = 0; i < 4000; ++i) {
-        corvid_Mtl_Dielectric glass = randomGlass(random);
-        bool const front = i % 2, mapped = i % 5 == 0;
-        glass.u_falloffEnable = i % 3;
-        if (i % 13 == 0)
-            glass.u_refractColor = {0, 0, 0};
-        Vec3f const texel = {random.in(0.2f, 1), random.in(0.2f, 1), random.in(0.2f, 1)};
-        test::FunctionTexture<Vec2f> map([&](Vec2f) { return withAlpha(texel, 1); });
-        glass.u_transmittanceMapEnable = mapped;
-        glass.u_transmittanceMap.texture = &map;
-        glass.u_transmittanceAmount = 0.5f;
-        ShadeState s = test::randomHit(random, front);
-        test::ScriptedHost host;
-        Vec3f const color = random.color(), L = random.unit();
-        host.addLight(L, color, {0.5f, 1, 1}, 0.75f);
-        host.onTrace = [](Vec3f, Vec3f) { return Vec3f(0.5f, 0.25f, 1); };
-        glass.shade(&host, s);
-
-        // The frame keeps the normal as it is: from inside, F is 1 for the lights and then 0.
-        test::DFrame const frame = test::frameOf(s, 1);
-        D3 const v = frame.in(times(s.I, -1)), l = frame.in(L);
-        double const r = double(glass.u_roughValue);
-        double F = test::schlickOf(double(glass.u_reflectance), v.z);
-        Indices const n = indicesOf(glass, s, front);
-        D3 h = test::unitOf(plus(v, l));
-        if (h.z < 0)
-            h = times(h, -1);
-        double const value = F * reflectedOf(r, v, l, h) + (1 - F) * transmittedOf(r, v, l, n);
-        double want = value * 0.75 * test::fadeOf(test::dotOf(L, s.Ng)) * double(color.x * 0.5f);
-        ASSERT_EQ(host.calls[0].service, "getLightSamples");
-        EXPECT_EQ(host.calls[0].vectors[1], s.N);
-        F = front ? F : 0;
-        std::size_t next = 1;
-        if (front) {
-            test::Call const& ray = host.calls[next++];
-            ASSERT_EQ(ray.service, "traceSpecular");
-            EXPECT_EQ(ray.scalars[0], glass.u_roughValue);
-            EXPECT_NEAR(double(ray.scalars[1]), F * double(maxComponent(glass.u_reflectColor)),
-                        1e-6);
-            EXPECT_GT(test::dotOf(ray.vectors[1], s.Ng), 0.0499);
-            want += F * double(glass.u_reflectColor.x) * 0.5;
-        }
-        ASSERT_EQ(host.calls.size(), next + !(glass.u_refractColor == Vec3f(0, 0, 0)));
-        if (host.calls.size() > next) {
-            test::Call const& ray = host.calls[next];
-            ASSERT_EQ(ray.service, "traceRefraction");
-            EXPECT_EQ(ray.scalars[0], glass.u_roughValue);
-            double const weight = (1 - F) * double(glass.u_refractColor.x);
-            // Snell's law: what lies along the surface scales by the ratio of the indices.
-            D3 const I(s.I), N = times(s.N, front ? 1 : -1), got = ray.vectors[1];
-            D3 const across = minus(I, times(N, inner(I, N)));
-            double const sine2 = inner(across, across) * std::pow(n.outer / n.inner, 2);
-            if (sine2 > 1 + 1e-5) {
-                EXPECT_GT(inner(got, times(s.Ng, front ? 1 : -1)), 0.0499) << "back to I's side";
-                ++totals;
-            } else if (sine2 < 1 - 1e-5) {
-                D3 const snell =
-                    minus(times(across, n.outer / n.inner), times(N, std::sqrt(1 - sine2)));
-                EXPECT_LT(test::distance(got, snell), 1e-4);
+    // Rays bring (1, 1, 1); the light's weight is 3/4; absorption is along a path of 1/4.
+    // I, light, reflection and refraction colour, absorbs, mapped, refracted ray: result
+    for (test::Line const& c : test::table(R"(
+        light         | L   | 0.6,0,-0.8  0.6,0,0.8             0   0   1 1  0,0,0  0.0873066 0.0873066 0.0873066
+        low light     | L   | 0.6,0,-0.8  0.988686,0.042,0.144  0   0   1 1  0,0,0  0.0528830 0.0528830 0.0528830
+        light below   | L   | 0.6,0,-0.8  0.4,0,-0.916515       0   0   1 1  0,0,0  0 0 0
+        from outside  | LSR | 0.6,0,-0.8  0.4,0,-0.916515       0.5 0.5 1 1  0.4,0,-0.916515     0.5 0.37488 0.37488
+        from inside   | LR  | 0.28,0,0.96 0,0.28,0.96           0.5 0.5 0 1  0.42,0,0.907524     0.5 0.5 0.5
+        absorbed      | LR  | 0.28,0,0.96 0.4,0,-0.916515       0.5 1   1 0  0.42,0,0.907524     0.794328 0.630957 0.501187
+        by the map    | LR  | 0.28,0,0.96 0.4,0,-0.916515       0.5 1   1 1  0.42,0,0.907524     0.136008 0.517201 0.717124
+        total         | LR  | 0.96,0,0.28 0.4,0,-0.916515       0.5 1   0 0  0.96,0,-0.28        1 1 1)")) {
+        SCOPED_TRACE(c.why);
+        Glass g(test::vec3(c.want));
+        bool const front = g.state.I.z < 0, absorbs = c.want[8] != 0, mapped = c.want[9] != 0;
+        float const refracts = c.want[7];
+        test::FunctionTexture<Vec2f> map([](Vec2f) { return Vec4f(0.5f, 0.8f, 1, 1); });
+        g.shader.u_roughValue = 0.25f;
+        g.shader.u_reflectColor = {c.want[6], 0, 0};
+        g.shader.u_refractColor = grey(refracts);
+        g.shader.u_absorptionCoef = {0.4f, 0.8f, 1.2f};
+        g.shader.u_falloffEnable = absorbs;
+        g.shader.u_transmittanceMapEnable = mapped;
+        g.shader.u_transmittanceAmount = 0.5f;
+        g.shader.u_transmittanceMap.texture = &map;
+        g.state.P = {1, 2, 3};
+        g.state.E = {1, 2.25f, 3};
+        g.host.addLight(test::vec3(c.want, 3), {2, 1, 1}, {0.5f, 1, 1}, 0.75f);
+        g.host.onTrace = [](Vec3f, Vec3f) { return Vec3f(1, 1, 1); };
+        g.shade();
+        EXPECT_TRUE(test::near(g.state.Ci, withAlpha(test::vec3(c.want, 13), 1), 2e-6));
+        EXPECT_EQ(map.lookups.size(), !front && absorbs && mapped);
+        std::string calls = " ";
+        for (test::Call const& call : g.host.calls) {
+            bool const lights = call.service == "getLightSamples";
+            bool const refracted = call.service == "traceRefraction";
+            calls += lights ? 'L' : refracted ? 'R' : 'S';
+            EXPECT_EQ(call.vectors[0], g.state.P);
+            if (lights) {
+                EXPECT_EQ(call.vectors[1], g.state.N) << "as it is, from inside too";
+                continue;
             }
-            double sigma = double(glass.u_absorptionCoef.x);
-            if (mapped)
-                sigma = -std::log(0.5 * double(texel.x)) / sigma;
-            bool const absorbs = !front && glass.u_falloffEnable;
-            EXPECT_EQ(map.lookups.size(), absorbs && mapped) << "looked up where it counts only";
-            want += weight * 0.5 * (absorbs ? std::pow(10, -sigma * test::distance(s.P, s.E)) : 1);
+            Vec3f const d = refracted ? test::vec3(c.want, 10) : Vec3f(0.6f, 0, 0.8f);
+            EXPECT_TRUE(test::near(call.vectors[1], d, 1e-6));
+            EXPECT_EQ(call.scalars[0], 0.25f) << "spread";
+            float const F = front ? 0.25024f : 0;
+            EXPECT_NEAR(call.scalars[1], refracted ? refracts * (1 - F) : c.want[6] * F, 1e-6f);
         }
-        EXPECT_NEAR(double(s.Ci.x), want, 2e-4 * want + 1e-6);
+        EXPECT_EQ(calls, c.settings.substr(0, calls.size()));
 
         // Shadow rays are absorbed inside whatever the switch says, and know no map.
-        glass.transmission(&host, s);
-        double const faced = std::fabs(test::dotOf(s.N, s.I));
-        double left = 1 - test::schlickOf(double(glass.u_reflectance), faced);
-        if (!front)
-            left *= std::pow(10, -double(glass.u_absorptionCoef.y) * test::distance(s.P, s.E));
-        EXPECT_NEAR(double(s.transmissionColor.y), double(glass.u_refractColor.y) * left, 1e-5);
+        g.shader.transmission(&g.host, g.state);
+        float const left = front ? 0.74976f : (g.state.I.z > 0.5f ? 0.75f : 0.6048812f) * 0.630957f;
+        EXPECT_NEAR(g.state.transmissionColor.y, refracts * left, 1e-6f);
     }
-    EXPECT_GT(totals, 100);
 }
 
+/// Downhill is -x for the maps (slope 0.04 x 2 x 3.33), -y for the ripple (0.2 x 2 x 1.5 x 0.25),
+/// whose normal stays unnormalised.
 TEST(Dielectric, BendsItsFrameByTheFirstMapOrTheRippleThenTheSecondMap)
 {
-    struct Case {
-        char const* why;
-        bool first, second;
-        int ripple;
-        bool ripples;
-    };
-    constexpr Case kCases[] = {
-        {"other ripple modes", false, true, 2, false},
-        {"ripple", false, false, 1, true},
-        {"the first map stops the ripple", true, false, 1, false},
-        {"the second does not", false, true, 1, true},
-        {"both maps", true, true, 1, false},
-    };
-    for (Case const& c : kCases) {
+    // first map, second map, ripple mode: ripples, normal
+    for (test::Line const& c : test::table(R"(
+        other ripple modes             | | 0 1 2  0  -0.257422 0 0.966299
+        ripple                         | | 0 0 1  1  0 -0.15 1
+        the first map stops the ripple | | 1 0 1  0  -0.257422 0 0.966299
+        the second does not            | | 0 1 1  1  -0.254760 -0.143446 0.956306
+        both maps                      | | 1 1 1  0  -0.497492 0 0.867468)")) {
         SCOPED_TRACE(c.why);
+        bool const hasFirst = c.want[0] != 0, hasSecond = c.want[1] != 0;
         auto const slope = [](Vec2f p) { return Vec4f(40 * p.x, 0, 0, 1); };
         test::FunctionTexture<Vec2f> first(slope), second(slope);
-        test::Trial<corvid_Mtl_Dielectric> t;
+        Glass t({0, 0, -1});
+        t.state.objectToWorld = Mat4f::identity();
         t.host.onNoise = [](Vec4f p) { return 0.2f * p.y; };
         corvid_Mtl_Dielectric& glass = t.shader;
-        glass.u_normal0MapEnable = c.first;
-        glass.u_normal1MapEnable = c.second;
-        glass.u_procedureMapEnable = c.ripple;
+        glass.u_normal0MapEnable = hasFirst;
+        glass.u_normal1MapEnable = hasSecond;
+        glass.u_procedureMapEnable = int(c.want[2]);
         glass.u_normal0Map.texture = &first;
         glass.u_normal1Map.texture = &second;
         glass.u_normal0Transform = glass.u_normal1Transform = Mat3f::identity();
         glass.u_normal0UVScale = 0.5f;
         glass.u_normal0Amount = glass.u_normal1Amount = 2;
         glass.u_procedureMapAmount = 0.25f;
-        test::setAttribute(t.state, 36, Vec3f(1, 0, 0));
-        test::setAttribute(t.state, 48, Vec2f(0.5f, 0.25f));
-        t.shade();
-        std::size_t const firstLookups = c.first ? 3 : 0, secondLookups = c.second ? 3 : 0;
-        int const noises = c.ripples ? 6 : 0;
-        EXPECT_EQ(first.lookups.size(), firstLookups);
-        EXPECT_EQ(second.lookups.size(), secondLookups);
-        EXPECT_EQ(t.host.noiseCalls, noises);
-        EXPECT_TRUE(!c.first || first.lookups[0].x == 0.25f) << "its own scale";
-        EXPECT_TRUE(!c.second || second.lookups[0].x == 0.5f) << "always scale 1";
-        // Downhill is -x for the maps (0.04 x 2 x 3.33), -y for the ripple, which stays
-        // unnormalised.
-        test::DFrame frame({1, 0, 0}, {0, 0, 1}, Mat4f::identity());
-        if (c.first)
-            frame.bend(-0.04 * 2 * 3.33, 0, true);
-        if (c.ripples)
-            frame.bend(0, -0.2 * 2 * 1.5 * 0.25, false);
-        if (c.second)
-            frame.bend(-0.04 * 2 * 3.33, 0, true);
-        EXPECT_TRUE(test::near(t.host.calls[0].vectors[1], frame.n, 1e-4));
-
-        // `sample` reads the bumps, then the roughness, and draws at last.
+        // `sample` reads the bumps, then the roughness, and draws at last; `shade` in that order.
+        std::string order;
+        first.texel = [&](Vec2f p) { return order += "1", slope(p); };
+        second.texel = [&](Vec2f p) { return order += "2", slope(p); };
         test::FunctionTexture<Vec2f> rough([&](Vec2f) {
-            EXPECT_EQ(first.lookups.size(), 2 * firstLookups);
-            EXPECT_EQ(second.lookups.size(), 2 * secondLookups);
-            EXPECT_EQ(t.host.noiseCalls, 2 * noises);
             EXPECT_EQ(t.host.randomCalls, 0);
-            return Vec4f(0.5f, 0, 0, 1);
+            EXPECT_EQ(t.host.noiseCalls % 12, c.want[3] != 0 ? 6 : 0);
+            t.host.noiseCalls = 0;
+            return order += "r", Vec4f(0.5f, 0, 0, 1);
         });
         glass.u_roughMapEnable = true;
         glass.u_roughMap.texture = &rough;
+        t.shade();
+        EXPECT_TRUE(!hasFirst || first.lookups[0].x == 0.25f) << "its own scale";
+        EXPECT_TRUE(!hasSecond || second.lookups[0].x == 0.5f) << "always scale 1";
+        EXPECT_TRUE(test::near(t.host.calls[0].vectors[1], test::vec3(c.want, 4), 1e-4));
         t.state.allowReflection[0] = t.state.allowTransmission[0] = 1;
         glass.sample(&t.host, t.state);
-        EXPECT_EQ(rough.lookups.size(), 1u);
+        std::string const once =
+            std::string(hasFirst ? "111" : "") + (hasSecond ? "222" : "") + "r";
+        EXPECT_EQ(order, once + once);
         EXPECT_EQ(t.host.randomCalls, 3);
     }
 }
@@ -304,28 +201,23 @@ TEST(Dielectric, BendsItsFrameByTheFirstMapOrTheRippleThenTheSecondMap)
 /// indices, a ripple's long normal under wide facets.
 TEST(Dielectric, DegenerateInputIsNeutral)
 {
-    Vec3f const kMirror(0.6f, 0, 0.8f), kThrough(0.6f, 0, -0.8f);
-    for (float rough : {0.0f, 1e-30f, 4.0f})
-        for (float ior : {1.0f, 1.5f})
-            for (Vec3f tangent : {Vec3f(1, 0, 0), Vec3f(0, 0, 1), Vec3f(0, 0, 0)})
-                for (int ripple : {0, 1}) {
-                    test::Trial<corvid_Mtl_Dielectric> t;
-                    t.shader.u_roughValue = rough;
-                    t.shader.u_ior = ior;
-                    t.shader.u_procedureMapEnable = ripple;
-                    t.shader.u_procedureMapAmount = 3;
-                    t.host.onNoise = [](Vec4f p) { return 0.5f * p.x; };
-                    t.state.I = kThrough;
-                    test::setAttribute(t.state, 36, tangent);
-                    t.host.addLight(kMirror, {1, 1, 1});
-                    t.host.addLight(kThrough, {1, 1, 1});
-                    EXPECT_TRUE(std::isfinite(t.shade().x)) << rough << ior << ripple;
-                    for (Vec3f const& d : {kMirror, kThrough}) {
-                        t.state.sampleDirection = d;
-                        t.shader.transfer(&t.host, t.state);
-                        EXPECT_TRUE(std::isfinite(t.state.outBrdf.x)) << rough << ior << ripple;
-                    }
-                }
+    Vec3f const mirrored(0.6f, 0, 0.8f), straight(0.6f, 0, -0.8f),
+        tangents[] = {{1, 0, 0}, {0, 0, 1}};
+    for (int i = 0; i < 24; ++i) {
+        Glass g(straight);
+        g.shader.u_roughValue = i % 3 == 0 ? 0.0f : i % 3 == 1 ? 1e-30f : 4.0f;
+        g.shader.u_ior = i & 4 ? 1 : 1.5f;
+        g.shader.u_procedureMapEnable = i / 12;
+        g.shader.u_procedureMapAmount = 3;
+        g.host.onNoise = [](Vec4f p) { return 0.5f * p.x; };
+        test::setAttribute(g.state, 36, tangents[i % 2]);
+        for (Vec3f const& d : {mirrored, straight}) {
+            g.host.addLight(d, {1, 1, 1});
+            g.state.sampleDirection = d;
+            g.shader.transfer(&g.host, g.state);
+            EXPECT_TRUE(std::isfinite(g.shade().x + g.state.outBrdf.x)) << i;
+        }
+    }
 }
 
 } // namespace

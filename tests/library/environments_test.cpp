@@ -1,19 +1,16 @@
 #include "environments/corvid_Env_Backplate.h"
 #include "environments/corvid_Env_Default.h"
-#include "support/scriptedHost.h"
+#include "support/textTable.h"
 
 namespace zsi {
 namespace {
-
-using Picture = test::FunctionTexture<Vec2f>;
-using Cube = test::FunctionTexture<Vec3f>;
 
 constexpr Vec4f kFlat(0, 0.5f, 0.7f, 0);
 
 template <class Environment>
 struct Sky {
-    Cube reflection{[](Vec3f) { return Vec4f(0.5f, 0.25f, 1, 0.3f); }};
-    Cube diffuse{[](Vec3f) { return Vec4f(2, 4, 8, 0.6f); }};
+    test::FunctionTexture<Vec3f> reflection{[](Vec3f) { return Vec4f(0.5f, 0.25f, 1, 0.3f); }};
+    test::FunctionTexture<Vec3f> diffuse{[](Vec3f) { return Vec4f(2, 4, 8, 0.6f); }};
     Environment shader;
     ShadeState state = test::plainHit();
 
@@ -24,10 +21,10 @@ struct Sky {
         shader.globalIBLMatrix = Mat3f::identity();
         state.maxRayDepth = 3;
     }
-    Vec4f look(std::uint32_t rayType, std::uint32_t depth = 0)
+    Vec4f look(float rayType, float depth = 0)
     {
-        state.rayType = rayType;
-        state.rayDepth = depth;
+        state.rayType = static_cast<std::uint32_t>(rayType);
+        state.rayDepth = static_cast<std::uint32_t>(depth);
         shader.shade(nullptr, state); // no service is asked
         return state.Ci;
     }
@@ -35,23 +32,15 @@ struct Sky {
 
 TEST(DefaultEnvironment, RayTypeAndDepthChooseWhatARaySees)
 {
-    enum Seen { kBackground, kReflection, kDiffuse };
-    struct Case {
-        std::uint32_t rayType, depth;
-        Seen want;
-    };
-    constexpr Case kCases[] = {
-        {1, 0, kBackground},  {4, 2, kBackground}, {16, 0, kBackground}, {0, 0, kBackground},
-        {34, 0, kBackground}, {2, 0, kReflection}, {2, 3, kReflection},  {32, 2, kDiffuse},
-        {32, 3, kReflection}, {1, 3, kReflection}, {16, 9, kReflection},
-    };
     constexpr Vec4f kWant[] = {kFlat, {0.5f, 0.25f, 1, 1}, {2, 4, 8, 1}};
-    for (Case const& c : kCases) {
-        SCOPED_TRACE("ray type " + std::to_string(c.rayType) + " depth " + std::to_string(c.depth));
+    // ray type, depth of 3; 0: background, 1: reflection, 2: diffuse
+    constexpr float kCases[][3] = {{1, 0, 0},  {4, 2, 0}, {16, 0, 0}, {0, 0, 0},
+                                   {34, 0, 0}, {2, 0, 1}, {2, 3, 1},  {32, 2, 2},
+                                   {32, 3, 1}, {1, 3, 1}, {16, 9, 1}};
+    for (auto const& [rayType, depth, seen] : kCases) {
         Sky<corvid_Env_Default> sky;
-        EXPECT_TRUE(test::near(sky.look(c.rayType, c.depth), kWant[c.want], 1e-6));
-        EXPECT_EQ(sky.reflection.lookups.size(), c.want == kReflection);
-        EXPECT_EQ(sky.diffuse.lookups.size(), c.want == kDiffuse);
+        EXPECT_TRUE(test::near(sky.look(rayType, depth), kWant[int(seen)], 1e-6)) << rayType;
+        EXPECT_EQ(sky.reflection.lookups.size() + 2 * sky.diffuse.lookups.size(), unsigned(seen));
     }
 }
 
@@ -65,55 +54,38 @@ TEST(DefaultEnvironment, RotatesTheDirectionRowByRowAndSwapsTheAxes)
     EXPECT_EQ(sky.reflection.lookups[0], Vec3f(321, 98700, -6540));
 }
 
-struct Grade {
-    Vec2f contrast;
-    int gainMode;
-    Vec3f gain;
-    float saturation;
-
-    explicit Grade(test::Random& random)
-        : contrast(random.in(0, 1), random.in(0, 2))
-        , gainMode(static_cast<int>(random.in(0, 4))) // 3 is none
-        , gain(random.color())
-        , saturation(random.in(0, 2))
-    {
-    }
-    /// The arithmetic in its stated order, in single precision.
-    Vec3f operator()(Vec3f c, Vec3f f) const
-    {
-        float const lift = contrast.x * (1.0f - contrast.y);
-        c = {c.x * contrast.y + lift, c.y * contrast.y + lift, c.z * contrast.y + lift};
-        if (gainMode == 2)
-            c = gain * (c.z * f.z + (c.x * f.x + c.y * f.y));
-        else if (gainMode == 1)
-            c = c * gain;
-        float const m = ((f.x * c.x + f.y * c.y) + f.z * c.z) * (1.0f - saturation);
-        return {c.x * saturation + m, c.y * saturation + m, c.z * saturation + m};
-    }
-};
-
-TEST(DefaultEnvironment, GradesEachCubeByItsOwnControlsToTheBit)
+/// Both environments, each cube by its own controls: the other's change nothing.
+template <class Environment>
+void expectGrades()
 {
-    test::Random random;
-    for (int i = 0; i < 2000; ++i) {
-        Sky<corvid_Env_Default> sky;
-        Vec3f const texel = random.color() * 9;
-        sky.reflection.texel = sky.diffuse.texel = [&](Vec3f) { return withAlpha(texel, 0); };
-        corvid_Env_Default& s = sky.shader;
-        Vec3f const factors = s.IBLLuminanceFactors = random.color();
-        Grade const r(random), d(random);
-        s.reflectIBLContrast = r.contrast;
-        s.reflectIBLGainMode = r.gainMode;
-        s.reflectIBLGain = r.gain;
-        s.reflectIBLSaturation = r.saturation;
-        s.diffuseIBLContrast = d.contrast;
-        s.diffuseIBLGainMode = d.gainMode;
-        s.diffuseIBLGain = d.gain;
-        s.diffuseIBLSaturation = d.saturation;
-        ASSERT_EQ(rgb(sky.look(2)), r(texel, factors));
-        ASSERT_EQ(rgb(sky.look(32)), d(texel, factors));
-    }
+    // texel, contrast, gain mode, gain, saturation: colour, to the bit
+    for (test::Line const& c : test::table(R"(
+        none                    | | 8 4 16       0.5 1    0 9 9 9     1    8 4 16
+        contrast                | | 8 4 16       0.5 0.5  3 9 9 9     1    4.25 2.25 8.25
+        gain                    | | 8 4 16       0.5 1    1 2 0.5 4   1    16 2 64
+        gain of luminance       | | 8 4 16       0.5 1    2 2 0.5 4   1    12 3 24
+        saturation              | | 8 4 16       0.5 1    0 9 9 9     0.5  7 5 11
+        all, in order           | | 8 4 16       0.5 0.5  1 2 0.5 4   0.5  7.65625 3.96875 19.90625
+        x and y are added first | | 1 4e8 -16e8  0.5 1    2 1 1 1     1    0 0 0
+        nothing is clamped      | | 8 4 16       0.5 -1   0 9 9 9     1    -7 -3 -15)"))
+        for (bool const reflects : {false, true}) {
+            Sky<Environment> sky;
+            auto const at = [&](std::size_t i) { return c.want[i]; };
+            sky.reflection.texel =
+                sky.diffuse.texel = [&](Vec3f) { return withAlpha(test::vec3(c.want), 0); };
+            Environment& s = sky.shader;
+            s.IBLLuminanceFactors = {0.25f, 0.5f, 0.125f};
+            (reflects ? s.reflectIBLContrast : s.diffuseIBLContrast) = Vec2f(at(3), at(4));
+            (reflects ? s.reflectIBLGainMode : s.diffuseIBLGainMode) = int(at(5));
+            (reflects ? s.reflectIBLGain : s.diffuseIBLGain) = test::vec3(c.want, 6);
+            (reflects ? s.reflectIBLSaturation : s.diffuseIBLSaturation) = at(9);
+            EXPECT_EQ(rgb(sky.look(reflects ? 2 : 32)), test::vec3(c.want, 10)) << c.why;
+            EXPECT_EQ(rgb(sky.look(reflects ? 32 : 2)), test::vec3(c.want)) << c.why;
+        }
 }
+
+TEST(DefaultEnvironment, GradesEachCubeByItsOwnControls) { expectGrades<corvid_Env_Default>(); }
+TEST(Backplate, GradesEachCubeByItsOwnControls) { expectGrades<corvid_Env_Backplate>(); }
 
 TEST(DefaultEnvironment, MissingCubesAreBlackAndNanIsGradedNotHidden)
 {
@@ -126,8 +98,8 @@ TEST(DefaultEnvironment, MissingCubesAreBlackAndNanIsGradedNotHidden)
 }
 
 struct Plate : Sky<corvid_Env_Backplate> {
-    Picture image{[](Vec2f uv) { return Vec4f(uv.x, uv.y, 5, 0.9f); }};
-    Cube cube{[](Vec3f d) { return Vec4f(d.x, d.y, d.z, 0.9f); }};
+    test::FunctionTexture<Vec2f> image{[](Vec2f uv) { return Vec4f(uv.x, uv.y, 5, 0.9f); }};
+    test::FunctionTexture<Vec3f> cube{[](Vec3f d) { return withAlpha(d, 0.9f); }};
 
     Plate()
     {
@@ -139,7 +111,7 @@ struct Plate : Sky<corvid_Env_Backplate> {
         state.imageHeight = 480;
     }
     /// However deep the ray: this environment has no depth limit.
-    Vec4f lookAt(float x, float y, std::uint32_t rayType = 1)
+    Vec4f lookAt(float x, float y, float rayType = 1)
     {
         state.rasterX = x;
         state.rasterY = y;
@@ -149,102 +121,69 @@ struct Plate : Sky<corvid_Env_Backplate> {
 
 TEST(Backplate, RayTypeAndSwitchesChooseWhatARaySees)
 {
-    enum Seen { kBackground, kImage, kCube, kReflection, kDiffuse };
-    struct Case {
-        std::uint32_t rayType;
-        bool image, cube, reflection;
-        Seen want;
-    };
-    constexpr Case kCases[] = {
-        {1, false, true, true, kBackground},  {1, true, false, true, kImage},
-        {4, true, false, true, kImage},       {1, true, true, true, kCube},
-        {4, true, true, false, kCube},        {4, false, false, true, kBackground},
-        {16, true, false, true, kBackground}, {0, true, true, true, kBackground},
-        {2, true, true, true, kReflection},   {2, true, true, false, kBackground},
-        {32, true, true, false, kDiffuse},    {32, false, false, true, kDiffuse},
-    };
     constexpr Vec4f kWant[] = {
         kFlat, {0.5f, 0, 5, 0}, {0, 1, -479.5f, 0}, {0.5f, 0.25f, 1, 1}, {2, 4, 8, 1}};
-    for (Case const& c : kCases) {
-        SCOPED_TRACE("ray type " + std::to_string(c.rayType));
+    // ray type, switches of image, cube and reflection; 0: background, 1: image, 2: cube,
+    // 3: reflection, 4: diffuse
+    constexpr int kCases[][5] = {{1, 0, 1, 1, 0},  {1, 1, 0, 1, 1},  {4, 1, 0, 1, 1},
+                                 {1, 1, 1, 1, 2},  {4, 1, 1, 0, 2},  {4, 0, 0, 1, 0},
+                                 {16, 1, 0, 1, 0}, {0, 1, 1, 1, 0},  {2, 1, 1, 1, 3},
+                                 {2, 1, 1, 0, 0},  {32, 1, 1, 0, 4}, {32, 0, 0, 1, 4}};
+    for (auto const& [rayType, image, cube, reflection, seen] : kCases) {
+        SCOPED_TRACE("ray type " + std::to_string(rayType));
         Plate p;
-        p.shader.useBackgroundImage = c.image;
-        p.shader.useCubeBackplate = c.cube;
-        p.shader.useCubeReflection = c.reflection;
-        EXPECT_TRUE(test::near(p.lookAt(0.5f, 480, c.rayType), kWant[c.want], 1e-6));
+        p.shader.useBackgroundImage = image;
+        p.shader.useCubeBackplate = cube;
+        p.shader.useCubeReflection = reflection;
+        EXPECT_TRUE(test::near(p.lookAt(0.5f, 480, float(rayType)), kWant[seen], 1e-6));
         EXPECT_EQ(p.image.lookups.size() + p.cube.lookups.size() + p.reflection.lookups.size()
                       + p.diffuse.lookups.size(),
-                  c.want != kBackground);
+                  seen != 0);
     }
 }
 
 TEST(Backplate, ScreenImageCoversTheUnitSquareWithItsRim)
 {
-    struct Case {
-        char const* why;
-        float x, y;
-        Vec2f renderSize, offset;
-        bool inside;
-        Vec2f uv;
-    };
-    constexpr Case kCases[] = {
-        {"bottom left", 0, 480, {-1, -1}, {0, 0}, true, {0, 0}},
-        {"top right: 1 is inside", 640, 0, {-1, -1}, {0, 0}, true, {1, 1}},
-        {"right of the image", 641, 0, {-1, -1}, {0, 0}, false, {}},
-        {"above", 640, -1, {-1, -1}, {0, 0}, false, {}},
-        {"left", -1, 0, {-1, -1}, {0, 0}, false, {}},
-        {"below", 0, 481, {-1, -1}, {0, 0}, false, {}},
-        {"own height, width unused", 0, 0, {7, 240}, {0, 0}, true, {0, 0.5f}},
-        {"height 0 is a height", 0, -240, {-1, 0}, {0, 0}, true, {0, 0.5f}},
-        {"both offsets are added", 0, 480, {-1, -1}, {0.25f, 0.5f}, true, {0.25f, 0.5f}},
-    };
-    for (Case const& c : kCases) {
+    // raster, own height (below 0: the image's), offset: inside, uv
+    for (test::Line const& c : test::table(R"(
+        bottom left               | | 0 480   -1  0 0       1 0 0
+        top right: 1 is inside    | | 640 0   -1  0 0       1 1 1
+        right of the image        | | 641 0   -1  0 0       0 0 0
+        above                     | | 640 -1  -1  0 0       0 0 0
+        left                      | | -1 0    -1  0 0       0 0 0
+        below                     | | 0 481   -1  0 0       0 0 0
+        own height                | | 0 0     240 0 0       1 0 0.5
+        height 0 is a height      | | 0 -240  0   0 0       1 0 0.5
+        both offsets are added    | | 0 480   -1  0.25 0.5  1 0.25 0.5)")) {
         Plate p;
         p.shader.uv_scale = {1.0f / 640, 1.0f / 480};
-        p.shader.uv_offset = c.offset;
-        p.shader.render_size = c.renderSize;
-        Vec4f const want = c.inside ? Vec4f(c.uv.x, c.uv.y, 5, 0) : kFlat;
-        EXPECT_TRUE(test::near(p.lookAt(c.x, c.y), want, 1e-6)) << c.why;
+        p.shader.uv_offset = {c.want[3], c.want[4]};
+        p.shader.render_size = {7, c.want[2]}; // the width is unused
+        Vec4f const want = c.want[5] != 0 ? Vec4f(c.want[6], c.want[7], 5, 0) : kFlat;
+        EXPECT_TRUE(test::near(p.lookAt(c.want[0], c.want[1]), want, 1e-6)) << c.why;
     }
 }
 
 TEST(Backplate, CubeIsSeenThroughTheCameraWindow)
 {
     Plate p;
-    p.shader.useCubeBackplate = true;
+    corvid_Env_Backplate& s = p.shader;
+    s.useCubeBackplate = true;
     p.lookAt(0.5f, 0.5f);
     EXPECT_EQ(p.cube.lookups.back(), Vec3f(0, 1, 0)); // centre of the window: straight ahead
     EXPECT_TRUE(std::signbit(p.cube.lookups.back().x));
-    test::Random random;
-    for (int i = 0; i < 1000; ++i) {
-        corvid_Env_Backplate& s = p.shader;
-        s.uv_scale = {random.in(0, 2), random.in(0, 2)};
-        s.uv_offset = {random.in(-1, 1), random.in(-1, 1)};
-        s.camerawindowsize = {random.in(0.1f, 2), random.in(0.1f, 2)};
-        s.backplateCloseUp = random.in(0.5f, 2);
-        s.backplateHorizon = random.in(-1, 1);
-        for (float& m : s.backplatetransform.m)
-            m = random.in(-1, 1);
-        for (float& m : s.backplateCubeRotation.m)
-            m = random.in(-1, 1);
-        float const x = random.in(0, 1), y = random.in(0, 1);
-        p.lookAt(x, y);
-        // The window's point in double: centred, scaled by its size over the zoom, then lifted.
-        auto const d = [](float v) { return static_cast<double>(v); };
-        double const zoom = d(s.backplateCloseUp);
-        double const window[3] = {
-            (d(x) * d(s.uv_scale.x) + d(s.uv_offset.x) - 0.5) * d(s.camerawindowsize.x) / zoom,
-            (0.5 - d(s.uv_offset.y) - d(y) * d(s.uv_scale.y)) * d(s.camerawindowsize.y) / zoom
-                + d(s.backplateHorizon),
-            1.0};
-        double placed[3] = {}, r[3] = {};
-        for (int k = 0; k < 9; ++k)
-            placed[k / 3] += d(s.backplatetransform.m[k / 3 * 4 + k % 3]) * window[k % 3];
-        for (int k = 0; k < 9; ++k)
-            r[k / 3] += d(s.backplateCubeRotation.m[k]) * placed[k % 3];
-        // Some twenty roundings of terms below 30.
-        ASSERT_TRUE(test::near(p.cube.lookups.back(), {-r[0], r[2], r[1]}, 4e-5));
-    }
+    // x: (0.25 * 2 + 0.5 - 0.5) * 3 / 2 = 0.75; y: (0.5 - 0.25 - 0.5 * 1.5) * 4 / 2 + 0.5 = -0.5
+    s.uv_scale = {2, 1.5f};
+    s.uv_offset = {0.5f, 0.25f};
+    s.camerawindowsize = {3, 4};
+    s.backplateCloseUp = 2;
+    s.backplateHorizon = 0.5f;
+    s.backplatetransform = Mat4f(1, 2, 3, 9, 4, 5, 6, 9, 7, 8, 10, 9, 9, 9, 9, 9);
+    s.backplateCubeRotation = Mat3f(1, 0, 0, 0, 0, 2, 0, -4, 1);
+    p.lookAt(0.25f, 0.5f);
+    // Rows times (0.75, -0.5, 1): (2.75, 6.5, 11.25); turned: (2.75, 22.5, -14.75); x and y turn
+    // round, then (x, z, -y).
+    EXPECT_EQ(p.cube.lookups.back(), Vec3f(-2.75f, -14.75f, 22.5f));
 }
 
 } // namespace

@@ -1,21 +1,16 @@
 #include "lights/voPointLight.h"
 #include "lights/voSpotLight.h"
-#include "support/scriptedHost.h"
-
-#include <limits>
+#include "support/textTable.h"
 
 namespace zsi {
 namespace {
 
-constexpr Vec3f kUntouched(7, 7, 7);
-constexpr Vec3f kShadow(0.25f, 0.5f, 0.75f);
-constexpr Vec3f kColor(1, 2, -4);
-
 /// Lights a point at distance d whose direction makes the given cosine with the axis.
-/// want: factor on the colour; lit: else the record stays as it is and no ray is spent.
+/// want: factor on the colour; below 0: the record stays as it is and no ray is spent.
 template <class Light>
-void expectLit(Light light, float d, float cosine, float want, bool lit)
+void expectLit(Light light, float d, float cosine, float want)
 {
+    constexpr Vec3f kUntouched(7, 7, 7), kShadow(0.25f, 0.5f, 0.75f);
     test::ScriptedHost host;
     host.onShadow = [](Vec3f, Vec3f) { return kShadow; };
     ShadeState s = test::plainHit();
@@ -24,88 +19,76 @@ void expectLit(Light light, float d, float cosine, float want, bool lit)
     s.lightAxis = {0, 0, -1};
     s.lightToPoint = {std::sqrt(1 - cosine * cosine), 0, -cosine};
     s.lightDistance = d;
-    light.color = kColor;
-    for (light.castShadows = true;; light.castShadows = false) {
+    light.color = {1, 2, -4};
+    for (bool const casts : {true, false}) {
+        light.castShadows = casts;
         s.lightColor = s.lightShadow = kUntouched;
         host.calls.clear();
         light.illumination(&host, s);
-        bool const asks = lit && light.castShadows;
-        ASSERT_EQ(host.calls.size(), asks);
-        if (asks) {
-            EXPECT_EQ(host.calls[0],
-                      (test::Call{"shadowTransmission", {s.P, s.lightPosition}, {}}));
-        }
-        EXPECT_EQ(s.lightShadow, !lit ? kUntouched : asks ? kShadow : Vec3f(1, 1, 1));
+        std::vector<test::Call> calls;
+        if (casts && !(want < 0))
+            calls.push_back({"shadowTransmission", {s.P, s.lightPosition}, {}});
+        EXPECT_EQ(host.calls, calls);
+        EXPECT_EQ(s.lightShadow, want < 0 ? kUntouched : casts ? kShadow : Vec3f(1, 1, 1));
         if (std::isnan(want))
             EXPECT_TRUE(std::isnan(s.lightColor.x) && std::isnan(s.lightColor.z));
         else // on a cone's rim, 0.95 - 0.9 has lost four bits
-            EXPECT_TRUE(test::near(s.lightColor, lit ? kColor * want : kUntouched, 1.6e-5));
-        if (!light.castShadows)
-            return;
+            EXPECT_TRUE(test::near(s.lightColor, want < 0 ? kUntouched : light.color * want, 2e-5));
     }
 }
 
 TEST(PointLight, FallsOffByThePowerLawUpToItsRange)
 {
-    struct Case {
-        char const* why;
-        float range, reference, exponent, d, want;
-        bool lit;
-    };
     constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
-    constexpr Case kCases[] = {
-        {"1 - (1/2)^2", 1e4f, 100, 2, 50, 0.75f, true},
-        {"clamped, not negative", 1e4f, 100, 2, 150, 0, true},
-        {"at the range: lit", 50, 100, 1, 50, 0.5f, true},
-        {"just beyond the range: silent", 50, 100, 1, 50.000004f, 0, false},
-        {"d^0 = 1", 1e4f, 1, 0, 50, 0, true},
-        {"0/0 stays NaN through the clamp", 1e4f, 0, 2, 0, kNan, true},
-        {"a NaN distance is not beyond the range", 1e4f, 100, 2, kNan, kNan, true},
-        {"d/0 = infinity", 1e4f, 0, 2, 1, 0, true},
-    };
-    for (Case const& c : kCases) {
+    // range, reference distance, exponent, distance: factor
+    for (test::Line const& c : test::table(R"(
+        1 - (1/2)^2                             | | 1e4 100 2 50        0.75
+        clamped, not negative                   | | 1e4 100 2 150       0
+        at the range: lit                       | | 50  100 1 50        0.5
+        just beyond the range: silent           | | 50  100 1 50.000004 -1
+        d^0 = 1                                 | | 1e4 1   0 50        0
+        d/0 = infinity                          | | 1e4 0   2 1         0)")) {
         SCOPED_TRACE(c.why);
         voPointLight light;
-        light.range = c.range;
-        light.attenuationFactors = {c.reference, c.exponent, 9};
-        expectLit(light, c.d, 1, c.want, c.lit);
+        light.range = c.want[0];
+        light.attenuationFactors = {c.want[1], c.want[2], 9};
+        expectLit(light, c.want[3], 1, c.want[4]);
     }
+    voPointLight light;
+    light.attenuationFactors = {0, 2, 9};
+    expectLit(light, 0, 1, kNan); // 0/0 stays NaN through the clamp
+    light.attenuationFactors.x = 100;
+    expectLit(light, kNan, 1, kNan); // and is not beyond the range
 }
 
 TEST(SpotLight, ConeIsFullInsideSmoothOnTheRimAndSilentOutside)
 {
-    struct Cone {
-        char const* why;
-        float penumbra, umbra, exponent, cosine, want;
-        bool lit;
-    };
-    constexpr Cone kCones[] = {
-        {"on the inner rim", 0.9f, 0.95f, 0, 0.95f, 1.0f, true},
-        {"half way: 3*(1/2)^2 - 2*(1/2)^3", 0.9f, 0.95f, 0, 0.925f, 0.5f, true},
-        {"a quarter: 3/16 - 2/64", 0.5f, 0.75f, 0, 0.5625f, 0.15625f, true},
-        {"cosine to the exponent", 0.25f, 0.25f, 2, 0.5f, 0.25f, true},
-        {"the same on the rim: half of 0.6^2", 0.5f, 0.7f, 2, 0.6f, 0.18f, true},
-        {"on the outer rim", 0.5f, 0.75f, 0, 0.5f, 0.0f, true},
-        {"outside", 0.9f, 0.95f, 0, 0.899f, 0, false},
-        {"inner cone wider than outer: hard edge", 0.75f, 0.5f, 0, 0.75f, 1, true},
-        {"hard edge, outside", 0.75f, 0.5f, 0, 0.7499f, 0, false},
-        {"behind the axis, wide open: 0^0", 0, 0, 0, -0.5f, 1, true},
-        {"behind the axis, wide open: 0^1", -1, -1, 1, -0.5f, 0, true},
-        {"behind the axis of a narrow cone", 0.1f, 0.2f, 0, -0.5f, 0, false},
-    };
-    voSpotLight light;
-    for (Cone const& c : kCones) {
+    // outer cosine, inner cosine, exponent of the cosine, cosine: factor
+    for (test::Line const& c : test::table(R"(
+        on the inner rim                         | | 0.9  0.95 0 0.95   1
+        half way: 3*(1/2)^2 - 2*(1/2)^3          | | 0.9  0.95 0 0.925  0.5
+        a quarter: 3/16 - 2/64                   | | 0.5  0.75 0 0.5625 0.15625
+        cosine to the exponent                   | | 0.25 0.25 2 0.5    0.25
+        the same on the rim: half of 0.6^2       | | 0.5  0.7  2 0.6    0.18
+        on the outer rim                         | | 0.5  0.75 0 0.5    0
+        outside                                  | | 0.9  0.95 0 0.899  -1
+        inner cone wider than outer: hard edge   | | 0.75 0.5  0 0.75   1
+        hard edge, outside                       | | 0.75 0.5  0 0.7499 -1
+        behind the axis, wide open: 0^0          | | 0    0    0 -0.5   1
+        behind the axis, wide open: 0^1          | | -1   -1   1 -0.5   0
+        behind the axis of a narrow cone         | | 0.1  0.2  0 -0.5   -1)")) {
         SCOPED_TRACE(c.why);
-        light.attenuationFactors = {100, 2, c.exponent};
-        light.cosPenumbra = c.penumbra;
-        light.cosUmbra = c.umbra;
-        expectLit(light, 0, c.cosine, c.want, c.lit);
+        voSpotLight light;
+        light.attenuationFactors = {100, 2, c.want[2]};
+        light.cosPenumbra = c.want[0];
+        light.cosUmbra = c.want[1];
+        expectLit(light, 0, c.want[3], c.want[4]);
     }
-    light = {};
+    voSpotLight light;
     light.range = 10;
     light.attenuationFactors = {20, 1, 0};
-    expectLit(light, 10, 1, 0.5f, true);
-    expectLit(light, 10.000001f, 1, 0, false);
+    expectLit(light, 10, 1, 0.5f);
+    expectLit(light, 10.000001f, 1, -1);
 }
 
 } // namespace

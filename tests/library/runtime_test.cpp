@@ -1,63 +1,41 @@
 #include "runtime/builtins.h"
 #include "support/scriptedHost.h"
 
-#include <limits>
-
 namespace zsi {
 namespace {
 
 constexpr float kNan = std::numeric_limits<float>::quiet_NaN();
+constexpr Vec3f kNone(0, 0, 0);
 
 TEST(Runtime, FaceForwardTurnsByTheReferenceAndIsZeroEdgeOn)
 {
-    Vec3f const n(1, 2, 3), i(0, 0, -1), none(0, 0, 0);
+    Vec3f const n(1, 2, 3), i(0, 0, -1);
     EXPECT_EQ(sl_lib_faceforward(n, i, {0, 0, 1}), n);
     EXPECT_EQ(sl_lib_faceforward(n, i, {5, 0, -1e-30f}), -n);
-    EXPECT_EQ(sl_lib_faceforward(n, i, {1, 0, 0}), none);
-    EXPECT_EQ(sl_lib_faceforward(n, i, {kNan, 0, 1}), none);
+    EXPECT_EQ(sl_lib_faceforward(n, i, {1, 0, 0}), kNone);
+    EXPECT_EQ(sl_lib_faceforward(n, i, {kNan, 0, 1}), kNone);
 }
 
 TEST(Runtime, RefractionKeepsSnellsLawInThePlaneOfIncidence)
 {
-    test::Random random;
-    int total = 0;
-    for (int k = 0; k < 2000; ++k) {
-        Vec3f const n = random.unit();
-        Vec3f i = random.unit();
-        if (test::dotOf(i, n) > 0)
-            i = -i; // the caller's part
-        float const eta = random.in(0.5f, 2.0f);
-        Vec3f const t = sl_lib_refract(i, n, eta);
-        double const c = test::dotOf(i, n), sine2 = double(eta) * double(eta) * (1 - c * c);
-        if (std::abs(1 - sine2) < 1e-5)
-            continue; // the margin itself is checked below
-        if (sine2 > 1) {
-            EXPECT_EQ(t, Vec3f(0, 0, 0));
-            ++total;
-            continue;
-        }
-        // Unit, on the far side, tangential part scaled by eta. Near the critical angle the cosine
-        // is the root of a difference and keeps half the digits: sqrt(1e-6).
-        test::Vec3d const across = test::minus(i, test::times(n, c));
-        EXPECT_TRUE(test::near(test::minus(t, test::times(n, test::dotOf(t, n))),
-                               test::times(across, double(eta)), 2e-6));
-        EXPECT_NEAR(test::dotOf(t, n), -std::sqrt(1 - sine2), 1e-3);
-        EXPECT_NEAR(length(t), 1.0f, 1e-5f);
-    }
-    EXPECT_GT(total, 100);
-    // c counts as |c|, and k = 1e-6 is already total reflection.
-    EXPECT_EQ(sl_lib_refract({1, 0, -1e-4f}, {0, 0, 1}, 1.5f), Vec3f(0, 0, 0));
-    EXPECT_EQ(sl_lib_refract({1, 0, 0}, {0, 0, 1}, 1.0f), Vec3f(0, 0, 0));
-    EXPECT_EQ(sl_lib_refract({0, 0, 1}, {0, 0, 1}, 0.5f), Vec3f(0, 0, 0))
-        << "N along I: eta I + (eta - 1) N";
+    // Sines 3/5 and 2/5, 3/5 and 3/4, in a plane that is no plane of axes.
+    Vec3f const n(0, 0.6f, 0.8f), across(0.6f, -0.64f * 0.75f, 0.48f * 0.75f);
+    Vec3f const along = across * (1 / length(across)), i = along * 0.6f - n * 0.8f;
+    EXPECT_TRUE(test::near(sl_lib_refract(i, n, 1 / 1.5f), along * 0.4f - n * 0.9165151f, 1e-6));
+    EXPECT_TRUE(test::near(sl_lib_refract(i, n, 1.25f), along * 0.75f - n * 0.6614378f, 1e-6));
+    EXPECT_EQ(sl_lib_refract(i, n, 1.7f), kNone);
+    // The cosine counts without sign, and k = 1e-6 is already total reflection.
+    EXPECT_EQ(sl_lib_refract({1, 0, -1e-4f}, {0, 0, 1}, 1.5f), kNone);
+    EXPECT_EQ(sl_lib_refract({1, 0, 0}, {0, 0, 1}, 1.0f), kNone);
+    EXPECT_EQ(sl_lib_refract({1, 0, -9.9e-4f}, {0, 0, 1}, 1.0f), kNone);
+    EXPECT_NE(sl_lib_refract({1, 0, -1.01e-3f}, {0, 0, 1}, 1.0f), kNone);
+    EXPECT_EQ(sl_lib_refract({0, 0, 1}, {0, 0, 1}, 0.5f), kNone) << "eta I + (eta - 1) N";
 }
 
 TEST(Runtime, LogarithmsOfTheirBases)
 {
-    for (float const x : {1e-30f, 0.1f, 2.0f, 3e38f}) {
-        EXPECT_NEAR(double(sl_lib_log2(x)), std::log2(double(x)), 3e-7 * 128);
-        EXPECT_NEAR(double(sl_lib_log10(x)), std::log10(double(x)), 3e-7 * 40);
-    }
+    EXPECT_NEAR(sl_lib_log2(8.0f), 3.0f, 1e-6f);
+    EXPECT_NEAR(sl_lib_log10(1e-30f), -30.0f, 1e-5f);
     EXPECT_EQ(sl_lib_log2(0.0f), -std::numeric_limits<float>::infinity());
     EXPECT_TRUE(std::isnan(sl_lib_log10(-1.0f)));
 }
@@ -65,31 +43,29 @@ TEST(Runtime, LogarithmsOfTheirBases)
 TEST(Runtime, TexturesReadOpaqueBlackWhereTheyHaveNothing)
 {
     Vec4f const black(0, 0, 0, 1);
-    EXPECT_TRUE(test::near(TextureSampler1D{}.lookup(0.5f), black, 0));
-    EXPECT_TRUE(test::near(TextureSampler2D{}.lookup({kNan, 3}), black, 0));
-    EXPECT_TRUE(test::near(TextureSamplerCube{}.lookup({0, 0, 0}), black, 0));
-
     struct Silent final : HostTexture2D {
         void reserved0() override { }
         void reserved1() override { }
         void lookup(Vec4f*, Vec2f const*) const override { }
     } const silent;
     TextureSampler2D handle;
+    EXPECT_TRUE(test::near(handle.lookup({kNan, 3}), black, 0));
     handle.texture = &silent;
     handle.index = 12345; // the host's word: never looked at
     EXPECT_TRUE(test::near(handle.lookup({0, 0}), black, 0));
+    EXPECT_TRUE(test::near(TextureSampler1D{}.lookup(0.5f), black, 0));
+    EXPECT_TRUE(test::near(TextureSamplerCube{}.lookup({0, 0, 0}), black, 0));
 }
 
 TEST(Runtime, ValueTypes)
 {
     EXPECT_TRUE(Vec3f(0.0f, 1, 2) == Vec3f(-0.0f, 1, 2));
     EXPECT_FALSE(Vec3f(kNan, 1, 2) == Vec3f(kNan, 1, 2));
-    EXPECT_FALSE(Vec3f(0, 1, 2) == Vec3f(0, 1, 2.0000002f));
     Mat3f const block(Mat4f(0, 1, 2, 90, 3, 4, 5, 91, 6, 7, 8, 92, 93, 94, 95, 96));
     for (int i = 0; i < 9; ++i)
         EXPECT_EQ(block.m[i], static_cast<float>(i)) << "row by row, without the translation";
     EXPECT_TRUE(std::isnan(clamp01(kNan)));
-    EXPECT_EQ(normalize({0, 0, 0}), Vec3f(0, 0, 0));
+    EXPECT_EQ(normalize(kNone), kNone);
 }
 
 } // namespace

@@ -5,43 +5,27 @@
 #include "materials/utility/corvid_Mtl_ShadowPlane.h"
 #include "materials/utility/corvid_Mtl_Solid.h"
 #include "materials/utility/corvid_Mtl_Unlit.h"
-#include "support/reference.h"
-#include "support/scriptedHost.h"
+#include "support/textTable.h"
 
 namespace zsi {
 namespace {
 
-using test::D3;
-using test::minus;
-using test::times;
-
-D3 clamped(D3 c) { return {test::clampUnit(c.x), test::clampUnit(c.y), test::clampUnit(c.z)}; }
-double darkest(D3 c) { return std::min({c.x, c.y, c.z}); }
-/// Per channel; the factors of a colour.
-D3 filter(D3 a, D3 b) { return {a.x * b.x, a.y * b.y, a.z * b.z}; }
-D3 blend(D3 a, D3 b, D3 t) { return plus(a, filter(t, minus(b, a))); }
-
 TEST(Solid, IsTheColourOfItsStateTimesTheCosineWhicheverWayTheNormalIsTurned)
 {
-    constexpr D3 kLilac(0.69, 0.58, 0.69), kGrey(0.85, 0.85, 0.85), kBlack(0, 0, 0);
-    constexpr std::pair<int, D3> kStates[] = {{-1, kBlack}, {0, kLilac}, {1, kLilac},
-                                              {2, kGrey},   {3, kBlack}, {5, kBlack}};
-    test::Random random;
-    for (auto const& [patchState, base] : kStates)
-        for (int i = 0; i < 200; ++i) {
-            corvid_Mtl_Solid solid;
-            solid.patchState = patchState;
-            solid.reverseNormal = i & 1;
-            solid.faceForward = i & 2;
-            ShadeState state = test::randomHit(random, true);
-            state.Ci.w = 7;
-            if (i < 20)
-                state.N = state.I * 3.0f; // a cosine above 1 must not brighten beyond 1
-            solid.shade(nullptr, state);
-            double const d = std::fabs(test::dotOf(state.I, state.N));
-            EXPECT_TRUE(test::near(rgb(state.Ci), clamped(times(base, d)), 1e-6)) << patchState;
-            EXPECT_EQ(state.Ci.w, 7.0f) << "alpha is not its own";
+    constexpr Vec3f kLilac(0.69f, 0.58f, 0.69f), kGrey(0.85f, 0.85f, 0.85f), kBlack(0, 0, 0);
+    constexpr Vec3f kStates[] = {kBlack, kLilac, kLilac, kGrey, kBlack, kBlack}; // from -1 on
+    for (int i = 0; i < 24; ++i) {
+        test::Trial<corvid_Mtl_Solid> t;
+        t.shader.patchState = i % 6 - 1;
+        t.shader.reverseNormal = i / 6 & 1;
+        t.shader.faceForward = i / 12;
+        t.state.Ci.w = 7; // alpha is not its own
+        for (float const along : {-0.5f, 0.5f, 3.0f}) { // a cosine above 1 brightens up to 1
+            t.state.N = {0.8f, 0, along};
+            Vec3f const want = clamp01(kStates[i % 6] * std::fabs(along));
+            EXPECT_TRUE(test::near(t.shade(), withAlpha(want, 7), 1e-6)) << i;
         }
+    }
 }
 
 TEST(Unlit, ShowsToCameraRaysOnlyAndLetsLightThrough)
@@ -60,155 +44,125 @@ TEST(Unlit, ShowsToCameraRaysOnlyAndLetsLightThrough)
 
 TEST(NormalsOnly, ColoursBySideAndScheme)
 {
-    test::Random random;
-    int disagree = 0;
-    for (int i = 0; i < 4000; ++i) {
-        corvid_Mtl_NormalsOnly shader;
-        shader.reverseNormal = i & 1;
-        shader.faceForward = i & 2;
-        shader.faceLight = i & 4;
-        ShadeState state = test::plainHit();
-        state.I = random.unit();
-        state.N = random.unit();
-        state.Ng = i % 16 >= 8 ? state.N : random.unit();
-        shader.shade(nullptr, state);
-
-        double const sign = shader.reverseNormal ? -1 : 1;
-        double const d = sign * test::dotOf(state.I, state.N),
-                     side = sign * test::dotOf(state.I, state.Ng);
-        // Back faces whose shading normal leans to the viewer are black, and so are such fronts.
-        D3 const want = shader.faceForward ? times({0.05, 0.8, 0.05}, std::fabs(d))
-            : shader.faceLight             ? times({0.45, 0.65, 0.35}, std::fabs(d))
-            : side > 0                     ? clamped({d, d, 0})
-                                           : clamped(times({0.05, 0.05, 0.8}, -d));
-        EXPECT_TRUE(test::near(state.Ci, {float(want.x), float(want.y), float(want.z), 1}, 1e-6));
-        disagree += side > 0 && d < 0;
-    }
-    EXPECT_GT(disagree, 50);
-    for (float const x : {1.0f, std::nanf("")}) { // edge on and broken: a front
+    // reverse, face forward, face light, cosines of I with the normal and the geometric normal
+    for (test::Line const& c : test::table(R"(
+        front                       | | 0 0 0  -0.5 -1   0.025 0.025 0.4
+        back                        | | 0 0 0   0.5 1    0.5 0.5 0
+        back that leans to the eye  | | 0 0 0  -0.5 1    0 0 0
+        front that leans away       | | 0 0 0   0.5 -1   0 0 0
+        reversed front is a back    | | 1 0 0  -0.5 -1   0.5 0.5 0
+        reversed back               | | 1 0 0   0.5 1    0.025 0.025 0.4
+        faced                       | | 0 1 0   0.5 1    0.025 0.4 0.025
+        faced goes before the light | | 1 1 1  -0.5 -1   0.025 0.4 0.025
+        light                       | | 0 0 1   0.5 -1   0.225 0.325 0.175
+        edge on: a front            | | 0 0 0  -1 0      0.05 0.05 0.8
+        broken: a front             | | 0 0 0  -1 2      0.05 0.05 0.8)")) {
         test::Trial<corvid_Mtl_NormalsOnly> t;
-        t.state.Ng = {x, 0, 0};
-        EXPECT_TRUE(test::near(t.shade(), {0.05f, 0.05f, 0.8f, 1}, 1e-6));
+        t.shader.reverseNormal = c.want[0] != 0;
+        t.shader.faceForward = c.want[1] != 0;
+        t.shader.faceLight = c.want[2] != 0;
+        t.state.N = {0, 0.3f, -c.want[3]};
+        t.state.Ng = {0, 0, c.want[4] > 1 ? std::nanf("") : -c.want[4]};
+        EXPECT_TRUE(test::near(t.shade(), withAlpha(test::vec3(c.want, 5), 1), 1e-6)) << c.why;
     }
 }
 
 TEST(AmbientOnly, TakesOneSourceAndShowsItsDarkestChannel)
 {
-    enum Source { kNone, kTexture, kVertex, kHost };
-    struct Case {
-        char const* why;
-        bool show, precalc, raytraced;
-        int mode;
-        Source source; ///< which one is asked
-    };
-    constexpr Case kCases[] = {
-        {"off: white", false, true, true, 1, kNone},
-        {"texture goes before the host", true, true, true, 1, kTexture},
-        {"vertex colour goes before the host", true, true, true, 2, kVertex},
-        {"vertex colour", true, true, false, 2, kVertex},
-        {"an unknown baked mode: white", true, true, false, 3, kNone},
-        {"no baked mode: the host", true, true, true, 0, kHost},
-        {"an unknown baked mode: the host", true, true, true, 7, kHost},
-        {"baked source switched off: the host", true, false, true, 1, kHost},
-        {"baked source switched off, no rays: white", true, false, false, 2, kNone},
-    };
-    test::Random random;
-    for (Case const& c : kCases)
-        for (int i = 0; i < 50; ++i) {
+    // How much of the colour (0.5, 0, 1) there is: what is open, 1/2 of it. A baked 0.25 leaves
+    // 1 - 3/8 of black; the host's (0.5, 0.75, 0.25) leave 1 - 1/4 * 1/2 of 0.5 and 1 - 1/8 of 0.
+    // show, baked source on, rays on, mode: result, lookups, questions to the host
+    for (test::Line const& c : test::table(R"(
+        off: white                           | | 0 1 1 1  1     0 0
+        texture goes before the host         | | 1 1 1 1  0.625 1 0
+        vertex colour goes before the host   | | 1 1 1 2  0.625 0 0
+        vertex colour                        | | 1 1 0 2  0.625 0 0
+        an unknown baked mode: white         | | 1 1 0 3  1     0 0
+        no baked mode: the host              | | 1 1 1 0  0.875 0 1
+        an unknown baked mode: the host      | | 1 1 1 7  0.875 0 1
+        baked source off: the host           | | 1 0 1 1  0.875 0 1
+        baked source off, no rays: white     | | 1 0 0 2  1     0 0)"))
+        for (float const side : {1.0f, -1.0f, 0.0f}) { // edge on, the normal is zero
             SCOPED_TRACE(c.why);
             test::Trial<corvid_Mtl_AmbientOnly> t;
+            test::FunctionTexture<Vec2f> map([](Vec2f) { return Vec4f(0.25f, 0.1f, 0.2f, 0.3f); });
             corvid_Mtl_AmbientOnly& s = t.shader;
-            s.showAmbientOnly = c.show;
-            s.usePrecalcAO = c.precalc;
-            s.usingRaytracedAO = c.raytraced;
-            s.ambientOcclusionMode = c.mode;
-            s.ambientOcclusionFactor = random.in(0, 1);
-            s.ambientOcclusionColor = random.color();
-            Vec3f const open = random.color();
-            Vec4f const baked(open.x, 0.1f, 0.2f, 0.3f);
-            test::FunctionTexture<Vec2f> map([&](Vec2f) { return baked; });
+            s.showAmbientOnly = c.want[0] != 0;
+            s.usePrecalcAO = c.want[1] != 0;
+            s.usingRaytracedAO = c.want[2] != 0;
+            s.ambientOcclusionMode = static_cast<int>(c.want[3]);
+            s.ambientOcclusionFactor = 0.5f;
+            s.ambientOcclusionColor = {0.5f, 0, 1};
             s.ambientOcclusionTexture.texture = &map;
-            t.host.onOcclusion = [&](Vec3f, Vec3f) { return open; };
+            t.host.onOcclusion = [](Vec3f, Vec3f) { return Vec3f(0.5f, 0.75f, 0.25f); };
             t.state.P = {1, 2, 3};
             t.state.N = {0.6f, 0, 0.8f};
-            // Edge on, the normal is zero.
-            t.state.Ng = i ? Vec3f(0, 0, i % 2 ? 1.0f : -1.0f) : Vec3f(1, 0, 0);
+            t.state.Ng = {side == 0 ? 1.0f : 0.0f, 0, side};
             test::setAttribute(t.state, 0, Vec2f(0.25f, 0.75f));
-            test::setAttribute(t.state, 8, baked);
-
-            Vec3f const seen = c.source == kHost ? open : grey(c.source ? open.x : 1.0f);
-            double const f = double(s.ambientOcclusionFactor);
-            D3 const k = times(minus({1, 1, 1}, seen), f); // how much of the colour there is
-            // A handful of roundings below 1.
-            float const want = float(darkest(blend({1, 1, 1}, s.ambientOcclusionColor, k)));
-            EXPECT_TRUE(test::near(t.shade(), {want, want, want, 1}, 5e-7));
-
-            ASSERT_EQ(map.lookups.size(), c.source == kTexture);
+            test::setAttribute(t.state, 8, Vec4f(0.25f, 0.1f, 0.2f, 0.3f));
+            EXPECT_TRUE(test::near(t.shade(), withAlpha(grey(c.want[4]), 1), 1e-6));
+            ASSERT_EQ(float(map.lookups.size()), c.want[5]);
             for (Vec2f const at : map.lookups)
                 EXPECT_TRUE(at.x == 0.25f && at.y == 0.75f);
-            ASSERT_EQ(t.host.calls.size(), c.source == kHost);
-            if (c.source == kHost) {
-                test::Call const& call = t.host.calls[0];
-                EXPECT_EQ(call.vectors[0], t.state.P);
-                EXPECT_EQ(call.vectors[1],
-                          t.state.N
-                              * (i % 2   ? 1.0f
-                                     : i ? -1.0f
-                                         : 0.0f))
-                    << "turned to the viewer by the geometric normal";
-                EXPECT_EQ(call.scalars[0], 1.0f) << "importance";
-            }
+            std::vector<test::Call> asked;
+            if (c.want[6] != 0)
+                asked = {{"occlusion", {t.state.P, t.state.N * side}, {1}}};
+            EXPECT_EQ(t.host.calls, asked);
         }
 }
 
 TEST(Mirror, ShadesTheTintedReflectionAndBlendsTheMask)
 {
-    test::Random random;
-    for (int i = 0; i < 600; ++i) {
-        test::Trial<corvid_Mtl_Mirror> t;
-        ShadeState& s = t.state = test::randomHit(random, i % 2);
-        s.Ci = {7, 7, 7, 7};
-        Vec3f const T = t.shader.u_tintColor = random.color();
-        constexpr Vec3f kMasks[] = {{0, 0, 0}, {1, 1, 1}, {1, 0.5f, 0.25f}};
-        Vec3f const mask = t.shader.maskingColor = kMasks[i % 3], seen = random.color();
-        Vec4f const behind = withAlpha(random.color(), 0.375f);
-        t.host.onTrace = [&](Vec3f, Vec3f) { return seen; };
-        t.host.onThrough = [&](Vec3f, Vec3f) { return behind; };
-        t.shade();
-        if (i % 3 == 1) {
-            EXPECT_EQ(s.discardHit, 1);
-            EXPECT_TRUE(t.host.calls.empty());
-            continue;
+    constexpr float kF = 0.92f + 0.08f * 0.00032f; // 1 - cosine is 1/5
+    for (float const side : {1.0f, -1.0f})
+        for (Vec3f const mask : {Vec3f(0, 0, 0), Vec3f(1, 1, 1), Vec3f(1, 0.5f, 0.25f)}) {
+            test::Trial<corvid_Mtl_Mirror> t;
+            ShadeState& s = t.state;
+            s.P = {1, 2, 3};
+            s.I = {0.6f, 0, -0.8f};
+            s.N = {0, 0, side};
+            s.Ng = {0, 0.28f * side, 0.96f * side};
+            s.Ci = {7, 7, 7, 7};
+            t.shader.u_tintColor = {0.25f, 0.5f, 0.125f};
+            t.shader.maskingColor = mask;
+            t.host.onTrace = [](Vec3f, Vec3f) { return Vec3f(1, 2, 4); };
+            t.host.onThrough = [](Vec3f, Vec3f) { return Vec4f(0.5f, 0.25f, 1, 0.375f); };
+            t.shade();
+            EXPECT_EQ(s.discardHit, mask.z == 1);
+            if (s.discardHit) {
+                EXPECT_TRUE(t.host.calls.empty());
+                continue;
+            }
+            test::Call const& ray = t.host.calls.at(0);
+            EXPECT_EQ(ray.service, "traceReflection");
+            EXPECT_EQ(ray.vectors[0], s.P);
+            EXPECT_TRUE(test::near(ray.vectors[1], {0.6f, 0, 0.8f}, 1e-6));
+            EXPECT_NEAR(ray.scalars[0], kF * 0.5f, 1e-6f);
+            bool const blended = mask.x == 1;
+            ASSERT_EQ(t.host.calls.size(), blended ? 2u : 1u);
+            if (blended) {
+                EXPECT_EQ(t.host.calls[1], (test::Call{"traceThrough", {s.P, s.I}, {1}}));
+            }
+            Vec4f const want = blended
+                ? Vec4f(0.5f, 0.5f * kF + 0.125f, 0.375f * kF + 0.25f, 0.375f)
+                : Vec4f(0.25f * kF, kF, 0.5f * kF, 1);
+            EXPECT_TRUE(test::near(s.Ci, want, 1e-6));
+            // A normal that leans so far that its mirror image dips: kept above on either side.
+            s.N = Vec3f(0.6f, 0, 0.8f) * side;
+            t.shade();
+            EXPECT_NEAR(dot(t.host.calls[0].vectors[1], s.Ng) * side, 0.05f, 1e-5f);
         }
-        double const F = 0.92 + 0.08 * std::pow(1 - std::fabs(test::dotOf(s.I, s.N)), 5);
-        test::Call const& ray = t.host.calls[0];
-        ASSERT_EQ(ray.service, "traceReflection");
-        EXPECT_EQ(ray.vectors[0], s.P);
-        EXPECT_NEAR(double(ray.scalars[0]), F * double(maxComponent(T)), 1e-6);
-        D3 const straight = minus(s.I, times(s.N, 2 * test::dotOf(s.I, s.N)));
-        double const side = i % 2 ? 1 : -1;
-        if (side * inner(straight, s.Ng) > 0.05) {
-            EXPECT_TRUE(test::near(ray.vectors[1], straight, 1e-6));
-        }
-        EXPECT_GT(side * test::dotOf(ray.vectors[1], s.Ng), 0.0499);
-        bool const blended = i % 3 == 2;
-        ASSERT_EQ(t.host.count("traceThrough"), blended);
-        EXPECT_TRUE(!blended || t.host.calls[1].scalars[0] == 1.0f) << "importance";
-        D3 const want = blend(times(filter(T, seen), F), rgb(behind), mask);
-        EXPECT_TRUE(test::near(rgb(s.Ci), want, 1e-6));
-        EXPECT_EQ(s.Ci.w, blended ? behind.w : 1);
-    }
 }
 
 TEST(Mirror, SamplesTheMirrorDirectionForTheThirdSwitchOnly)
 {
-    test::Random random;
     corvid_Mtl_Mirror mirror;
     mirror.u_tintColor = {0.5f, 0.25f, 1};
-    for (int i = 0; i < 200; ++i) {
-        ShadeState s = test::randomHit(random, i % 2);
+    for (float const side : {1.0f, -1.0f}) {
+        ShadeState s = test::plainHit();
+        s.I = {0.6f, 0, -0.8f};
+        s.N = s.Ng = {0, 0, side};
         s.allowReflection[0] = s.allowReflection[1] = s.allowTransmission[2] = 1;
-        s.outBrdf = {7, 7, 7};
         ShadeState const before = s;
         mirror.transfer(nullptr, s);
         EXPECT_EQ(std::memcmp(&before, &s, sizeof s), 0) << "a perfect mirror scatters nothing";
@@ -217,13 +171,11 @@ TEST(Mirror, SamplesTheMirrorDirectionForTheThirdSwitchOnly)
         EXPECT_EQ(s.sampleType, 0u);
         s.allowReflection[2] = 1;
         mirror.sample(nullptr, s);
-        double const d = test::dotOf(s.I, s.N);
         EXPECT_EQ(s.sampleType, 4u);
         EXPECT_EQ(s.sampleInvPdf, 1);
-        EXPECT_NEAR(double(s.sampleCosine), std::fabs(d), 1e-6);
-        EXPECT_TRUE(test::near(s.sampleDirection, minus(s.I, times(s.N, 2 * d)), 1e-6));
-        EXPECT_TRUE(test::near(times(s.outBrdf, std::fabs(d)), mirror.u_tintColor, 1e-5))
-            << "value times cosine is the tint";
+        EXPECT_NEAR(s.sampleCosine, 0.8f, 1e-6f);
+        EXPECT_TRUE(test::near(s.sampleDirection, {0.6f, 0, 0.8f}, 1e-6));
+        EXPECT_TRUE(test::near(s.outBrdf * 0.8f, mirror.u_tintColor, 1e-6)) << "times the cosine";
     }
     // Along the surface nothing is faced: straight on, with a value that divides by a zero. Of
     // I.(-0 N) only three terms of -0 sum to -0; what is negated then is the cosine.
@@ -273,32 +225,30 @@ TEST(ShadowPlane, IsNotThereWhereNothingIsDarkened)
     EXPECT_EQ(occlusion.state.discardHit, 0);
 }
 
+/// Two lights of strength 2 and 1: the shadow leaves (0.75, 0.5, 2) of 3.
 TEST(ShadowPlane, DarkensWhatLiesBehindByShadowAndOcclusion)
 {
-    test::Random random;
-    for (int i = 0; i < 1000; ++i) {
-        Catcher c;
-        D3 const color = c.shader.shadowColor = random.color();
-        double const k = double(c.shader.shadowIntensity = random.in(0, 1));
-        c.open = random.color();
-        double u = 0;
-        D3 shadowed;
-        for (int l = 0; l < i % 4; ++l) {
-            Vec3f const a = random.color() * 3.0f, b = random.color();
-            c.host.addLight({0, 0, 1}, a, b);
-            D3 const arriving = filter(a, b);
-            u += double(maxComponent(a));
-            shadowed = plus(shadowed, times(b, std::max({arriving.x, arriving.y, arriving.z})));
+    // lights, colour, intensity, open: factors on what lies behind
+    for (test::Line const& c : test::table(R"(
+        black shadow           | | 1 0 0 0 1 1 1 1  0.25 0.1666667 0.6666667
+        half of it             | | 1 0 0 0 0.5 1 1 1  0.625 0.5833333 0.8333333
+        coloured               | | 1 0.5 0 1 1 1 1 1  0.625 0.1666667 1
+        occlusion alone        | | 0 0 0 0 1 0.5 0.25 1  0.5 0.25 1
+        occlusion, intensity 0 | | 1 0.5 0 0 0 0.5 0.25 1  0.75 0.25 1
+        both                   | | 1 0.5 0 1 0.5 0.5 0.25 0.75  0.609375 0.1458333 1)")) {
+        Catcher p;
+        p.shader.shadowColor = test::vec3(c.want, 1);
+        p.shader.shadowIntensity = c.want[4];
+        p.open = test::vec3(c.want, 5);
+        if (c.want[0] != 0) {
+            p.host.addLight({0, 0, 1}, {2, 1, 0.5f}, {0.5f, 0, 1}); // the brightest passes 1
+            p.host.addLight({0, 0, 1}, {0.5f, 1, 1}, {0.25f, 0.5f, 1}); // 1
         }
-        D3 const ratio = i % 4 ? times(shadowed, 1 / u) : D3(1, 1, 1), one(1, 1, 1);
-        // The intensity is of the shadow, not of the occlusion.
-        D3 const full = plus(times(color, k), D3(1 - k, 1 - k, 1 - k));
-        D3 const x = filter(blend(full, one, ratio), blend(color, one, c.open));
-        c.shade();
-        // A dozen roundings of numbers up to 2.
-        EXPECT_TRUE(test::near(rgb(c.state.Ci), filter(kBehind, x), 3e-6));
-        EXPECT_NEAR(double(c.state.Ci.w), 1 - darkest(x), 3e-6);
-        EXPECT_EQ(c.state.discardHit, 0);
+        p.shade();
+        Vec3f const x = test::vec3(c.want, 8);
+        EXPECT_TRUE(test::near(p.state.Ci, withAlpha(kBehind * x, 1 - minComponent(x)), 3e-6))
+            << c.why;
+        EXPECT_EQ(p.state.discardHit, 0);
     }
 }
 
