@@ -3,7 +3,9 @@
 
 #include <cstddef>
 #include <gtest/gtest.h>
+#include <iterator>
 #include <map>
+#include <sstream>
 #include <thread>
 
 namespace zsi {
@@ -55,9 +57,7 @@ struct Subject {
         for (test::Registered const& row : registered.rows)
             if (row.type == "attribute")
                 attributeEnd = 480 + static_cast<std::size_t>(row.offset)
-                    + (row.kind == 1       ? 8u
-                           : row.kind == 2 ? 12u
-                                           : 16u);
+                    + 4 * static_cast<std::size_t>(row.kind + 1);
     }
 
     ShadeState run(test::EntryPointCall const& e, ShadeState state, unsigned seed,
@@ -178,35 +178,22 @@ TEST(AnyShader, ThreadsThatShareAnObjectGetTheSameBits)
     });
 }
 
-constexpr std::pair<char const*, float> kWall[] = {
-    {"useColumnEdit", 1},   {"useRowEdit", 1},     {"repeatX", 1},
-    {"repeatY", 1},         {"perColumn", 1},      {"perRow", 1},
-    {"holes", 1},           {"brickHeight", 0.7f}, {"brickWidth", 0.7f},
-    {"changeColumn", 0.7f}, {"changeRow", 0.7f},   {"horizontalCount", 3},
-    {"verticalCount", 3},   {"edgeRoughness", 3},  {"horizontalGap", 0.2f},
-    {"verticalGap", 0.2f},
-};
-
 /// A node of a network rarely matters at random: its channel must be on, and a wall have whole
 /// bricks.
 void setUpNode(std::string const& name, test::RecordingManager const& registered)
 {
-    std::size_t const tile = name.find("_Tile_");
     for (test::Registered const& row : registered.rows) {
-        if (!name.starts_with("_ward_") || row.name == name || !row.field)
+        if (!name.starts_with("_ward_") || row.name == name)
             continue;
-        std::string const rest = row.name.substr(std::min(tile, row.name.size() - 1) + 1);
-        auto const* found = std::find_if(std::begin(kWall), std::end(kWall), [&](auto const& w) {
-            return tile != std::string::npos && rest == std::string("Tile_") + w.first;
-        });
-        if (row.name.ends_with("MapEnable"))
-            *row.field = true;
-        else if (found != std::end(kWall) && row.type == "bool")
-            *row.field = true;
-        else if (found != std::end(kWall) && row.type == "int")
-            std::memset(row.field, 0, 4), *row.field = 1;
-        else if (found != std::end(kWall))
-            std::memcpy(row.field, &found->second, sizeof(float));
+        auto const put = [&](auto value, auto const&... endings) {
+            if ((row.name.ends_with(endings) || ...))
+                std::memcpy(row.field, &value, sizeof value);
+        };
+        put(true, "MapEnable", "useColumnEdit", "useRowEdit", "repeatX", "repeatY");
+        put(1, "perColumn", "perRow", "holes");
+        put(0.7f, "brickHeight", "brickWidth", "changeColumn", "changeRow");
+        put(3.0f, "horizontalCount", "verticalCount", "edgeRoughness");
+        put(0.2f, "horizontalGap", "verticalGap");
     }
 }
 
@@ -214,24 +201,28 @@ void setUpNode(std::string const& name, test::RecordingManager const& registered
 /// by a network.
 std::set<std::string> unread(std::string const& name, test::RecordingManager const& registered)
 {
-    static std::map<std::string, std::set<std::string>> const kClasses{
-        {"corvid_Mtl_Solid", {"reverseNormal", "faceForward"}},
-        {"corvid_Mtl_Mirror",
-         {"ambientOcclusionTexture", "ambientOcclusionMode", "ambientOcclusionFactor",
-          "ambientOcclusionColor", "usePrecalcAO", "showAmbientOnly", "usingRaytracedAO"}},
-        {"corvid_Mtl_AmbientOnly",
-         {"maskingColor", "maskingMode", "maskingTexture", "maskingTextureMatrix",
-          "maskingInvertTexture", "maskingAngularRepeat", "maskingUVMatrix", "maskingFromAlpha"}},
-        {"corvid_Mtl_Dielectric", {"u_glossyValue", "showAmbientOnly"}},
-        {"MarlowLegacy", {}},
-        {"XRite", {}},
+    auto const words = [](char const* text) {
+        std::istringstream in(text);
+        return std::set<std::string>(std::istream_iterator<std::string>(in), {});
     };
-    if (auto const found = kClasses.find(name); found != kClasses.end())
-        return found->second;
+    std::map<std::string, char const*> const classes{
+        {"corvid_Mtl_Solid", "reverseNormal faceForward"},
+        {"corvid_Mtl_Mirror",
+         "ambientOcclusionTexture ambientOcclusionMode ambientOcclusionFactor "
+         "ambientOcclusionColor usePrecalcAO showAmbientOnly usingRaytracedAO"},
+        {"corvid_Mtl_AmbientOnly",
+         "maskingColor maskingMode maskingTexture maskingTextureMatrix maskingInvertTexture "
+         "maskingAngularRepeat maskingUVMatrix maskingFromAlpha"},
+        {"corvid_Mtl_Dielectric", "u_glossyValue showAmbientOnly"},
+        {"MarlowLegacy", ""},
+        {"XRite", ""},
+    };
+    if (auto const found = classes.find(name); found != classes.end())
+        return words(found->second);
     std::set<std::string> names{"showAmbientOnly"};
     for (test::Registered const& row : registered.rows) {
         if (row.name.starts_with("_ward_diffuse_color_"))
-            names.insert({"u_diffuseMap", "u_diffuseAmount", "u_diffuseTransform"});
+            names.merge(words("u_diffuseMap u_diffuseAmount u_diffuseTransform"));
         else if (row.name.starts_with("_ward_normal0_map_"))
             names.insert("u_normal0Map");
         else if (row.name.starts_with("_ward_cutout_map_"))
@@ -257,7 +248,7 @@ void changeParameter(test::Registered const& row)
         *row.field = !*row.field;
     else if (row.type == "int")
         change(0, [](int v) { return v == 1 ? 2 : 1; });
-    else if (row.type.starts_with("Texture"))
+    else if (row.type.starts_with("texture"))
         std::memset(row.field, 0, sizeof(void*));
     else
         change(0.0f, [](float v) { return v * 0.6f + 0.15f; });

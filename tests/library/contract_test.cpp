@@ -26,7 +26,7 @@ std::string line(std::string text, std::vector<std::uint32_t> words)
     while (!words.empty() && words.back() == 0)
         words.pop_back();
     for (std::uint32_t const word : words)
-        text += " " + std::to_string(word);
+        text += ' ', text += std::to_string(word);
     return text;
 }
 
