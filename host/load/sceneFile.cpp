@@ -103,13 +103,21 @@ void merge(JsonValue& base, JsonReader const& over, Level level, std::string_vie
     base.line = over.value().line;
 }
 
+bool hasNull(JsonValue const& value)
+{
+    return value.kind == JsonValue::Kind::Null
+        || std::any_of(value.members.begin(), value.members.end(),
+                       [](JsonMember const& m) { return hasNull(m.value); });
+}
+
 void refuseNull(JsonReader const& reader)
 {
+    if (!hasNull(reader.value())) // spares the paths of a large scene
+        return;
     if (reader.kind() == JsonValue::Kind::Null)
         reader.fail("null takes out what an included file has; here is nothing to take out");
-    if (reader.isObject())
-        for (auto const& [key, member] : reader.members())
-            refuseNull(member);
+    for (auto const& [key, member] : reader.members())
+        refuseNull(member);
 }
 
 JsonValue readStandardInput()
