@@ -10,8 +10,6 @@
 
 namespace zsi::test {
 
-constexpr double dot(Vec3d a, Vec3d b) { return inner(a, b); }
-
 /// Directions mirrored at facets of widths ax, ay seen from v, as a map of the unit square: u is
 /// t^2 / (1 + t^2) with t the length of the slope in units of the widths, w the slope's azimuth.
 struct MirrorMap {
@@ -28,7 +26,7 @@ struct MirrorMap {
         Vec3d h{-ax * t * std::cos(phi), -ay * t * std::sin(phi), 1};
         double const n = std::sqrt(dot(h, h));
         double const vh = dot(v, h) / n;
-        Vec3d const l{2 * vh * h.x / n - v.x, 2 * vh * h.y / n - v.y, 2 * vh / n - v.z};
+        Vec3d const l = h * (2 * vh / n) - v;
         // Slope area: ax ay t dt dphi, t dt = du / (2 (1 - u)^2); on the sphere times cos^3.
         double const area = ax * ay * M_PI / ((1 - u) * (1 - u));
         return {l, vh > 0 && l.z > 0 ? 4 * vh * area / (n * n * n) : 0};
@@ -36,7 +34,7 @@ struct MirrorMap {
     /// Inverse of `at`.
     void square(Vec3d l, double& u, double& w) const
     {
-        Vec3d const h{v.x + l.x, v.y + l.y, v.z + l.z};
+        Vec3d const h = v + l;
         double const x = -h.x / (h.z * ax), y = -h.y / (h.z * ay), t2 = x * x + y * y;
         u = t2 / (1 + t2);
         w = std::atan2(y, x) / (2 * M_PI);

@@ -46,24 +46,31 @@ struct Vec3d {
         : Vec3d(double(v.x), double(v.y), double(v.z))
     {
     }
+    friend constexpr Vec3d operator+(Vec3d a, Vec3d b) { return {a.x + b.x, a.y + b.y, a.z + b.z}; }
+    friend constexpr Vec3d operator-(Vec3d a, Vec3d b) { return {a.x - b.x, a.y - b.y, a.z - b.z}; }
+    friend constexpr Vec3d operator-(Vec3d a) { return {-a.x, -a.y, -a.z}; }
+    friend constexpr Vec3d operator*(Vec3d a, double k) { return {a.x * k, a.y * k, a.z * k}; }
+    friend constexpr double dot(Vec3d a, Vec3d b) { return a.x * b.x + a.y * b.y + a.z * b.z; }
+    friend constexpr Vec3d cross(Vec3d a, Vec3d b)
+    {
+        return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
+    }
+    friend Vec3d normalize(Vec3d a)
+    {
+        double const l = std::sqrt(dot(a, a));
+        return l > 0 ? a * (1 / l) : a;
+    }
 };
-constexpr Vec3d plus(Vec3d a, Vec3d b) { return {a.x + b.x, a.y + b.y, a.z + b.z}; }
-constexpr Vec3d times(Vec3d a, double k) { return {a.x * k, a.y * k, a.z * k}; }
-constexpr Vec3d minus(Vec3d a, Vec3d b) { return plus(a, times(b, -1)); }
-constexpr double inner(Vec3d a, Vec3d b) { return a.x * b.x + a.y * b.y + a.z * b.z; }
-constexpr Vec3d outer(Vec3d a, Vec3d b)
-{
-    return {a.y * b.z - a.z * b.y, a.z * b.x - a.x * b.z, a.x * b.y - a.y * b.x};
-}
-inline Vec3d unitOf(Vec3d a)
-{
-    double const l = std::sqrt(inner(a, a));
-    return l > 0 ? times(a, 1 / l) : a;
-}
+constexpr Vec3d plus(Vec3d a, Vec3d b) { return a + b; }
+constexpr Vec3d times(Vec3d a, double k) { return a * k; }
+constexpr Vec3d minus(Vec3d a, Vec3d b) { return a - b; }
+constexpr double inner(Vec3d a, Vec3d b) { return dot(a, b); }
+constexpr Vec3d outer(Vec3d a, Vec3d b) { return cross(a, b); }
+inline Vec3d unitOf(Vec3d a) { return normalize(a); }
 inline Vec3f toFloat(Vec3d a) { return {float(a.x), float(a.y), float(a.z)}; }
-inline double distance(Vec3d a, Vec3d b) { return std::sqrt(inner(minus(a, b), minus(a, b))); }
+inline double distance(Vec3d a, Vec3d b) { return std::sqrt(dot(a - b, a - b)); }
 inline double clampUnit(double t) { return t < 0 ? 0 : t > 1 ? 1 : t; }
-inline double dotOf(Vec3f a, Vec3f b) { return inner(a, b); }
+inline double dotOf(Vec3f a, Vec3f b) { return dot(Vec3d(a), Vec3d(b)); }
 
 /// Whether the distance is within the tolerance; NaN never is.
 inline testing::AssertionResult near(Vec3d got, Vec3d want, double tolerance)

@@ -11,35 +11,34 @@ using D3 = Vec3d;
 
 /// Tangent frame of a normal; the tangent goes through the 3x3 part as a row vector.
 struct DFrame {
-    D3 t, b, n;
+    Vec3d t, b, n;
 
-    DFrame(Vec3f tangent, D3 normal, Mat4f const& toWorld)
+    DFrame(Vec3f tangent, Vec3d normal, Mat4f const& toWorld)
         : n(normal)
     {
         float const in[3] = {tangent.x, tangent.y, tangent.z};
         for (int row = 0; row < 3; ++row)
-            t = plus(
-                t,
-                times(Vec3f(toWorld.m[4 * row], toWorld.m[4 * row + 1], toWorld.m[4 * row + 2]),
-                      double(in[row])));
+            t = t
+                + Vec3d(Vec3f(toWorld.m[4 * row], toWorld.m[4 * row + 1], toWorld.m[4 * row + 2]))
+                    * double(in[row]);
         settle();
     }
     /// The normal by slopes along tangent and bitangent, which turn after it.
     void bend(double du, double dv, bool unit)
     {
-        n = plus(n, plus(times(t, du), times(b, dv)));
+        n = n + t * du + b * dv;
         if (unit)
-            n = unitOf(n);
+            n = normalize(n);
         settle();
     }
-    D3 in(D3 d) const { return {inner(t, d), inner(b, d), inner(n, d)}; }
-    D3 out(D3 d) const { return plus(plus(times(t, d.x), times(b, d.y)), times(n, d.z)); }
+    Vec3d in(Vec3d d) const { return {dot(t, d), dot(b, d), dot(n, d)}; }
+    Vec3d out(Vec3d d) const { return t * d.x + b * d.y + n * d.z; }
 
 private:
     void settle()
     {
-        t = unitOf(minus(t, times(n, inner(t, n))));
-        b = unitOf(outer(n, t));
+        t = normalize(t - n * dot(t, n));
+        b = normalize(cross(n, t));
     }
 };
 
@@ -48,9 +47,9 @@ inline double schlickOf(double r0, double c)
     return clampUnit(r0 + std::pow(1 - clampUnit(c), 5) * (1 - r0));
 }
 inline double tan2Of(double c) { return (1 - c * c) / (c * c); }
-inline double smithG1(double a2, D3 w, D3 h)
+inline double smithG1(double a2, Vec3d w, Vec3d h)
 {
-    return inner(w, h) * w.z > 0 ? 2 / (1 + std::sqrt(1 + a2 * tan2Of(w.z))) : 0;
+    return dot(w, h) * w.z > 0 ? 2 / (1 + std::sqrt(1 + a2 * tan2Of(w.z))) : 0;
 }
 inline double ggxOf(double a2, double c)
 {
@@ -63,7 +62,7 @@ inline double fadeOf(double cosine)
     double const x = clampUnit((cosine - 0.05) / 0.2);
     return x * x * (3 - 2 * x);
 }
-inline double reflectedOf(double a2, D3 v, D3 l, D3 h)
+inline double reflectedOf(double a2, Vec3d v, Vec3d l, Vec3d h)
 {
     return smithG1(a2, v, h) * smithG1(a2, l, h) * ggxOf(a2, h.z) / (4 * std::fabs(v.z * l.z));
 }
@@ -98,7 +97,7 @@ inline Vec3f tangentOf(ShadeState const& s)
 /// The shading frame of a hit whose normal, times `side`, nothing bends.
 inline DFrame frameOf(ShadeState const& s, double side)
 {
-    return {tangentOf(s), times(D3(s.N), side), s.objectToWorld};
+    return {tangentOf(s), Vec3d(s.N) * side, s.objectToWorld};
 }
 
 } // namespace zsi::test

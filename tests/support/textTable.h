@@ -66,8 +66,10 @@ struct Subject {
                 for (std::size_t i = 0, n = row.type == "Mat3f" ? 4 : 5; i * 4 < row.size; i += n)
                     reinterpret_cast<float*>(row.field)[i] = 1;
         }
-        attribute("tangent", Vec3f(1, 0, 0));
-        attribute("bitangent", Vec3f(0, 1, 0));
+        if (byName.contains("tangent"))
+            attribute("tangent", Vec3f(1, 0, 0));
+        if (byName.contains("bitangent"))
+            attribute("bitangent", Vec3f(0, 1, 0));
         std::memset(state.allowReflection, 1, sizeof state.allowReflection);
     }
     template <class T>
@@ -97,8 +99,8 @@ struct Subject {
             std::memcpy(row.field, v.data(), std::min(row.size, v.size() * sizeof(float)));
         }
     }
-    /// Words "name=value": I, Pref, Nref, uv, or parameters; `prefix` (of a network's node) or "u_"
-    /// may be left out, and a texture is of one texel.
+    /// Words "name=value": I, N, Pref, Nref, uv, or parameters; `prefix` (of a network's node) or
+    /// "u_" may be left out, and a texture is of one texel.
     std::string prefix;
     void set(std::string const& settings)
     {
@@ -106,8 +108,11 @@ struct Subject {
         for (std::string word; in >> word;) {
             std::string const name = word.substr(0, word.find('='));
             auto const v = numbers(word.substr(name.size() + 1));
-            if (name == "I" || name == "Pref" || name == "Nref")
-                (name == "I" ? state.I : name == "Pref" ? state.Pref : state.Nref) = vec3(v);
+            if (name == "I" || name == "N" || name == "Pref" || name == "Nref")
+                (name == "I"          ? state.I
+                     : name == "N"    ? state.N
+                     : name == "Pref" ? state.Pref
+                                      : state.Nref) = vec3(v);
             else if (name == "uv")
                 attribute("uv", Vec2f(v.at(0), v.at(1)));
             else
