@@ -53,6 +53,7 @@ struct Subject {
     RecordingManager rows;
     std::map<std::string, Registered> byName;
     std::vector<std::unique_ptr<FunctionTexture<Vec2f>>> textures;
+    std::vector<std::unique_ptr<FunctionTexture<Vec3f>>> cubes;
     ScriptedHost host;
     ShadeState state = plainHit();
 
@@ -84,6 +85,12 @@ struct Subject {
         std::memcpy(byName.at(name).field, &t, sizeof t);
         return *t;
     }
+    void cube(std::string const& name, std::function<Vec4f(Vec3f)> texel)
+    {
+        auto* const t =
+            cubes.emplace_back(std::make_unique<FunctionTexture<Vec3f>>(std::move(texel))).get();
+        std::memcpy(byName.at(name).field, &t, sizeof t);
+    }
     void set(std::string const& name, float v) { set(name, std::vector<float>{v}); }
     void set(std::string const& name, std::vector<float> const& v)
     {
@@ -94,6 +101,8 @@ struct Subject {
             *reinterpret_cast<int*>(row.field) = static_cast<int>(v.at(0));
         else if (row.type == "texture2D")
             texture(name, [=](Vec2f) { return Vec4f(v.at(0), v.at(1), v.at(2), v.at(3)); });
+        else if (row.type == "TextureCube")
+            cube(name, [=](Vec3f) { return Vec4f(v.at(0), v.at(1), v.at(2), v.at(3)); });
         else {
             EXPECT_EQ(v.size() * sizeof(float), row.size) << name;
             std::memcpy(row.field, v.data(), std::min(row.size, v.size() * sizeof(float)));
