@@ -15,9 +15,7 @@ struct Paint : test::Subject {
         set("baseColor=0,0,0 coatRoughValue=.1 I=.6,0,-.8");
         set(settings);
         host.onNoise = [](Vec4f p) {
-            float const waves = std::sin(2.1f * p.x + 1.3f * p.y)
-                + std::sin(1.7f * p.y - 2.9f * p.z) + std::sin(2.3f * p.z + 0.7f * p.x);
-            return 0.5f + waves / 6.1f;
+            return 0.5f + 0.4f * std::sin(2.1f * p.x + 1.3f * p.y) * std::cos(2.9f * p.z - p.x);
         };
         host.onCellNoise = [](Vec3f p) {
             float const cell = std::floor(p.x) + 57 * std::floor(p.y) + 113 * std::floor(p.z);

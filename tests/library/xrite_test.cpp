@@ -130,10 +130,9 @@ TEST(CarPaint, FlakesGlintNearAndFadeFarWithTheSameBrightness)
     struct Look {
         double mean = 0, deviation = 0;
     };
-    auto const look = [&](float distance, Vec3f L, float coarseness = 0.656f) {
+    auto const look = [&](float distance, Vec3f L) {
         Paint p("flakeColor=.1,.1,.1 flakeColor2=.1,.1,.1 fresnel=0,0,1,1");
         auto& normals = p.gaussianFlakes();
-        p.set("coarseness", coarseness);
         p.state.E = {0, 0, distance};
         p.host.addLight(normalize(L), kWhite);
         Look seen;

@@ -101,7 +101,7 @@ struct Subject {
             *reinterpret_cast<int*>(row.field) = static_cast<int>(v.at(0));
         else if (row.type == "texture2D")
             texture(name, [=](Vec2f) { return Vec4f(v.at(0), v.at(1), v.at(2), v.at(3)); });
-        else if (row.type == "TextureCube")
+        else if (row.type == "textureCube")
             cube(name, [=](Vec3f) { return Vec4f(v.at(0), v.at(1), v.at(2), v.at(3)); });
         else {
             EXPECT_EQ(v.size() * sizeof(float), row.size) << name;
