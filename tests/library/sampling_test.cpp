@@ -257,7 +257,7 @@ TEST(SamplingTable, ValuesStayFiniteAtTheEndsOfEveryRange)
             Subject s(name);
             for (Registered const& row : s.rows.rows)
                 for (std::size_t at = 0; at < row.size; at += sizeof(float))
-                    if ((row.type == "float" || row.type.starts_with("vec")) && i % 4 != 0)
+                    if ((row.type == "float" || row.type.starts_with("Vec")) && i % 4 != 0)
                         std::memcpy(row.field + at, &kEnds[random.engine() % 7], sizeof(float));
             Vec3f const d = random.unit();
             float const height = std::max(std::fabs(d.z), 1e-6f) * (i % 3 ? 1.0f : 1e-5f);
