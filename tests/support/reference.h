@@ -1,13 +1,9 @@
-/// Formulas of the physical materials in double precision, in the form that their models state.
+/// Hits at random for tests of whole materials.
 #pragma once
 
 #include "support/record.h"
 
-#include <numbers>
-
 namespace zsi::test {
-
-using D3 = Vec3d;
 
 /// Tangent frame of a normal; the tangent goes through the 3x3 part as a row vector.
 struct DFrame {
@@ -42,31 +38,6 @@ private:
     }
 };
 
-inline double schlickOf(double r0, double c)
-{
-    return clampUnit(r0 + std::pow(1 - clampUnit(c), 5) * (1 - r0));
-}
-inline double tan2Of(double c) { return (1 - c * c) / (c * c); }
-inline double smithG1(double a2, Vec3d w, Vec3d h)
-{
-    return dot(w, h) * w.z > 0 ? 2 / (1 + std::sqrt(1 + a2 * tan2Of(w.z))) : 0;
-}
-inline double ggxOf(double a2, double c)
-{
-    double const k = tan2Of(c) + a2;
-    return c > 0 ? a2 / (std::pow(c, 4) * std::numbers::pi * k * k) : 0;
-}
-/// Fade of lights over the horizon: nothing up to 0.05, all from 0.25 on.
-inline double fadeOf(double cosine)
-{
-    double const x = clampUnit((cosine - 0.05) / 0.2);
-    return x * x * (3 - 2 * x);
-}
-inline double reflectedOf(double a2, Vec3d v, Vec3d l, Vec3d h)
-{
-    return smithG1(a2, v, h) * smithG1(a2, l, h) * ggxOf(a2, h.z) / (4 * std::fabs(v.z * l.z));
-}
-
 /// A hit with everything at random: P and E, normals that lean apart a little, tangent and uv at
 /// the offsets of the physical materials, media, an object transform that turns and scales.
 inline ShadeState randomHit(Random& random, bool front)
@@ -88,16 +59,4 @@ inline ShadeState randomHit(Random& random, bool front)
     setAttribute(s, 48, Vec2f(random.in(0, 1), random.in(0, 1)));
     return s;
 }
-inline Vec3f tangentOf(ShadeState const& s)
-{
-    Vec3f t;
-    std::memcpy(&t, s.attributes + 36, sizeof t);
-    return t;
-}
-/// The shading frame of a hit whose normal, times `side`, nothing bends.
-inline DFrame frameOf(ShadeState const& s, double side)
-{
-    return {tangentOf(s), Vec3d(s.N) * side, s.objectToWorld};
-}
-
 } // namespace zsi::test
