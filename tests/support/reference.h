@@ -5,39 +5,6 @@
 
 namespace zsi::test {
 
-/// Tangent frame of a normal; the tangent goes through the 3x3 part as a row vector.
-struct DFrame {
-    Vec3d t, b, n;
-
-    DFrame(Vec3f tangent, Vec3d normal, Mat4f const& toWorld)
-        : n(normal)
-    {
-        float const in[3] = {tangent.x, tangent.y, tangent.z};
-        for (int row = 0; row < 3; ++row)
-            t = t
-                + Vec3d(Vec3f(toWorld.m[4 * row], toWorld.m[4 * row + 1], toWorld.m[4 * row + 2]))
-                    * double(in[row]);
-        settle();
-    }
-    /// The normal by slopes along tangent and bitangent, which turn after it.
-    void bend(double du, double dv, bool unit)
-    {
-        n = n + t * du + b * dv;
-        if (unit)
-            n = normalize(n);
-        settle();
-    }
-    Vec3d in(Vec3d d) const { return {dot(t, d), dot(b, d), dot(n, d)}; }
-    Vec3d out(Vec3d d) const { return t * d.x + b * d.y + n * d.z; }
-
-private:
-    void settle()
-    {
-        t = normalize(t - n * dot(t, n));
-        b = normalize(cross(n, t));
-    }
-};
-
 /// A hit with everything at random: P and E, normals that lean apart a little, tangent and uv at
 /// the offsets of the physical materials, media, an object transform that turns and scales.
 inline ShadeState randomHit(Random& random, bool front)
