@@ -220,6 +220,30 @@ TEST(BackgroundGeometry, GradesContrastThenGainThenSaturation)
     }
 }
 
+/// Without saturation a cube is grey, whichever way it is seen: by a reflection ray, mirrored
+/// sharply, mirrored blurred, as light of the sky.
+TEST(BackgroundGeometry, CubesAreGradedWhereverTheyAreSeen)
+{
+    Cube cube([](Vec3f) { return Vec4f(0.5f, 0.25f, 1, 1); });
+    for (int const seen : {0, 1, 2, 3})
+        for (bool const own : {false, true}) {
+            Ground g;
+            BackgroundGeometry& s = g.shader;
+            TextureSamplerCube* const cubes[] = {&s.reflectCube, &s.reflectCube, &s.specularCube,
+                                                 &s.diffuseCube};
+            cubes[seen]->texture = &cube;
+            s.useCubeReflection = true;
+            s.diffuseColor = grey(seen == 3 ? 1 : 0);
+            s.specularColor = grey(seen == 3 ? 0 : 1);
+            g.state.rayType = seen == 0 ? 2 : 1;
+            bool const grey = !own || seen < 2; // the others have no saturation of their own
+            (own ? s.reflectIBLChannelSatValue : s.globalIBLSatValue) = 0;
+            Vec4f const c = g.shade();
+            EXPECT_GT(c.x, 0);
+            EXPECT_EQ(std::fabs(c.x - c.z) < 1e-6f, grey) << seen << own;
+        }
+}
+
 TEST(BackgroundGeometry, ShadowRaysStopAtGroundThatFacesUp)
 {
     // ray type, height of the normal, light that passes

@@ -67,6 +67,7 @@ void expectGrades()
         saturation              | | 8 4 16       0.5 1    0 9 9 9     0.5  7 5 11
         all, in order           | | 8 4 16       0.5 0.5  1 2 0.5 4   0.5  7.65625 3.96875 19.90625
         x and y are added first | | 1 4e8 -16e8  0.5 1    2 1 1 1     1    0 0 0
+        before z                | | 4e8 1 -8e8   0.5 1    2 1 1 1     1    0 0 0
         nothing is clamped      | | 8 4 16       0.5 -1   0 9 9 9     1    -7 -3 -15)"))
         for (bool const reflects : {false, true}) {
             Sky<Environment> sky;
