@@ -184,14 +184,21 @@ void corvid_Mtl_MetallicPaint::f_calculateColors(IShaderAPI* api, ShadeState con
     if (!(paint.flakeAlbedo() == kBlack))
         out.reflection += traced(api, state, paint, {false, false, true});
 
-    // The base gathers. Gathered rays know what stands in their way, ambient light does not.
+    // The base gathers what it sends on alike from everywhere, and asks along a direction of its
+    // own for the rest. Gathered rays know what stands in their way, ambient light does not.
     out.indirectWeight = paint.baseAlbedo();
     if (out.indirectWeight == kBlack)
         return;
-    Vec3f const ambient =
+    out.indirect =
         occludedDiffuse(api, out.indirectWeight, api->ambientLight(&state.P, &N), state.P, N);
-    out.indirect = ambient
-        + api->indirectDiffuse(&state.P, &N, maxComponent(out.indirectWeight)) * out.indirectWeight;
+    Vec3f const even = paint.evenAlbedo();
+    if (!(even == kBlack))
+        out.indirect += api->indirectDiffuse(&state.P, &N, maxComponent(even)) * even;
+    Vec3f weight;
+    Vec3f const L = paint.restDirection(api->random2D(), weight);
+    float cosine;
+    if (paint.lights(L, cosine) && !(weight == kBlack))
+        out.indirect += api->traceSpecular(&state.P, &L, 0.0f, maxComponent(weight)) * weight;
 }
 
 void corvid_Mtl_MetallicPaint::shade(IShaderAPI* api, ShadeState& state) const

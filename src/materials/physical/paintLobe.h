@@ -45,6 +45,8 @@ public:
         broad_ = again_ * (lostV_ / (1.0f - mean));
     }
 
+    /// What the value times pi is at least.
+    Vec3f least() const { return color_ * (scale_ * (1.0f - rough_)); }
     /// Share of the light along v that leaves.
     Vec3f albedo() const { return color_ * (1.0f - lostV_) + again_ * lostV_; }
     /// Scattering value times pi.
@@ -132,10 +134,7 @@ public:
             return sum;
         float const passedL = coat_.passed(lc.z);
         if (layers.base && bare_ > 0.0f) {
-            // What the coat throws back from below reaches the base again.
-            sum.under = base_(l)
-                * (bare_ * coat_.passedV() * passedL * kInvPi
-                   / maxOf(coat_.meanPassed() * kHeadroom, 1e-6f));
+            sum.under = base_(l) * (baseScale() * passedL * kInvPi);
             sum.pdf += chance.base * l.z * kInvPi;
         }
         if (layers.flakes && flakes_.coverage() > 0.0f) {
@@ -180,6 +179,23 @@ public:
     float coatAlbedo() const { return coat_.albedo(); }
     /// Shares of the light along v that base and flakes send back.
     Vec3f baseAlbedo() const { return base_.albedo() * (coat_.passedV() * bare_); }
+    /// The part of the base that sends on light alike from everywhere, for light that is gathered
+    /// around the normal. A coat passes less than this share of its mean only within seven degrees
+    /// of the horizon, from where hardly any light falls on the base.
+    Vec3f evenAlbedo() const
+    {
+        return base_.least() * (kEvenShare * coat_.meanPassed() * baseScale());
+    }
+    /// A direction for the rest of the base, world space, and the weight of what is seen there.
+    Vec3f restDirection(Vec2f u, Vec3f& weight) const
+    {
+        Vec3f const l = FlakeLobe::cosineDirection(u);
+        Vec3f const direction = toWorld(frames_.base, l);
+        float const passedL = coat_.passed(toLocal(frames_.coat, direction).z);
+        Vec3f const rest = base_(l) * (baseScale() * passedL) - evenAlbedo();
+        weight = {maxOf(rest.x, 0.0f), maxOf(rest.y, 0.0f), maxOf(rest.z, 0.0f)};
+        return direction;
+    }
     Vec3f flakeAlbedo() const
     {
         return colors_.flakeAt(v_.z) * (coat_.passedV() * flakes_.coverage());
@@ -204,6 +220,12 @@ private:
         return {coat / sum, base / sum, flakes / sum};
     }
 
+    /// Of what passes the coat along v and is sent on by the base: what the coat throws back from
+    /// below reaches the base again.
+    float baseScale() const
+    {
+        return bare_ * coat_.passedV() / maxOf(coat_.meanPassed() * kHeadroom, 1e-6f);
+    }
     Vec3f folded(Vec3f d) const { return d - Ng_ * (2.0f * dot(d, Ng_)); }
 
     /// A colour of flakes times what passes the coat both ways, with what the coat throws back to
@@ -238,6 +260,7 @@ private:
     float bare_;
     /// Of what passes the coat on the way out: a relief throws a little more than the mean through.
     static constexpr float kHeadroom = 1.002f;
+    static constexpr float kEvenShare = 0.5f;
 };
 
 } // namespace zsi
