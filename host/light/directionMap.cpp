@@ -47,8 +47,8 @@ DirectionMap::DirectionMap(std::function<float(Vec3f)> const& radiance)
                 cells[static_cast<std::size_t>(y) * kWidth + static_cast<std::size_t>(x)];
             for (int i = 0; i < kFine * kFine; ++i) {
                 float const value =
-                    radiance(direction(static_cast<float>(x) + (float(i % kFine) + 0.5f) / kFine,
-                                       static_cast<float>(y) + (float(i / kFine) + 0.5f) / kFine));
+                    radiance(direction(static_cast<float>(x) + (float(i & 1) + 0.5f) / kFine,
+                                       static_cast<float>(y) + (float(i >> 1) + 0.5f) / kFine));
                 cell += value > 0.0f && std::isfinite(value) ? static_cast<double>(value) : 0.0;
             }
             sum += cell;

@@ -58,7 +58,7 @@ inline float lossOfNarrow(Vec3f w, Vec2f s, float a)
     float const tan2 = (w.x * w.x + w.y * w.y) * (invZ * invZ), steep2 = s.x * s.x + s.y * s.y;
     float const k = 2.0f / (1.0f + steep2 + a * a);
     float const reach = maxOf(1.504f * a, 1e-6f), tangent = std::sqrt(tan2);
-    float loss = 0.0f;
+    float lost = 0.0f;
     for (float const side : {lean, -lean}) {
         float const half = 0.5f * (1.0f + side), y = 2.0f * k * half, high = y - 1.0f;
         // Gradients: of u the tangent t of w; of B k (t - y s); of B - u/2 that less t/2.
@@ -68,13 +68,13 @@ inline float lossOfNarrow(Vec3f w, Vec2f s, float a)
             return reach * std::sqrt(maxOf(g2, 0.0f)) + 1e-6f;
         };
         float const reachB = reachOf(k), reachHalf = reach * 0.5f * tangent + 1e-6f;
-        loss += softRamp(half, reachHalf) - softRamp(high, reachB);
+        lost += softRamp(half, reachHalf) - softRamp(high, reachB);
         if (k >= 1.0f) // the wall is shown whole before its light is
-            loss += softRamp(high - half, reachOf(k - 0.5f));
+            lost += softRamp(high - half, reachOf(k - 0.5f));
         else
-            loss += softRamp(high - 1.0f, reachB) - softRamp(half - 1.0f, reachHalf);
+            lost += softRamp(high - 1.0f, reachB) - softRamp(half - 1.0f, reachHalf);
     }
-    return loss;
+    return lost;
 }
 
 /// The same for widths up to a half: wide lobes are four narrower ones about the same mean.

@@ -190,11 +190,11 @@ public:
     Vec3f restDirection(Vec2f u, Vec3f& weight) const
     {
         Vec3f const l = FlakeLobe::cosineDirection(u);
-        Vec3f const direction = toWorld(frames_.base, l);
-        float const passedL = coat_.passed(toLocal(frames_.coat, direction).z);
+        Vec3f const way = toWorld(frames_.base, l);
+        float const passedL = coat_.passed(toLocal(frames_.coat, way).z);
         Vec3f const rest = base_(l) * (baseScale() * passedL) - evenAlbedo();
         weight = {maxOf(rest.x, 0.0f), maxOf(rest.y, 0.0f), maxOf(rest.z, 0.0f)};
-        return direction;
+        return way;
     }
     Vec3f flakeAlbedo() const
     {

@@ -87,7 +87,7 @@ public:
     {
         // From the cumulative log(1 + cos^2 / a^2). The table's logarithm is never too small: what
         // it adds lies above cosine 1 and is turned down.
-        float const z2 = a2_ * (std::exp(u.y * logRange()) - 1.0f), side2 = 1.0f - z2;
+        float const z2 = a2_ * std::expm1(u.y * logRange()), side2 = 1.0f - z2;
         float const r = std::sqrt(maxOf(side2, 0.0f)), phi = 2.0f * kPi * u.x;
         return {r * std::cos(phi), r * std::sin(phi), side2 < 0.0f ? -1.0f : std::sqrt(z2)};
     }
