@@ -16,7 +16,7 @@ namespace {
 constexpr int kBandRows = 64; ///< of files in rows, which readers take faster by the dozen
 
 /// The type that a file's values are kept in.
-std::pair<TexelType, OIIO::TypeDesc> keptAs(OIIO::TypeDesc type)
+std::pair<TexelType, OIIO::TypeDesc> keptAs(OIIO::TypeDesc const& type)
 {
     switch (type.basetype) {
     case OIIO::TypeDesc::UINT8:

@@ -89,7 +89,7 @@ template <class F>
 auto withType(TexelType type, F&& f)
 {
     switch (type) {
-    case TexelType::UInt8:
+    case TexelType::UInt8: // NOLINT(bugprone-branch-clone): alike but for the type
         return f(std::uint8_t());
     case TexelType::UInt16:
         return f(std::uint16_t());
@@ -167,6 +167,7 @@ void TexelCodec::encode(float const* values, std::size_t count, std::byte* texel
                 v = v >= 0.0f && v <= 1.0f ? encodeSrgbFast(v) : encodeSrgb(v);
             T code;
             if constexpr (std::is_integral_v<T>)
+                // NOLINTNEXTLINE(bugprone-incorrect-roundings): never negative
                 code = static_cast<T>(clamp01(v) * static_cast<float>(T(~T(0))) + 0.5f);
             else
                 code = T(v);

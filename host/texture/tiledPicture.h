@@ -62,7 +62,7 @@ public:
 
 private:
     struct LevelWriter;
-    void add(std::size_t level, std::byte const* texels, float const* values);
+    void add(std::size_t index, std::byte const* texels, float const* values);
 
     TiledPicture picture_;
     std::vector<LevelWriter> writers_;
