@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Every entry point of every class of the library against a neutral in-memory host, ns per call.
 /// Parameters are at their defaults (unset matrices: identity), textures answer with a constant.
 #include "exports/catalogue.h"

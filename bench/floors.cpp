@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// What one scalar call costs at the very least, for the arithmetic that the formulas ask for:
 /// hand-written kernels that the library's stand beside.
 #include "harness.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Kernels that are timed, or counted in instructions, on the same fixed inputs.
 ///
 ///   build/bench/kernels [FILTER [MS]]     ns per call: median, min, max of 15 interleaved rounds

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The library's entry points on the inputs of the floors, with the settings that the bounds in
 /// docs/performance.md are stated for.
 #include "harness.h"

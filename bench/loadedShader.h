@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// A shader from the loaded library with its parameters by name: all that a benchmark needs.
 #pragma once
 

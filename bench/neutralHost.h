@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// An in-memory host: four lights, constant rays, random numbers from the caller.
 #pragma once
 

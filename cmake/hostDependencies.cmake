@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # What a program needs that links to the host library: the same libraries under the names that
 # find_package, pkg-config and Debian know them by.
 set(zsi_host_packages "embree 3" OpenImageIO Imath TBB assimp fmt)

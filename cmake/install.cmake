@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # What `cmake --install` puts below the prefix. Two components: `runtime`, the command and the
 # shaders; `development`, what others compile and link against.
 include(CMakePackageConfigHelpers)

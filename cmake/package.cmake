@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # `cpack -G DEB` makes two packages: zsi, and zsi-dev for those who compile against it.
 set(CPACK_PACKAGE_NAME zsi)
 set(CPACK_PACKAGE_VENDOR "The Zephyr shaders authors")

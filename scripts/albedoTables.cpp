@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Writes src/materials/legacy/albedoTables.h: what perfectly reflecting facets send out after one
 // bounce, of the light along a direction.
 //

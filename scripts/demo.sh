@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Installs what is missing, builds, renders the demo scene, says where the picture is.
 set -euo pipefail
 cd "$(dirname "$0")/.."

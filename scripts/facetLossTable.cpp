@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Writes src/materials/physical/shared/facetLossTable.h: what one bounce on GGX facets loses.
 //
 //   g++ -std=c++20 -O2 scripts/facetLossTable.cpp -o build/facetLossTable

@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Renders every scene of scenes/gallery into docs/gallery, with a contact sheet.
 #   usage: scripts/gallery.sh [NAME...]     only these, such as voSpotLight
 # SAMPLES sets the samples per pixel (default 96).

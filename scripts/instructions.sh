@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Instructions per call of the kernels whose name contains FILTER, by valgrind's callgrind:
 # repeatable to the instruction for one build. Three columns: the whole pass with its loop and the
 # filling of the record; the entry point with all it calls; its bound (bench/bounds.txt).

@@ -1,11 +1,12 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Formatting, clang-tidy and cppcheck over the sources, licences of sources and assets; silent but
 # for what is wrong.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 . scripts/lib/packages.sh
 install_missing "${packages_build[@]}" "${packages_test[@]}" "${packages_lint[@]}"
-check_spdx=no # `yes` once the sources have their lines
+check_spdx=yes
 
 failed=0
 complain() {

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Writes src/materials/physical/paintTables.h: what the layers of metallic paint send back.
 //
 //   g++ -std=c++20 -O2 scripts/paintTables.cpp -o build/paintTables

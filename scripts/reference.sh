@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Writes docs/shaders/ from what the library says of itself. With --check: fails when the pages are
 # not current.
 set -euo pipefail

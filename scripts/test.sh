@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Installs what is missing, builds, runs every test.
 #   usage: scripts/test.sh            the optimised build and its tests
 #          scripts/test.sh --all      every gate that a change has to pass

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Writes what the parameter rows and the headers say that a host cannot hear at registration, into
 // the JSON file that lies beside the library.
 //

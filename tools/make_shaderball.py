@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
 """Writes assets/shaderball.ply: a hollow ball with a wedge cut out, closed and watertight.
 
 The outer sphere (radius 1) and the inner one (radius 0.8) are joined by the two faces of the cut,

@@ -1,4 +1,5 @@
 #!/usr/bin/env python3
+# SPDX-License-Identifier: Apache-2.0
 """Writes the small textures of the gallery scenes into assets/textures/. All tile."""
 import math
 import random

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The host library in a program of one's own; docs/host.md explains it.
 //   embed SHADER_FOLDER PICTURE
 #include "base/error.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A host of one sphere, one distant light and a sky: loads a material, sets a parameter, shades.
 //   tinyHost LIBRARY CLASS PICTURE.ppm PARAMETER NUMBER...
 #include <array>

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A shader library with one class: light in flat bands, a round highlight, a bright rim.
 #include <new>
 #include <zsi/vecmath.h>

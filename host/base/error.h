@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The one kind of error that bad input leads to.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Integer hashing for random sequences and noise.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Suggestions for names that a user mistyped.
 #pragma once
 

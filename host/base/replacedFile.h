@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Writing a file so that nothing half-written is ever seen.
 #pragma once
 

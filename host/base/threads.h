@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Work on several threads at once.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// What is known of a shader class, for people and for programs.
 #pragma once
 

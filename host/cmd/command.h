@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// What the subcommands of `zsi` share. Each adds its options to the command line and gives back
 /// what to run.
 #pragma once

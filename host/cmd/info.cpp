@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // zsi info: what the loaded libraries offer.
 #include "base/error.h"
 #include "base/names.h"

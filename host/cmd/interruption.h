@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Ctrl-C while a picture is made.
 #pragma once
 

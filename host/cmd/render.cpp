@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // zsi render: a scene file to a picture file.
 #include "render/render.h"
 #include "base/error.h"

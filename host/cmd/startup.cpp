@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What the libraries under the host need before they run: some start threads and allocate as they
 // are loaded, and end the program when they cannot.
 #include <algorithm>

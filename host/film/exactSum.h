@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Sums of samples that do not depend on the order of adding.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// What a picture grows from: sums and counts of samples, pixel by pixel and layer by layer.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// A rectangle of pixels.
 #pragma once
 

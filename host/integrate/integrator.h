@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// How light is gathered along camera rays.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// What layers of a film can show.
 #pragma once
 

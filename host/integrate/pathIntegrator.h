@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Paths by the materials' `sample` and `transfer`.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Directions drawn in proportion to a radiance.
 #pragma once
 

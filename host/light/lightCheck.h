@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Lights that cannot light anything.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// What the scene's lights bring to a point.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Values of a scene given apart from its file.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Typed, checked access to the values of a JSON tree.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// JSON files as trees that remember where each value stands.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "load/loadScene.h"
 
 #include "base/error.h"

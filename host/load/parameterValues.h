@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// From JSON to what a shader's parameters take.
 #pragma once
 

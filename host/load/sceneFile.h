@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Scene files put together: one file, and what it includes.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Parameters without a default that a scene forgot.
 #pragma once
 

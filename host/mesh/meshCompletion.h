@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Fills in what a mesh lacks and takes out what rays cannot meet.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Meshes that a scene makes without a file, complete.
 #pragma once
 

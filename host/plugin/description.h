@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// What a shader library says about its classes in a file beside it.
 #pragma once
 

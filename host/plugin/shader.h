@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Shader objects that can be described and set by name.
 #pragma once
 

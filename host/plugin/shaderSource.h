@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Where shaders come from, whatever holds their code.
 #pragma once
 

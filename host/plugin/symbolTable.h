@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Names in the dynamic symbol table of a shared object, read from the file.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Rays of a camera.
 #pragma once
 

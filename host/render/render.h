@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Renders a scene into a picture: one use of a session.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Renders parts of a scene's picture, again and again while the scene is changed.
 #pragma once
 

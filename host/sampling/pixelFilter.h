@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The filter that turns samples into pixels.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Random numbers of one pixel: low-discrepancy over its samples, fixed by seed and position.
 #pragma once
 

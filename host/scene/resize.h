@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The same view with more or fewer pixels.
 #pragma once
 

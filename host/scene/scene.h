@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// A scene as the renderer takes it: plain data, loaded and checked. World is right-handed,
 /// z up; lengths are in scene units; colours linear RGB.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The media that a ray is in.
 #pragma once
 

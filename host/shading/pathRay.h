@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// A ray on its way through the scene.
 #pragma once
 

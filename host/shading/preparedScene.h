@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// A scene made ready for rendering: acceleration structure and what each material needs.
 #pragma once
 

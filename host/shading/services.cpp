@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The services of a shading call. docs/services.md describes them.
 #include "sampling/directions.h"
 #include "shading/noise.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// One thread's shading calls: the record that a material gets, and the services behind it.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Resampling by area: which cells of one even division lie in which of another.
 #pragma once
 

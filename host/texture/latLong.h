@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Latitude-longitude pictures as functions of direction.
 #pragma once
 

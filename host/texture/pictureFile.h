@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Reading image files, row by row and to the end.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// How texels lie in memory: at the depth of their file, made linear when they are looked up.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// How wide a look-up looks: a hint from the renderer around calls of shaders.
 #pragma once
 

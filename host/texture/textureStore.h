@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Textures from image files, as shaders see them.
 #pragma once
 

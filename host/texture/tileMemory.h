@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Where tiles lie: in memory as long as they fit under a limit, in scratch files beyond it.
 #pragma once
 

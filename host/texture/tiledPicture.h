@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Pictures as look-ups read them: square tiles of the file's own depth, in levels of half the
 /// size.
 #pragma once

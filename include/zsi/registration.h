@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Optional help for a host author: whatever type a parameter has, one function hears of it.
 /// Standard library only.
 #pragma once

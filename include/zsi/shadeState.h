@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The record of one shading request: the host fills it, a shader reads it and writes results.
 #pragma once
 

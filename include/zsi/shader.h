@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Shader classes as the host sees them, and the two functions that a library exports per class.
 #pragma once
 

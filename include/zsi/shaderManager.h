@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The host's registration interface: what a shader tells about itself in `registerShader`.
 #pragma once
 

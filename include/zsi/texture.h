@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Texture handles, and the texture object that a host puts behind them.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Value types of the shading language: what parameters, records and services are made of.
 ///
 /// Plain data with 4-byte alignment and no padding (texture handles: two 8-byte words).

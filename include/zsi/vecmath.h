@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Arithmetic on the value types, for shaders and hosts that have none of their own.
 /// Not part of `zsi.h`, so that a host's own operators never clash with these.
 /// Sums run x, y, z in order; no function substitutes a value for a degenerate input.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Everything a host needs to load and call a shader library.
 #pragma once
 

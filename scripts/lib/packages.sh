@@ -1,3 +1,4 @@
+# SPDX-License-Identifier: Apache-2.0
 # Debian packages of the project, and how the scripts get what is missing. Sourced, not run.
 
 # openimageio-tools: OpenImageIO's CMake package refuses to load without its programs.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Colour grading with a gain source, for materials that look up cube maps and pictures of their
 /// own.
 #pragma once

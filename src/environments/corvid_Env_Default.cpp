@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "environments/corvid_Env_Default.h"
 
 namespace zsi {

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Image-based lighting that the environments share: cube lookup and colour grading.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The grading parameters that both environments begin with.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Bump of a normal map that was laid on by `textureMapping.h`.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// How a channel's colour comes to a point of a surface: a plain colour, or a picture laid on by
 /// UV, planar, box or cylindrical projection.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The catalogue: every class of the library, once. Exports and tests derive from this list.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The exported pair of plain C functions of every class.
 #include "exports/catalogue.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// What the point light and the spot light share.
 #pragma once
 

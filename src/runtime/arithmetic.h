@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Constants and clamps that the shaders share, beside the contract's vector arithmetic.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Built-in functions of the shading language that are more than plain arithmetic.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// How a shader states its parameters once: `SHADER(Class, mask, ROWS)`.
 ///
 /// ROWS is a macro `ROWS(P, U, A)` that lists, in registration order,

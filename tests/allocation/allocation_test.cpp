@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // A process of its own: it replaces the global allocation operators that the library uses.
 #include "support/steadyHost.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The zsi command as a user meets it: what it hands on and how it ends. What the parts below it
 // make of their input is tested there.
 #include "film/imageFile.h"

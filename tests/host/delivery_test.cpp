@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What a scene says reaches the shaders and the picture: each test sees one thing left out,
 // mirrored or swapped.
 #include "film/imageFile.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What the camera sees where it meets nothing.
 #include "scene/resize.h"
 #include "support/hostScene.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // From a scene file to picture files.
 #include "film/imageFile.h"
 #include "load/loadScene.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "plugin/shaderLibrary.h"
 #include "plugin/symbolTable.h"
 #include "support/hostLibraries.h"

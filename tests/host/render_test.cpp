@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Small pictures with known answers.
 #include "support/hostScene.h"
 

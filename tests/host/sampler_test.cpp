@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "sampling/pixelFilter.h"
 #include "sampling/sampler.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Textures against what their files hold, computed here.
 #include "support/inputError.h"
 #include "support/temporaryFolder.h"

@@ -1,4 +1,5 @@
 #!/usr/bin/env bash
+# SPDX-License-Identifier: Apache-2.0
 # Installs a build into a prefix, moves the prefix, and uses it as others do: the command from its
 # folder, the examples by find_package and by pkg-config, the man page, the Debian packages.
 #   usage: install_test.sh BUILD_FOLDER CMAKE COMPILER GENERATOR

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What holds for every entry point of every class, whatever it shades.
 #include "support/steadyHost.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "environments/BackgroundGeometry.h"
 #include "support/textTable.h"
 

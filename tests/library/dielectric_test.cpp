@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Numbers of the tables: Walter et al. 2007, eq. 21, 33 and 34, and Schlick's reflectance, in
 // double precision, for an index of 1.5 and a reflectance of 1/4.
 #include "materials/physical/corvid_Mtl_Dielectric.h"

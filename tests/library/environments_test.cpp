@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "environments/corvid_Env_Backplate.h"
 #include "environments/corvid_Env_Default.h"
 #include "support/textTable.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // How pictures and masks come to a surface.
 #include "environments/textureMapping.h"
 #include "materials/physical/shared/masking.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The legacy material by numbers worked out by hand: masks, panes, lights, cubes and output.
 #include "support/reference.h"
 #include "support/textTable.h"

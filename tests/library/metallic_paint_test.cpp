@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Metallic paint: peel, pearl, flakes near and far, and what falls on the base alone.
 #include "support/textTable.h"
 

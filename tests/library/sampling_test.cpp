@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Every class with `transfer` and `sample`, asked the same questions: do directions follow the
 // density that they report, do they carry the value of `transfer`, is their mean weight its
 // integral, does no more light come back than falls in, is the value reciprocal, does one light

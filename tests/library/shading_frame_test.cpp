@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "materials/physical/shared/proceduralNormal.h"
 #include "materials/physical/shared/safeReflect.h"
 #include "materials/physical/shared/shadingFrame.h"

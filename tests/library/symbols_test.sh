@@ -1,4 +1,5 @@
 #!/bin/sh
+# SPDX-License-Identifier: Apache-2.0
 # The shared object as the linker sees it: symbols_test.sh LIBRARY CATALOGUE
 # It exports two functions for each class of the catalogue, needs the language's libraries only,
 # runs no code when it is loaded and keeps no variables, but for the compiler's own.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The utility materials.
 #include "materials/utility/corvid_Mtl_AmbientOnly.h"
 #include "materials/utility/corvid_Mtl_Mirror.h"

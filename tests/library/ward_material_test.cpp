@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The Ward material by numbers worked out by hand: what each channel does to the lobes, what a
 // light, a ray and a random number give, and what the host is asked for.
 #include "support/textTable.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Noise, brickwork and the wiring of the nine Ward variants, seen through the entry points.
 #include "support/textTable.h"
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // The measured car paint: its curves, flakes near and far, and the light that each part brings.
 #include "materials/legacy/XRite.h"
 #include "support/lobeSampling.h"

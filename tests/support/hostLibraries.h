@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The shader libraries that tests of the host use.
 #pragma once
 

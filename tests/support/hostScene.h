@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Small scenes in memory, of things whose light is known.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Error messages of the host, as tests look at them.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The shared object as a host sees it: its dynamic symbols, and shaders made through them.
 #pragma once
 

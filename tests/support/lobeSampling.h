@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Checks of glossy lobes that need no knowledge of their formulas beyond a GGX-like shape: energy,
 /// and whether sampled directions follow the density that they report.
 #pragma once

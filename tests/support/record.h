@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// For all tests of shading: a plain hit, vectors in double, deterministic random numbers.
 #pragma once
 

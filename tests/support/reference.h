@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Hits at random for tests of whole materials.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// A host for tests: answers every service from values that the test sets, and logs each call.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Requests and a host for tests that hold for any shader: random or hostile, repeatable, and
 /// without allocation, so that the tests can count the allocations of the shader alone.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// A folder that goes when the test ends.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Tests as tables of text: a shader of the loaded library, set by "name=value" words, and lines
 /// of settings and numbers.
 #pragma once

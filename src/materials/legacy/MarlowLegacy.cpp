@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What the legacy material shows, and what it lets through to lights.
 #include "materials/legacy/MarlowLegacy.h"
 

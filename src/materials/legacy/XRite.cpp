@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "materials/legacy/XRite.h"
 
 #include "environments/iblGrading.h"

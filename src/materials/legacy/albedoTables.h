@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Albedo of perfectly reflecting facets after one bounce; made by scripts/albedoTables.cpp.
 /// Nodes in equal steps: sqrt(width) up to 1, and c (1 + width) / (c + width) with c the
 /// cosine of the direction.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Reflectance as a curve of four numbers, fitted to measured clear coats.
 #pragma once
 

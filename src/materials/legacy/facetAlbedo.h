@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Light that leaves perfectly reflecting facets after one bounce, by width and direction.
 #pragma once
 

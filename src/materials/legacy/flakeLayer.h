@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Flakes in a paint: which of them a view ray meets, and what they mirror.
 ///
 /// A flake is a facet of slope s (the tangent-plane part of its normal over the upright part) with

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Highlights: what three numbers make of them, and their lobes.
 #pragma once
 

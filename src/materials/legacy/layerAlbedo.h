@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// How the light that leaves a hit is divided among the layers of a surface.
 #pragma once
 

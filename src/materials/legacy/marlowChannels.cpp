@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // What the parameters and textures of the legacy material say at a hit.
 #include "environments/mappedBump.h"
 #include "materials/legacy/MarlowLegacy.h"

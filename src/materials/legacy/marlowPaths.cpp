@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 // Where the legacy material sends light on: the layers of `shade`, drawn one at a time.
 #include "materials/legacy/MarlowLegacy.h"
 #include "materials/physical/shared/materialSkeleton.h"

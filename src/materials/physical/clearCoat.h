@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Clear varnish over a layer of colour: what it mirrors and what it lets down and up again.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "materials/physical/corvid_Mtl_Dielectric.h"
 
 #include "materials/physical/shared/fresnel.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "materials/physical/corvid_Mtl_Glazing.h"
 
 #include "materials/physical/shared/ggx.h"

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// A gradient ramp over the square: black, grey, white from the middle to the rim.
 #pragma once
 

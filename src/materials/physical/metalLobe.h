@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Reflection of rough metal: one lobe that lights, paths and evaluation share.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Flakes of a metallic paint: those under one footprint, and the lobe that a crowd of them makes.
 ///
 /// A flake is a facet of slope s (the tangent-plane part of its normal over the upright part) with

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Reflection of metallic paint: one set of lobes that lights, paths and traced rays share.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// What the layers of metallic paint send back. Written by scripts/paintTables.cpp.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 #include "materials/utility/corvid_Mtl_Solid.h"
 
 #include "materials/physical/shared/facedNormal.h"

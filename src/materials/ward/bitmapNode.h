@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// A picture laid along the uv attribute or on a box round the reference position.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Networks of procedural textures: where they are asked, and the bump that they make.
 ///
 /// A network is written out in its class: `<NODE>_ROWS(U, path)` states the parameters of a node,

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Two-colour noise of a position: plain, fractal or turbulent.
 #pragma once
 

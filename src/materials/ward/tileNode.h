@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Brickwork over the unit square of a texture coordinate.
 #pragma once
 

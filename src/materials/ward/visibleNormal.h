@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Bumped normals turned back to where the viewer sees them.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// What the channels of the Ward family make of the numbers in their maps.
 #pragma once
 

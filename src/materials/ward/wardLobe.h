@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The Ward lobe in local coordinates (x tangent, y bitangent, z normal): value, direction,
 /// density. `v` is the incident direction and points towards the surface, v.z < 0; `l` and `w`
 /// point away from it.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The Ward material: every shading function of the family, once, over the fields of a class.
 ///
 /// `Fields` is a MaterialShader with the rows of WARD_CHANNELS, MASKING, AMBIENT_OCCLUSION and

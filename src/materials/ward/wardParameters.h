@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Parameter rows of the Ward family, in blocks that a class puts in its own order.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Procedural bumps of the Ward family, built on the host's noise.
 ///
 /// A height pattern takes a point in pattern space and gives a height in 0..1.

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// What the headers of the Ward variants start from: the order of their rows, and the nodes.
 ///
 /// A variant is `corvid_Mtl_Ward` with a network of nodes in some of its channels. Its header lists

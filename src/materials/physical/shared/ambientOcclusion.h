@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Ambient occlusion that most materials carry: parameters, attributes and evaluation.
 #pragma once
 

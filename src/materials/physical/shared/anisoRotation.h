@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Rotation of a shading frame about its normal, for materials with stretched highlights.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The normal that the utility materials shade with.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// What light loses by leaving the facets after one bounce, and what further bounces give back.
 #pragma once
 

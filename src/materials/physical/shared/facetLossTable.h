@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Light that one bounce on GGX facets loses; made by scripts/facetLossTable.cpp, which
 /// tells the nodes and the terms.
 #pragma once

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Reflectance of a dielectric interface.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Trowbridge-Reitz (GGX) facets: of one squared width, reflecting and transmitting; of two widths,
 /// reflecting.
 ///

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Indirect light on a diffuse layer.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// How lights fade in over the horizon.
 #pragma once
 

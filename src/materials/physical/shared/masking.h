@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The mask that cuts a material out: parameters and evaluation.
 #pragma once
 

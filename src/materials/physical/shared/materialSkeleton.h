@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// What `shade` of every masked material has in common, and the front of the physical materials.
 #pragma once
 

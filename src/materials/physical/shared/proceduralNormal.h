@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Procedural bends of the normal: cast-glass ripple and orange peel.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Mirror directions that stay above the geometric surface.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// The local frame of a hit, and the bumps that bend it.
 ///
 /// A frame holds tangent, bitangent, normal. Local coordinates are (along tangent, along

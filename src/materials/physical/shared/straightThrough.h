@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Surfaces that a path goes through unbent.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Channels: a plain value, or a map through a UV transform times an amount.
 #pragma once
 

@@ -1,3 +1,4 @@
+// SPDX-License-Identifier: Apache-2.0
 /// Facets with Gaussian slopes about a tilted mean.
 #pragma once
 
