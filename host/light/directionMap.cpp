@@ -47,7 +47,6 @@ DirectionMap::DirectionMap(std::function<float(Vec3f)> const& radiance)
             double& cell =
                 cells[static_cast<std::size_t>(y) * kWidth + static_cast<std::size_t>(x)];
             for (int i = 0; i < kFine * kFine; ++i) {
-                int const row = i / kFine;
                 float const value =
                     radiance(direction(static_cast<float>(x) + (float(i & 1) + 0.5f) / kFine,
                                        static_cast<float>(y) + (float(i >> 1) + 0.5f) / kFine));
