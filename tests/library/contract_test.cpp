@@ -94,7 +94,8 @@ Lines recorded(std::string const& name)
                 + std::to_string(got.masks.at(0))};
     for (test::Registered const& row : got.rows) {
         std::vector<std::uint32_t> words((row.size + 3) / 4);
-        std::memcpy(words.data(), row.field, row.size);
+        if (row.field) // null for an attribute
+            std::memcpy(words.data(), row.field, row.size);
         lines.push_back(row.field ? line(row.type + " " + row.name, words)
                                   : row.type + " " + row.name + " " + std::to_string(row.kind) + " "
                                 + std::to_string(row.offset));
