@@ -103,7 +103,8 @@ TEST_F(SceneFile, BadScenesSayWhereAndWhatWasExpected)
         expectContains(errorOf([&] { load(scene.text); }), scene.parts);
     }
     for (auto const& [name, part] : {std::pair{"no.json", "no such file"}, {"", "is a folder"}})
-        expectContains(errorOf([&] { loadScene(folder.path / name, libraries()); }), {part});
+        expectContains(errorOf([&, file = folder.path / name] { loadScene(file, libraries()); }),
+                       {part});
 }
 
 TEST_F(SceneFile, WarnsOfUnwrittenParametersThatWillBeRead)

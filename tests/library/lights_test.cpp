@@ -11,7 +11,7 @@ namespace {
 template <class Light>
 void expectLit(Light light, float d, float cosine, float want)
 {
-    constexpr Vec3f kUntouched(7, 7, 7), kShadow(0.25f, 0.5f, 0.75f);
+    static constexpr Vec3f kUntouched(7, 7, 7), kShadow(0.25f, 0.5f, 0.75f);
     test::ScriptedHost host;
     host.onShadow = [](Vec3f, Vec3f) { return kShadow; };
     ShadeState s = test::plainHit();

@@ -125,7 +125,7 @@ TEST(MetallicPaint, SamplesOfAPixelMeetTheSameFlakes)
     test::Random random;
     Paint paint;
     Vec3f const l = normalize({0.4f, 0.2f, 0.8f});
-    auto const shown = [&](float x, float y, unsigned height) {
+    auto const shown = [&](float x, float y, int height) {
         // A hundred flakes a pixel: a tenth of a unit, jittered within the pixel.
         paint.place({0.1f * x, 0.1f * y, 0.3f}, 100);
         paint.state.rasterX = 300 + x;
