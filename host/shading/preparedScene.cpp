@@ -75,8 +75,8 @@ PreparedScene::PreparedScene(Scene const& scene, BuildProgress const& progress)
 {
     for (Shader const& shader : scene_.materials)
         materials_.push_back(prepare(shader));
-    findMixtures();
     environmentChanged();
+    findMixtures();
 }
 
 void PreparedScene::findMixtures()
@@ -90,17 +90,20 @@ void PreparedScene::findMixtures()
         }
 }
 
-void PreparedScene::environmentChanged()
+void PreparedScene::environmentChanged() { skies_ = std::make_unique<Sky[]>(2); }
+
+DirectionMap const& PreparedScene::sky(std::uint32_t rayType) const
 {
-    reflectedSky_ = diffuseSky_ = {};
-    if (!environment())
-        return;
-    Inquiry inquiry(*this);
-    auto const map = [&](std::uint32_t type) {
-        return DirectionMap([&](Vec3f d) { return maxComponent(inquiry.context.sky(type, d)); });
-    };
-    reflectedSky_ = map(kRayReflection);
-    diffuseSky_ = map(kRayDiffuse);
+    std::uint32_t const seenBy = rayType == kRayDiffuse ? kRayDiffuse : kRayReflection;
+    Sky& sky = skies_[seenBy == kRayDiffuse];
+    std::call_once(sky.made, [&] {
+        if (!environment())
+            return;
+        Inquiry inquiry(*this);
+        sky.map =
+            DirectionMap([&](Vec3f d) { return maxComponent(inquiry.context.sky(seenBy, d)); });
+    });
+    return sky.map;
 }
 
 void PreparedScene::materialChanged(std::size_t index)

@@ -6,6 +6,9 @@
 #include "light/lights.h"
 #include "trace/rayScene.h"
 
+#include <memory>
+#include <mutex>
+
 namespace zsi::host {
 
 struct PreparedMaterial {
@@ -58,10 +61,7 @@ public:
         return scene_.environment ? scene_.environment->environment() : nullptr;
     }
     /// Where the environment is brightest, as rays of the type see it.
-    DirectionMap const& sky(std::uint32_t rayType) const
-    {
-        return rayType == kRayDiffuse ? diffuseSky_ : reflectedSky_;
-    }
+    DirectionMap const& sky(std::uint32_t rayType) const;
     PreparedMaterial const& materialOf(SurfacePoint const& s) const
     {
         return materials_[static_cast<std::size_t>(scene_.instances[s.instance].material)];
@@ -71,13 +71,19 @@ public:
                         ShadeState& state) const;
 
 private:
+    /// Made when it is first asked for, by whichever thread that is.
+    struct Sky {
+        std::once_flag made;
+        DirectionMap map;
+    };
+
     void findMixtures();
 
     Scene const& scene_;
     RayScene rays_;
     LightSet lights_;
     std::vector<PreparedMaterial> materials_;
-    DirectionMap reflectedSky_, diffuseSky_;
+    std::unique_ptr<Sky[]> skies_; ///< reflected, diffuse
 };
 
 } // namespace zsi::host

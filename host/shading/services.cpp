@@ -123,12 +123,7 @@ Vec3f ShadingContext::transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMa
     if (scene_.rays().occluded({origin, direction, tMax}, Visibility::Opaque))
         return {0, 0, 0};
 
-    PathRay ray;
-    if (call_)
-        ray = call_->ray;
-    ray.type = kRayShadow;
-    ray.depth += 1;
-    ray.direction = direction;
+    PathRay ray = query(kRayShadow, direction);
     ray.E = E;
     ray.origin = origin;
     if (call_ && E == call_->surface.P)
@@ -160,18 +155,26 @@ Vec3f ShadingContext::transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMa
     return {0, 0, 0};
 }
 
-bool ShadingContext::child(Vec3f const* origin, Vec3f const* direction, float importance,
-                           PathRay& ray, float& scale)
+bool ShadingContext::depart(Vec3f const* origin, Vec3f const* direction, PathRay& ray) const
 {
-    if (!call_ || !isFinite(*origin) || importance <= 0.0f)
+    if (!call_ || !isFinite(*origin))
         return false;
     ray = call_->ray;
     ray.direction = *direction;
     if (!unit(ray.direction))
         return false;
     ray.E = *origin;
-    ray.ignored = 0;
     ray.origin = rayStart(*origin, ray.direction);
+    ray.ignored = 0;
+    ray.skyDensity = std::numeric_limits<float>::infinity();
+    return true;
+}
+
+bool ShadingContext::child(Vec3f const* origin, Vec3f const* direction, float importance,
+                           PathRay& ray, float& scale)
+{
+    if (importance <= 0.0f || !depart(origin, direction, ray))
+        return false;
     ray.depth += 1;
     ray.importance *= importance < 1.0f ? importance : 1.0f;
     scale = 1.0f;
@@ -184,7 +187,6 @@ bool ShadingContext::child(Vec3f const* origin, Vec3f const* direction, float im
         ray.importance = full;
     }
     ray.scatteredAt = *origin;
-    ray.skyDensity = std::numeric_limits<float>::infinity();
     bool const listed = scene_.lights().hasSurfaces() && call_->askedLights_;
     ray.lobeDensity = listed && call_->material.scatters() ? lobeDensity(ray.direction)
                                                            : std::numeric_limits<float>::infinity();
@@ -194,18 +196,10 @@ bool ShadingContext::child(Vec3f const* origin, Vec3f const* direction, float im
 }
 
 bool ShadingContext::continuation(Vec3f const* origin, Vec3f const* direction, float importance,
-                                  PathRay& ray)
+                                  PathRay& ray) const
 {
-    if (!call_ || !isFinite(*origin))
+    if (!depart(origin, direction, ray))
         return false;
-    ray = call_->ray;
-    ray.direction = *direction;
-    if (!unit(ray.direction))
-        return false;
-    ray.E = *origin;
-    ray.ignored = 0;
-    ray.skyDensity = std::numeric_limits<float>::infinity(); // what lies behind is its alone
-    ray.origin = rayStart(*origin, ray.direction);
     ray.passes += 1;
     ray.importance *= importance < 1.0f ? maxOf(importance, 0.0f) : 1.0f;
     return true;

@@ -117,14 +117,20 @@ Vec4f ShadingContext::environment(PathRay const& ray)
     return withAlpha(rgb(state.Ci) * (ray.skyDensity / (ray.skyDensity + shared)), state.Ci.w);
 }
 
-Vec3f ShadingContext::sky(std::uint32_t rayType, Vec3f d)
+PathRay ShadingContext::query(std::uint32_t type, Vec3f direction) const
 {
     PathRay ray;
     if (call_)
         ray = call_->ray;
-    ray.type = rayType;
+    ray.type = type;
     ray.depth += 1;
-    ray.direction = d;
+    ray.direction = direction;
+    return ray;
+}
+
+Vec3f ShadingContext::sky(std::uint32_t rayType, Vec3f d)
+{
+    PathRay ray = query(rayType, d);
     ray.skyDensity = std::numeric_limits<float>::infinity();
     return rgb(environment(ray));
 }

@@ -136,11 +136,17 @@ private:
     void fillSurface(PathRay const& ray, SurfacePoint const& s, PreparedMaterial const& material,
                      ShadeState& state) const;
 
-    /// A ray from the running call's surface; false when there is none to trace. `scale` makes up
-    /// for the rays that are left out at random.
+    /// The running call's ray, if there is one, as a query of the type that counts one bounce more.
+    PathRay query(std::uint32_t type, Vec3f direction) const;
+    /// The running call's ray as it leaves `origin`; false when there is none to trace.
+    bool depart(Vec3f const* origin, Vec3f const* direction, PathRay& ray) const;
+    /// A ray that the running call's surface bends or sends back; false when there is none to
+    /// trace. `scale` makes up for the rays that are left out at random.
     bool child(Vec3f const* origin, Vec3f const* direction, float importance, PathRay& ray,
                float& scale);
-    bool continuation(Vec3f const* origin, Vec3f const* direction, float importance, PathRay& ray);
+    /// A ray that goes on straight; false when there is none to trace.
+    bool continuation(Vec3f const* origin, Vec3f const* direction, float importance,
+                      PathRay& ray) const;
     Vec3f traceLobe(Vec3f const* origin, Vec3f const* direction, float spread, float turn,
                     float importance);
     /// Light along a ray drawn from a lobe at the running call's surface, together with what a

@@ -1,0 +1,73 @@
+// SPDX-License-Identifier: Apache-2.0
+#include "load/meshes.h"
+
+#include "base/error.h"
+#include "load/placing.h"
+#include "mesh/meshCompletion.h"
+#include "mesh/meshFile.h"
+#include "mesh/meshShapes.h"
+
+#include <fmt/format.h>
+
+namespace zsi::host {
+namespace {
+
+constexpr int kMostSegments = 4096;
+
+Mesh readMeshFromFile(JsonReader const& reader, std::vector<std::string>& warnings)
+{
+    reader.expectKeys({"file", "up", "normals"});
+    JsonReader const name = reader.at("file");
+    std::filesystem::path const file = name.toFile();
+    Mesh mesh;
+    try {
+        mesh = readMeshFile(file);
+    } catch (InputError const& error) {
+        name.fail(error.what());
+    }
+    auto const up = reader.find("up");
+    if (up ? up->toChoice({"y", "z"}) == 0 : isYUp(file))
+        turnYUp(mesh);
+    NormalSource source = NormalSource::File;
+    if (auto const normals = reader.find("normals")) {
+        constexpr NormalSource kSources[] = {NormalSource::File, NormalSource::Smooth,
+                                             NormalSource::Flat};
+        source = kSources[normals->toChoice({"file", "smooth", "flat"})];
+    }
+    std::vector<std::string> repairs;
+    completeMesh(mesh, source, repairs);
+    for (std::string const& repair : repairs)
+        warnings.push_back(fmt::format("{}: {}: {}", name.place(), file.string(), repair));
+    if (mesh.triangles.empty())
+        name.fail(file.string() + ": has no triangles that can be seen");
+    return mesh;
+}
+
+} // namespace
+
+Mesh readMesh(JsonReader const& reader, std::vector<std::string>& warnings)
+{
+    std::vector<std::string> const kinds{"file", "sphere", "box", "plane"};
+    if (!reader.isObject())
+        reader.failExpected("an object");
+    if (reader.find("file") && !reader.find("sphere") && !reader.find("box")
+        && !reader.find("plane"))
+        return readMeshFromFile(reader, warnings);
+    reader.expectKeys({"sphere", "box", "plane", "file"});
+    JsonReader const shape = reader.onlyOf(kinds);
+    if (reader.find("sphere")) {
+        shape.expectKeys({"radius", "segments"});
+        auto const radius = shape.find("radius"), segments = shape.find("segments");
+        return sphereMesh(radius ? radius->toPositive() : 1.0f,
+                          segments ? segments->toInt(3, kMostSegments) : 64);
+    }
+    shape.expectKeys({"size"});
+    if (reader.find("box")) {
+        std::vector<float> const s = readSize(shape, 3);
+        return boxMesh({s[0], s[1], s[2]});
+    }
+    std::vector<float> const s = readSize(shape, 2);
+    return planeMesh({s[0], s[1]});
+}
+
+} // namespace zsi::host

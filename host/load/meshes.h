@@ -1,0 +1,14 @@
+// SPDX-License-Identifier: Apache-2.0
+/// The meshes of a scene file.
+#pragma once
+
+#include "load/jsonReader.h"
+#include "scene/scene.h"
+
+namespace zsi::host {
+
+/// A mesh of a file or a shape, complete. Appends to `warnings` what was mended. Throws InputError
+/// with the place.
+Mesh readMesh(JsonReader const& reader, std::vector<std::string>& warnings);
+
+} // namespace zsi::host
