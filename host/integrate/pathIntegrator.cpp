@@ -47,27 +47,36 @@ Vec3f PathIntegrator::directLight(ShadingContext::Call& call)
     Vec3f const sides[2] = {faced, -faced};
     int const count = (material.entryPoints & kTransmission) ? 2 : 1;
     Vec3f sum{0, 0, 0};
-    for (int i = 0; i < count; ++i)
-        for (LightSample const* l = context_.lightSamples(state.P, sides[i], material.mixes); l;
-             l = l->next) {
-            state.sampleDirection = l->L;
-            state.outBrdf = {0, 0, 0};
-            state.sampleCosine = 0.0f;
-            material.shader->transfer(&context_, state);
-            sum += positive(state.outBrdf * maxOf(state.sampleCosine, 0.0f)) * l->color * l->shadow
-                * kPi;
+    LightSet const& lights = context_.scene().lights();
+    // What the surface sends on of a light is known before a ray looks for what stands between.
+    auto const sent = [&](Vec3f L) {
+        state.sampleDirection = L;
+        state.outBrdf = {0, 0, 0};
+        state.sampleCosine = 0.0f;
+        material.shader->transfer(&context_, state);
+        return positive(state.outBrdf * maxOf(state.sampleCosine, 0.0f));
+    };
+    for (int side = 0; side < count; ++side)
+        for (std::size_t i = 0; i < lights.size(); ++i) {
+            if (!material.mixes && std::holds_alternative<SurfaceLight>(lights[i]))
+                continue;
+            Arrival picked;
+            LightSample light;
+            if (!context_.pickLight(i, state.P, sides[side], picked))
+                continue;
+            Vec3f const value = sent(picked.L);
+            if (!(maxComponent(value) > 0.0f)
+                || !context_.arriving(i, state.P, sides[side], picked, light))
+                continue;
+            float const share = picked.density > 0.0f
+                ? picked.density / (picked.density + maxComponent(value))
+                : 1.0f;
+            sum += value * light.color * light.shadow * (share * kPi);
         }
     if (material.mixes)
-        sum += context_.fromSky(
-            kRayReflection,
-            [&](Vec3f d) {
-                state.sampleDirection = d;
-                state.outBrdf = {0, 0, 0};
-                state.sampleCosine = 0.0f;
-                material.shader->transfer(&context_, state);
-                return positive(state.outBrdf * maxOf(state.sampleCosine, 0.0f));
-            },
-            [&](Vec3f) { return maxComponent(state.outBrdf) * state.sampleCosine; });
+        sum += context_.fromSky(kRayReflection, sent, [&](Vec3f) {
+            return maxComponent(state.outBrdf) * state.sampleCosine;
+        });
     return context_.finite(sum);
 }
 

@@ -99,6 +99,11 @@ std::optional<Arrival> LightSet::arrival(std::size_t light, Vec3f P, Vec3f norma
     constexpr float kPi = 3.14159265f;
     Light const& l = scene_->lights[light];
     Arrival a;
+    if (auto const* const shader = std::get_if<ShaderLight>(&l)) {
+        a.to = pointOfBall(shader->position, shader->radius, P, u);
+        a.L = normalize(a.to - P);
+        return dot(a.L, normal) > 0.0f ? std::optional(a) : std::nullopt;
+    }
     if (auto const* const sun = std::get_if<SunLight>(&l)) {
         // Uniform over the disc that it shows.
         float const edge = std::cos(sun->angle * (kPi / 360.0f));

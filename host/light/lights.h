@@ -71,7 +71,8 @@ public:
     /// Whether a light has an extent, so that `arrival` makes use of its random numbers.
     bool isSpread(std::size_t light) const;
 
-    /// What light `light`, which is no ShaderLight, brings to `P`; nothing from behind `normal`.
+    /// What light `light` brings to `P`; nothing from behind `normal`. The colour of a ShaderLight
+    /// is left black, for `askLight` to find.
     std::optional<Arrival> arrival(std::size_t light, Vec3f P, Vec3f normal, Vec2f u) const;
 
 private:

@@ -31,25 +31,19 @@ bool unit(Vec3f& v)
 
 LightSample* ShadingContext::getLightSamples(int, Vec3f const* P, Vec3f const* normal)
 {
-    return lightSamples(*P, *normal, true);
-}
-
-LightSample* ShadingContext::lightSamples(Vec3f P, Vec3f normal, bool surfaceLights)
-{
     if (!call_)
         return nullptr;
     call_->askedLights_ = true;
     LightSample* head = nullptr;
     LightSample** end = &head;
-    LightSet const& lights = scene_.lights();
-    for (std::size_t i = 0; i < lights.size(); ++i) {
-        if (!surfaceLights && std::holds_alternative<SurfaceLight>(lights[i]))
-            continue;
+    for (std::size_t i = 0; i < scene_.lights().size(); ++i) {
+        Arrival picked;
         LightSample sample;
-        if (!ask(i, P, normal, sample))
+        if (!pickLight(i, *P, *normal, picked) || !arriving(i, *P, *normal, picked, sample))
             continue;
-        sample.color = finite(sample.color);
-        sample.shadow = finite(sample.shadow);
+        if (picked.density > 0.0f && call_->material.scatters())
+            if (float const lobe = lobeDensity(picked.L); !std::isinf(lobe))
+                sample.color = sample.color * (picked.density / (picked.density + lobe));
         LightSample& kept = lightRecords_.add();
         kept = sample;
         *end = &kept;
@@ -58,30 +52,34 @@ LightSample* ShadingContext::lightSamples(Vec3f P, Vec3f normal, bool surfaceLig
     return head;
 }
 
-bool ShadingContext::ask(std::size_t light, Vec3f P, Vec3f normal, LightSample& sample)
+bool ShadingContext::pickLight(std::size_t light, Vec3f P, Vec3f normal, Arrival& picked)
 {
     LightSet const& lights = scene_.lights();
     Vec2f const u = lights.isSpread(light) ? sampler_->next2D() : Vec2f(0, 0);
-    if (auto const* const shader = std::get_if<ShaderLight>(&lights[light])) {
-        ShadeState state = call_->state;
-        return askLight(*shader, pointOfBall(shader->position, shader->radius, P, u), P, normal,
-                        this, state, sample);
-    }
     std::optional<Arrival> const a = lights.arrival(light, P, normal, u);
-    if (!a)
-        return false;
-    sample = {};
-    sample.L = a->L;
-    sample.color = a->color;
-    sample.weight = minOf(dot(a->L, normal), 1.0f);
-    if (a->density > 0.0f && call_->material.scatters()) {
-        float const lobe = lobeDensity(a->L);
-        if (!std::isinf(lobe))
-            sample.color = sample.color * (a->density / (a->density + lobe));
+    if (a)
+        picked = *a;
+    return a.has_value();
+}
+
+bool ShadingContext::arriving(std::size_t light, Vec3f P, Vec3f normal, Arrival const& picked,
+                              LightSample& sample)
+{
+    if (auto const* const shader = std::get_if<ShaderLight>(&scene_.lights()[light])) {
+        ShadeState state = call_->state;
+        if (!askLight(*shader, picked.to, P, normal, this, state, sample))
+            return false;
+    } else {
+        sample = {};
+        sample.L = picked.L;
+        sample.color = picked.color;
+        sample.weight = minOf(dot(picked.L, normal), 1.0f);
+        sample.shadow = picked.isFar ? transmit(P, shadowStart(P, picked.L), picked.L,
+                                                std::numeric_limits<float>::infinity())
+                                     : shadowTransmission(&P, &picked.to);
     }
-    sample.shadow = a->isFar
-        ? transmit(P, shadowStart(P, a->L), a->L, std::numeric_limits<float>::infinity())
-        : shadowTransmission(&P, &a->to);
+    sample.color = finite(sample.color);
+    sample.shadow = finite(sample.shadow);
     return true;
 }
 

@@ -92,8 +92,13 @@ public:
     Vec3f fromSky(std::uint32_t rayType, Value const& value, Density const& density);
     /// One draw of the material at a place of its own choice: is it one of kSampleMixture?
     bool drawsMixture(PreparedMaterial const& material);
-    /// As the service, for one's own choice of lights.
-    LightSample* lightSamples(Vec3f P, Vec3f normal, bool surfaceLights);
+    /// The point of light `light` that is to light `P`: its place, direction and, where rays meet
+    /// the light, density are told. False where it is behind `normal` or brings nothing for sure.
+    bool pickLight(std::size_t light, Vec3f P, Vec3f normal, Arrival& picked);
+    /// What arrives from a picked point, with its shadow: the ray is traced here. False when it is
+    /// nothing.
+    bool arriving(std::size_t light, Vec3f P, Vec3f normal, Arrival const& picked,
+                  LightSample& sample);
 
     /// Where a ray starts that leaves `origin`: moved off the running call's surface where it lies
     /// on it, any other place as it is.
@@ -131,7 +136,6 @@ private:
     Vec4f environment(PathRay const& ray);
     /// What a ray sees of the surface light that it met.
     Vec3f emission(PathRay const& ray, SurfacePoint const& surface) const;
-    bool ask(std::size_t light, Vec3f P, Vec3f normal, LightSample& sample);
     ShadeState record(PathRay const& ray) const;
     void fillSurface(PathRay const& ray, SurfacePoint const& s, PreparedMaterial const& material,
                      ShadeState& state) const;
