@@ -11,7 +11,7 @@
 //
 // Flakes: V-shaped grooves of perfect mirrors (Torrance and Sparrow 1967, "Theory for Off-Specular
 // Reflection From Roughened Surfaces") whose slopes are Gaussian lose what is shadowed after one
-// bounce.
+// bounce. What they send out lower than it came meets more of Schlick's weight on the coat.
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
@@ -24,7 +24,7 @@ constexpr int kWidths = 14, kLossCosines = 17, kCosines = 25;
 constexpr double kLeastWidth = 0.001, kMostWidth = 0.5;
 constexpr double kLift =
     0.0015; // of the coat's share, above the tables' error: paint must not glow
-constexpr int kSpreads = 15, kFlakeCosines = 17;
+constexpr int kSpreads = 15, kFlakeCosines = 33;
 constexpr double kMostSpread = 1.5;
 
 using Table = std::vector<std::vector<double>>;
@@ -83,28 +83,32 @@ void coat(double mu, double w, double& all, double& grazing)
     grazing /= double(kGrid) * kGrid;
 }
 
-// Lost after one bounce in grooves of the slope (x, y), seen along a direction of cosine c in the
-// xz plane; times c.
-double grooveLoss(double c, double x, double y)
-{
-    double const k2 = 1 + x * x + y * y, s = std::sqrt(1 - c * c);
-    double sent = 0;
-    for (double const lean : {s * x, -s * x})
-        sent +=
-            std::min({std::max(0.5 * (c + lean), 0.0), c, std::max(2 * (c + lean) / k2 - c, 0.0)});
-    return c - sent;
-}
-double flakeLoss(double c, double spread)
+double schlickWeight(double c) { return std::pow(1 - std::min(c, 1.0), 5); }
+
+// Of light along a direction of cosine c, what grooves lose after one bounce, and the rise of
+// Schlick's weight for what they send out lower.
+struct FlakeShares {
+    double lost, lowered;
+};
+FlakeShares flakeShares(double c, double spread)
 {
     constexpr int kGrid = 400;
-    double sum = 0;
+    double const s = std::sqrt(1 - c * c);
+    FlakeShares sum{1, 0};
     for (int i = 0; i < kGrid; ++i)
         for (int j = 0; j < kGrid; ++j) {
             double const r = spread * std::sqrt(-std::log(1 - (i + 0.5) / kGrid));
-            double const phi = M_PI / 2 * (j + 0.5) / kGrid;
-            sum += grooveLoss(c, r * std::cos(phi), r * std::sin(phi));
+            double const x = r * std::cos(M_PI / 2 * (j + 0.5) / kGrid);
+            for (double const lean : {s * x, -s * x}) {
+                double const up = 2 * (c + lean) / (1 + r * r) - c; // mirrored to this cosine
+                double const sent = std::min({0.5 * (c + lean), c, up}) / (c * kGrid * kGrid);
+                if (sent <= 0)
+                    continue;
+                sum.lost -= sent;
+                sum.lowered += sent * std::max(0.0, schlickWeight(up) - schlickWeight(c));
+            }
         }
-    return sum / (double(kGrid) * kGrid) / c;
+    return sum;
 }
 
 double spreadNode(double a) { return std::sqrt(a / kMostSpread) * (kSpreads - 1); }
@@ -175,21 +179,28 @@ int main()
             coatMean[i][r0] = hemisphere([&](double mu) { return share(mu, widthOf(i), r0); });
 
     Table lost(kSpreads, std::vector<double>(kFlakeCosines)),
-        lostMean(1, std::vector<double>(kSpreads));
-    for (int i = 0; i < kSpreads; ++i)
-        for (int j = 0; j < kFlakeCosines; ++j) {
-            double const a = spreadOf(i);
-            lost[i][j] = flakeLoss(cosineOf(j / (kFlakeCosines - 1.0), a), a);
-        }
+        lowered = lost, means(kSpreads, std::vector<double>(3));
     for (int i = 0; i < kSpreads; ++i) {
         double const a = spreadOf(i);
-        double const mean = hemisphere([&](double mu) {
-            return interpolated(lost, spreadNode(a), relative(mu, a) * (kFlakeCosines - 1));
-        });
-        lostMean[0][i] = mean / (std::sqrt(1 + a * a) - 1);
+        for (int j = 0; j < kFlakeCosines; ++j) {
+            FlakeShares const shares = flakeShares(cosineOf(j / (kFlakeCosines - 1.0), a), a);
+            lost[i][j] = std::max(0.0, shares.lost);
+            lowered[i][j] = shares.lowered;
+        }
+        auto const mean = [&](Table const& t, auto const& weight) {
+            return hemisphere([&](double mu) {
+                return weight(mu)
+                    * interpolated(t, spreadNode(a), relative(mu, a) * (kFlakeCosines - 1));
+            });
+        };
+        auto const one = [](double) { return 1.0; };
+        double const loss = mean(lost, one);
+        means[i] = {loss / (std::sqrt(1 + a * a) - 1), mean(lowered, one) / a,
+                    mean(lost, schlickWeight) / loss};
     }
 
     std::printf(
+        "// SPDX-License-Identifier: Apache-2.0\n"
         "/// What the layers of metallic paint send back. Written by scripts/paintTables.cpp.\n"
         "#pragma once\n\nnamespace zsi {\n");
     print("Of the light that facets of a coat mirror, what they do not send out after one bounce:\n"
@@ -203,8 +214,13 @@ int main()
     print("What flakes lose after one bounce: by width of their slopes, (width / 1.5)^(1/2), and\n"
           "/// mu (1 + width) / (mu + width).",
           "kFlakeLoss", lost);
-    print("Mean of the same, weighted with the cosine, over sqrt(1 + width^2) - 1.",
-          "kFlakeMeanLoss", lostMean);
+    print(
+        "What Schlick's weight rises by for light that flakes send out lower than it came, after\n"
+        "/// one bounce: as kFlakeLoss.",
+        "kFlakeLowered", lowered);
+    print("Means of the two, weighted with the cosine, over sqrt(1 + width^2) - 1 and over the\n"
+          "/// width; mean of Schlick's weight, weighted with the first and the cosine.",
+          "kFlakeMeans", means);
     std::printf("\n} // namespace zsi\n");
 
     // How far the tables are off, above and below.
@@ -222,7 +238,7 @@ int main()
             double const error = i < 3 ? share(mu, w, r0[i]) - (r0[i] * (all - grazing) + grazing)
                 : k % 10               ? 0
                          : interpolated(lost, spreadNode(a), relative(mu, a) * (kFlakeCosines - 1))
-                    - flakeLoss(mu, a);
+                    - flakeShares(mu, a).lost;
             off[i][0] = std::min(off[i][0], error);
             off[i][1] = std::max(off[i][1], error);
         }

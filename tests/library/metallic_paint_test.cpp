@@ -118,6 +118,19 @@ TEST(MetallicPaint, FlakesStickToTheObjectAndMeltIntoTheirMean)
         previous = deviation;
     }
     EXPECT_LT(previous, 1e-3 * crowd);
+
+    // Off the highlight too, where the most part has bounced between flakes.
+    Paint steep("flakeSpread=.5 flakeRoughValue=.3 I=0,0,-1");
+    for (Vec3f const direction : {Vec3f(0.98f, 0, 0.17f), Vec3f(0, 0, 1)}) {
+        double sum = 0;
+        for (int i = 0; i < 100000; ++i) {
+            steep.place(random.unit() * 40, 1);
+            sum += double(steep.transfer(direction).z) / 100000;
+        }
+        steep.place({0, 0, 0}, 1e6f);
+        double const many = double(steep.transfer(direction).z);
+        EXPECT_NEAR(sum, many, 0.02 * many);
+    }
 }
 
 TEST(MetallicPaint, SamplesOfAPixelMeetTheSameFlakes)

@@ -26,8 +26,8 @@ corvid_Mtl_Metal bent leaning oneWay | reflectColor=1,1,1 roughValue=.5 N=.6,0,.
 corvid_Mtl_Metal holed clear   | reflectColor=1,1,1 cutoutMapEnable=1 cutoutMap=.25,0,0,1 cutoutAmount=2 | .2 .2 .98 1
 corvid_Mtl_MetallicPaint smooth | baseColor=1,1,1 flakeDensity=0 baseRoughValue=0 coatRoughValue=.1 | .3 .3 .97 1
 corvid_Mtl_MetallicPaint rough | baseColor=1,1,1 flakeDensity=0 baseRoughValue=1 coatRoughValue=.3 | .3 .3 .97 1
-corvid_Mtl_MetallicPaint crowd  | baseColor=1,1,1 flakeColor=1,1,1 pearlColor=.1,1,.2,.5 flakeDensity=.8 flakeSpread=.3 flakeRoughValue=.2 coatRoughValue=.15 | .2 .2 .8 1
-corvid_Mtl_MetallicPaint oneFlake | baseColor=.6,.2,.1 flakeSpread=.3 flakeRoughValue=.15 coatReflectivity=.3 coatRoughValue=.1 | .25 .25 .1 1 1
+corvid_Mtl_MetallicPaint crowd  | baseColor=1,1,1 flakeColor=1,1,1 pearlColor=.1,1,.2,.5 flakeDensity=.8 flakeSpread=.3 flakeRoughValue=.2 coatRoughValue=.15 | .2 .2 .98 1
+corvid_Mtl_MetallicPaint oneFlake oneWay | baseColor=.6,.2,.1 flakeSpread=.3 flakeRoughValue=.15 coatReflectivity=.3 coatRoughValue=.1 | .25 .25 .1 1 1
 corvid_Mtl_MetallicPaint fiveFlakes oneWay | baseColor=1,1,1 flakeColor=1,1,1 flakeSpread=.3 coatRoughValue=.2 finish=1 finishPeelamount=.2 | .25 .25 .6 1 20
 corvid_Mtl_MetallicPaint mirrors glossy unlit | flakeSpread=.3 flakeRoughValue=.15 coatReflectivity=.3 coatRoughValue=.1 | .2 .2 .2 1
 corvid_Mtl_Ward narrow unlit    | diffuseColor=.5,.5,.5 roughValue=.1                     | .1 .1 .1 1

@@ -37,6 +37,9 @@ public:
     float passedV() const { return 1.0f - albedo_; }
     /// What it lets through along a direction of cosine c; none from below the coat.
     float passed(float c) const { return c > 0.0f ? 1.0f - albedo(c) : 0.0f; }
+    /// By how much `passed` falls where Schlick's weight rises by 1. Rough facets blur that, most
+    /// towards the horizon; never more than that.
+    float fall() const { return (1.0f - r0_) / (1.0f + 20.0f * facets_.ax); }
     /// Mean of `passed` over the hemisphere, weighted with the cosine.
     float meanPassed() const
     {

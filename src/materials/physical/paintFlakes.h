@@ -16,6 +16,7 @@
 
 #include "materials/physical/paintTables.h"
 #include "materials/physical/shared/facetLoss.h"
+#include "materials/physical/shared/fresnel.h"
 #include "materials/physical/shared/tiltedFacets.h"
 #include "runtime/arithmetic.h"
 
@@ -98,39 +99,62 @@ inline float loss(Vec3f w, Vec2f s, float a)
     return saturate(sum);
 }
 
-/// Mean of it over the hemisphere, weighted with the cosine. Exact for a = 0.
-inline float meanLoss(Vec2f s, float a)
+/// What grooves of the slopes +-s and Gaussian width a, below a half, send out lower than it came,
+/// times what Schlick's weight is more there. In the plane of w the width is quartiles of slopes.
+inline float lowered(Vec3f w, Vec2f s, float a)
 {
-    float const steep2 = s.x * s.x + s.y * s.y + a * a, k = std::sqrt(1.0f + steep2);
-    return steep2 > 1.0f ? 2.0f * std::sqrt(steep2) / k - 1.0f : steep2 / (1.0f + k);
+    float const tangent = std::sqrt(w.x * w.x + w.y * w.y) / w.z;
+    float const along = tangent > 0.0f ? (w.x * s.x + w.y * s.y) / (w.z * tangent) : s.x;
+    float const across2 = s.x * s.x + s.y * s.y - along * along + 0.5f * a * a;
+    float const here = schlickWeight(w.z);
+    float sum = 0.0f;
+    for (float const quartile : {-0.81338f, -0.22531f, 0.22531f, 0.81338f}) { // of width 1
+        float const slope = along + quartile * a;
+        for (float const side : {1.0f + slope * tangent, 1.0f - slope * tangent}) {
+            float const high = 2.0f * side / (1.0f + slope * slope + across2) - 1.0f;
+            if (high > 0.0f && high < 1.0f)
+                sum += minOf(0.5f * side, high) * (schlickWeight(high * w.z) - here);
+        }
+    }
+    return 0.25f * sum;
 }
 
 /// Of Gaussian slopes about the level, any width up to 1.5.
-class LevelLoss {
+class LevelShares {
 public:
-    explicit LevelLoss(float width)
+    explicit LevelShares(float width)
         : width_(width)
         , node_(std::sqrt(width * (1.0f / 1.5f)) * (kSpreads - 1))
     {
     }
-    float operator()(float c) const
+    float loss(float c) const { return at(kFlakeLoss, c); }
+    float meanLoss() const
     {
-        TablePosition<kCosines> const at(c * (1.0f + width_) / (c + width_) * (kCosines - 1));
-        float const* const below = kFlakeLoss[node_.node] + at.node;
-        float const* const above = below + kCosines;
-        return lerp(lerp(below[0], below[1], at.fraction), lerp(above[0], above[1], at.fraction),
-                    node_.fraction);
-    }
-    float mean() const
-    {
-        float const* const at = kFlakeMeanLoss[0] + node_.node;
         float const w2 = width_ * width_;
-        return lerp(at[0], at[1], node_.fraction) * w2 / (1.0f + std::sqrt(1.0f + w2));
+        return mean(0) * w2 / (1.0f + std::sqrt(1.0f + w2));
     }
+    float lowered(float c) const { return at(kFlakeLowered, c); }
+    float meanLowered() const { return mean(1) * width_; }
+    /// Mean of Schlick's weight, weighted with the loss and the cosine.
+    float meanSchlick() const { return mean(2); }
 
 private:
     static constexpr int kSpreads = std::size(kFlakeLoss), kCosines = std::size(kFlakeLoss[0]);
     static float lerp(float a, float b, float t) { return a + t * (b - a); }
+
+    float at(float const (&table)[kSpreads][kCosines], float c) const
+    {
+        TablePosition<kCosines> const at(c * (1.0f + width_) / (c + width_) * (kCosines - 1));
+        float const* const below = table[node_.node] + at.node;
+        float const* const above = below + kCosines;
+        return lerp(lerp(below[0], below[1], at.fraction), lerp(above[0], above[1], at.fraction),
+                    node_.fraction);
+    }
+    float mean(int which) const
+    {
+        return lerp(kFlakeMeans[node_.node][which], kFlakeMeans[node_.node + 1][which],
+                    node_.fraction);
+    }
 
     float width_;
     TablePosition<kSpreads> node_;
@@ -236,23 +260,23 @@ public:
         return normalize(first ? Vec3f(s.x, s.y, 1.0f) : Vec3f(-s.x, -s.y, 1.0f));
     }
 
-    /// Of the light along w, what the flakes lose after one bounce, and its mean over the
-    /// hemisphere. crowd: as `crowdLoss` gives it.
-    float loss(Vec3f w, grooves::LevelLoss const& crowd) const
+    /// Of the light along w, what the flakes lose after one bounce, and what they send out lower,
+    /// times what Schlick's weight is more there. crowd: as `crowd()` gives it.
+    struct Shares {
+        float lost, lowered;
+    };
+    Shares shares(Vec3f w, grooves::LevelShares const& crowd) const
     {
-        float sum = crowd_ > 0.0f ? crowd_ * crowd(w.z) : 0.0f;
-        for (int i = 0; i < count_; ++i)
-            sum += flake_[i].share * grooves::loss(w, flake_[i].slope, gloss_);
+        Shares sum{0.0f, 0.0f};
+        if (crowd_ > 0.0f)
+            sum = {crowd_ * crowd.loss(w.z), crowd_ * crowd.lowered(w.z)};
+        for (int i = 0; i < count_; ++i) {
+            sum.lost += flake_[i].share * grooves::loss(w, flake_[i].slope, gloss_);
+            sum.lowered += flake_[i].share * grooves::lowered(w, flake_[i].slope, gloss_);
+        }
         return sum;
     }
-    float meanLoss(grooves::LevelLoss const& crowd) const
-    {
-        float sum = crowd_ > 0.0f ? crowd_ * crowd.mean() : 0.0f;
-        for (int i = 0; i < count_; ++i)
-            sum += flake_[i].share * grooves::meanLoss(flake_[i].slope, gloss_);
-        return sum;
-    }
-    grooves::LevelLoss crowdLoss() const { return grooves::LevelLoss(std::sqrt(crowd2_)); }
+    grooves::LevelShares crowd() const { return grooves::LevelShares(std::sqrt(crowd2_)); }
 
 private:
     struct Flake {
@@ -311,34 +335,38 @@ private:
     float gloss_, crowd2_;
 };
 
-/// Flakes seen along v: mirrored once, and what grooves send out after further bounces, as a broad
-/// lobe, loss(v) loss(l) / (pi mean): Kulla and Conty 2017, "Revisiting Physically Based Shading at
-/// Imageworks".
+/// Flakes seen along v under a coat: mirrored once; what grooves send out after further bounces,
+/// loss(v) loss(l) / (pi mean), a broad lobe as by Kulla and Conty 2017, "Revisiting Physically
+/// Based Shading at Imageworks"; and what the coat throws back of light that is mirrored lower than
+/// it came, a lobe of the same form. Further bounces are on any flakes, so that the share along v
+/// alone is that of the flakes seen, and share along l and mean are the crowd's: so everything is
+/// linear in the distribution of slopes. By it single flakes are not reciprocal; the crowd is.
 class FlakeLobe {
 public:
-    FlakeLobe(FlakeFootprint const& flakes, Vec3f v)
+    /// thrown: what the coat throws back of light from the horizon, 0..1.
+    FlakeLobe(FlakeFootprint const& flakes, Vec3f v, float thrown)
         : flakes_(flakes)
         , v_(v)
-        , crowd_(flakes.crowdLoss())
+        , crowd_(flakes.crowd())
     {
         if (!(flakes.coverage() > 0.0f))
             return;
-        lossV_ = flakes.loss(v, crowd_);
-        if (!(lossV_ > 0.0f))
-            return;
-        furtherV_ = lossV_ * kInvPi / flakes.meanLoss(crowd_);
-        // Less than the loss may be: facets are to be drawn wherever they still send light.
+        FlakeFootprint::Shares const shares = flakes.shares(v, crowd_);
+        furtherV_ = shares.lost * kInvPi / crowd_.meanLoss();
+        float const thrownV = thrown * shares.lowered;
+        thrownV_ = thrownV * kInvPi / crowd_.meanLowered();
+        // Less than the share may be: facets are to be drawn wherever they still send light.
         constexpr float kMostBroad = 0.75f;
-        broadChance_ = minOf(lossV_ / flakes.coverage(), kMostBroad);
+        broadChance_ = minOf((shares.lost + thrownV) / flakes.coverage(), kMostBroad);
     }
 
     float coverage() const { return flakes_.coverage(); }
-    /// Mean loss of a layer of such flakes, 0..1.
-    float crowdMeanLoss() const { return crowd_.mean(); }
+    /// Of a layer of such flakes.
+    grooves::LevelShares const& crowd() const { return crowd_; }
 
     /// Scattering values without the cosine, 1/sr.
     struct Value {
-        float once, further;
+        float once, further, thrown;
         float cosine; ///< on the facet that mirrors
         float pdf; ///< of `direction`, 1/sr
     };
@@ -355,8 +383,10 @@ public:
         Value value{};
         value.cosine = cosine;
         value.once = density * minOf(1.0f, k * lower) / (higher * lower);
-        if (lossV_ > 0.0f)
-            value.further = flakes_.loss(l, crowd_) * furtherV_;
+        if (furtherV_ > 0.0f)
+            value.further = crowd_.loss(l.z) * furtherV_;
+        if (thrownV_ > 0.0f)
+            value.thrown = crowd_.lowered(l.z) * thrownV_;
         value.pdf =
             (1.0f - broadChance_) * density * minOf(1.0f, k * v_.z) / (v_.z * flakes_.coverage())
             + broadChance_ * l.z * kInvPi;
@@ -382,9 +412,8 @@ public:
 private:
     FlakeFootprint flakes_;
     Vec3f v_;
-    grooves::LevelLoss crowd_;
-    float lossV_ = 0.0f; ///< over the whole surface
-    float furtherV_ = 0.0f; ///< the same over pi and its mean
+    grooves::LevelShares crowd_;
+    float furtherV_ = 0.0f, thrownV_ = 0.0f; ///< shares along v over pi and their mean
     float broadChance_ = 0.0f; ///< of a direction by the cosine
 };
 

@@ -105,7 +105,7 @@ public:
         , coat_(coatReflectance, coatWidth, toLocal(frames.coat, v))
         // A relief throws light to the horizon, where alone a coat that mirrors lets it pass.
         , base_(colors.base, colors.baseRough * (1.0f - coatReflectance * coatReflectance), v_)
-        , flakes_(flakes, v_)
+        , flakes_(flakes, v_, coat_.fall())
         , bare_(1.0f - flakes.coverage())
     {
     }
@@ -143,7 +143,9 @@ public:
             if (value.once > 0.0f)
                 sum.under += throughCoat(colors_.flakeAt(value.cosine), passedL) * value.once;
             if (value.further > 0.0f)
-                sum.under += throughCoat(furtherColor(), passedL) * value.further;
+                sum.under += furtherThroughCoat(passedL) * value.further;
+            if (value.thrown > 0.0f)
+                sum.under += thrownColor() * value.thrown;
             sum.pdf += chance.flakes * value.pdf;
         }
         return sum;
@@ -241,14 +243,34 @@ private:
         };
         return {channel(color.x), channel(color.y), channel(color.z)};
     }
-    /// Of light that left the flakes after more than one bounce.
-    Vec3f furtherColor() const
+    /// Colour of light that left the flakes after more than one bounce, times what passes the coat
+    /// both ways: over the mean for light that leaves so, as `baseScale` for the base.
+    Vec3f furtherThroughCoat(float passedL) const
     {
-        constexpr float kMeanCosine = 0.70710678f; // mean of its square over the hemisphere: 1/2
-        float const lost = flakes_.crowdMeanLoss();
-        auto const channel = [&](float c) { return c * c * (1.0f - lost) / (1.0f - c * lost); };
-        Vec3f const c = colors_.flakeAt(kMeanCosine);
+        grooves::LevelShares const& crowd = flakes_.crowd();
+        float const lost = crowd.meanLoss();
+        float const mean = coat_.meanPassed() - coat_.fall() * (crowd.meanSchlick() - kMeanSchlick);
+        float const both = coat_.passedV() * passedL;
+        auto const channel = [&](float c) {
+            float const f = c * c * (1.0f - lost) / (1.0f - c * lost);
+            return both > 0.0f ? f * both / maxOf(1.0f - f * (1.0f - mean), mean) : 0.0f;
+        };
+        Vec3f const c = meanFlake();
         return {channel(c.x), channel(c.y), channel(c.z)};
+    }
+    /// Of light that the coat threw back to the flakes.
+    Vec3f thrownColor() const
+    {
+        float const passed = coat_.meanPassed();
+        auto const channel = [&](float c) {
+            return c > 0.0f ? c * c * passed / (1.0f - c * (1.0f - passed)) : 0.0f;
+        };
+        Vec3f const c = meanFlake();
+        return {channel(c.x), channel(c.y), channel(c.z)};
+    }
+    Vec3f meanFlake() const
+    {
+        return colors_.flakeAt(0.70710678f); // mean of its square over the hemisphere: 1/2
     }
 
     PaintColors colors_;
@@ -262,6 +284,8 @@ private:
     /// Of what passes the coat on the way out: a relief throws a little more than the mean through.
     static constexpr float kHeadroom = 1.002f;
     static constexpr float kEvenShare = 0.5f;
+    static constexpr float kMeanSchlick =
+        1.0f / 21.0f; ///< mean of Schlick's weight over the cosine
 };
 
 } // namespace zsi
