@@ -70,7 +70,7 @@ try {
     options.progress = [](double done) { std::printf("\r%3.0f%%", done * 100); };
     host::RenderReport report;
     host::Picture const picture = host::render(scene, options, &report);
-    host::writePicture(argv[2], picture, {scene.film.exposure, false});
+    host::writePicture(argv[2], picture, host::screenView(scene.film));
     std::printf("\n%d x %d, %.2f s\n", picture.width(), picture.height(), report.seconds);
     return 0;
 } catch (zsi::host::InputError const& error) {

@@ -41,6 +41,8 @@ struct Arguments {
     std::optional<std::int64_t> seed;
     std::optional<int> textureCache; ///< megabytes
     std::string integrator;
+    std::optional<std::string> view;
+    std::string ocioConfig;
     std::vector<std::string> layers, assignments;
     bool quiet = false, verbose = false;
 };
@@ -174,6 +176,8 @@ host::Scene load(Arguments const& arguments, host::ShaderLibraries const& librar
         scene.settings.integrator = arguments.integrator;
     if (!arguments.layers.empty())
         scene.film.layers = arguments.layers;
+    if (arguments.view)
+        scene.film.view = *arguments.view;
     return scene;
 }
 
@@ -208,6 +212,8 @@ int render(Arguments const& arguments, std::string const& shaderPath)
     Reporter reporter(arguments);
     host::ShaderLibraries const libraries = loadLibraries(shaderPath);
     host::Scene const scene = load(arguments, libraries);
+    host::ScreenView const view = host::screenView(scene.film, arguments.ocioConfig);
+    host::screenTransform(view); // refuses what it cannot show before the picture is rendered
     for (std::string const& warning : scene.warnings)
         reporter.warning(warning);
     if (scene.instances.empty() && !scene.environment)
@@ -244,7 +250,7 @@ int render(Arguments const& arguments, std::string const& shaderPath)
     if (!scene.instances.empty() && report.surfaces == 0)
         reporter.warning(fmt::format("{}: the camera sees none of its {} instances", scene.file,
                                      scene.instances.size()));
-    host::writePicture(arguments.output, picture, {scene.film.exposure, scene.film.alpha == true});
+    host::writePicture(arguments.output, picture, view);
     reporter.detail("written to " + arguments.output);
     if (!reporter.quiet())
         print(fmt::format("{}: {}x{}, {} samples a pixel, {} rays, {}, {:.2f} s\n",
@@ -285,6 +291,16 @@ Subcommand addRender(CLI::App& app, std::string const& shaderPath)
         ->check(CLI::Range(std::int64_t(0), kMaxSeed));
     command->add_option("--integrator", arguments->integrator, "How light is gathered")
         ->type_name(fmt::format("{}", fmt::join(host::integratorNames(), "|")));
+    command
+        ->add_option("--view", arguments->view,
+                     "How 8-bit pictures show light: a tone curve or a view of the OpenColorIO "
+                     "config")
+        ->type_name(fmt::format("{}|[DISPLAY/]VIEW", fmt::join(host::toneCurveNames(), "|")));
+    command
+        ->add_option("--ocio", arguments->ocioConfig,
+                     "OpenColorIO config: its default view shows 8-bit pictures that name no other")
+        ->envname("OCIO")
+        ->type_name("FILE");
     command
         ->add_option("--layers", arguments->layers,
                      "Layers of an .exr beside the beauty: "

@@ -14,19 +14,8 @@
 namespace zsi::host {
 namespace {
 
-/// IEC 61966-2-1, to the nearest of 256 steps; NaN becomes 0.
-std::uint8_t encodeSrgb(float linear)
-{
-    if (!(linear > 0.0f))
-        return 0;
-    if (linear >= 1.0f)
-        return 255;
-    float const v =
-        linear <= 0.0031308f ? 12.92f * linear : 1.055f * std::pow(linear, 1.0f / 2.4f) - 0.055f;
-    return static_cast<std::uint8_t>(std::lround(v * 255.0f));
-}
-
-std::uint8_t encodeLinear(float v)
+/// To the nearest of 256 steps; NaN becomes 0.
+std::uint8_t quantised(float v)
 {
     return !(v > 0.0f) ? std::uint8_t(0)
                        : static_cast<std::uint8_t>(std::lround(minOf(v, 1.0f) * 255.0f));
@@ -86,14 +75,16 @@ Channels interleaved(Picture const& picture)
 std::vector<std::uint8_t> encoded(Picture const& picture, std::size_t channels,
                                   ScreenView const& view)
 {
-    float const gain = std::exp2(view.exposure);
     std::vector<float> const& rgba = picture.rgba();
-    std::vector<std::uint8_t> bytes(rgba.size() / 4 * channels);
-    for (std::size_t i = 0; i < rgba.size() / 4; ++i)
-        for (std::size_t c = 0; c < channels; ++c) {
-            float const v = rgba[i * 4 + c];
-            bytes[i * channels + c] = c == 3 ? encodeLinear(v) : encodeSrgb(v * gain);
-        }
+    std::size_t const pixels = rgba.size() / 4;
+    std::vector<float> rgb(pixels * 3);
+    for (std::size_t i = 0; i < pixels; ++i)
+        std::copy_n(&rgba[i * 4], 3, &rgb[i * 3]);
+    screenTransform(view)(rgb);
+    std::vector<std::uint8_t> bytes(pixels * channels);
+    for (std::size_t i = 0; i < pixels; ++i)
+        for (std::size_t c = 0; c < channels; ++c)
+            bytes[i * channels + c] = quantised(c == 3 ? rgba[i * 4 + 3] : rgb[i * 3 + c]);
     return bytes;
 }
 
@@ -122,6 +113,9 @@ std::vector<unsigned char> encode(std::filesystem::path const& file, Picture con
     if (kind == Kind::Exr) {
         spec.channelnames = all.names;
         spec.attribute("compression", "zip");
+        // Rec. 709: x and y of red, green, blue and white.
+        constexpr float kPrimaries[8] = {0.64f, 0.33f, 0.3f, 0.6f, 0.15f, 0.06f, 0.3127f, 0.329f};
+        spec.attribute("chromaticities", OIIO::TypeDesc(OIIO::TypeDesc::FLOAT, 8), kPrimaries);
         // The data window lies where the crop was in the whole picture.
         spec.x = picture.window.x0;
         spec.y = picture.window.y0;

@@ -3,16 +3,11 @@
 #pragma once
 
 #include "film/picture.h"
+#include "film/screenTransform.h"
 
 #include <filesystem>
 
 namespace zsi::host {
-
-/// How a linear picture becomes 8 bits for a screen.
-struct ScreenView {
-    float exposure = 0.0f; ///< stops
-    bool alpha = false; ///< PNG alone: with the picture's alpha; otherwise it is opaque
-};
 
 /// Whether a file of this name holds all layers of a picture; others hold the first.
 bool keepsLayers(std::filesystem::path const& file);
@@ -22,9 +17,10 @@ bool keepsLayers(std::filesystem::path const& file);
 void checkPictureFile(std::filesystem::path const& file);
 
 /// Writes by extension. .exr: all layers in linear float, in their place in the frame (data window
-/// inside display window). .hdr: linear RGB. .png and .jpg: 8-bit sRGB as `view` says; colours are
-/// written as they are over black, alpha beside them. What stands there is whole or as it was (see
-/// ReplacedFile). Throws InputError.
+/// inside display window) with the primaries' chromaticities. .hdr: linear RGB. .png and .jpg: 8
+/// bits as `view` says; colours are written as they are over black, alpha beside them. What stands
+/// there is whole or as it was (see ReplacedFile). Throws InputError, also as `screenTransform`
+/// does.
 void writePicture(std::filesystem::path const& file, Picture const& picture,
                   ScreenView const& view);
 

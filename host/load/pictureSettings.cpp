@@ -44,7 +44,7 @@ Camera readCamera(JsonReader const& reader)
 
 FilmSettings readFilm(JsonReader const& reader)
 {
-    reader.expectKeys({"width", "height", "exposure", "alpha", "crop", "layers"});
+    reader.expectKeys({"width", "height", "exposure", "view", "alpha", "crop", "layers"});
     FilmSettings film;
     if (auto const v = reader.find("width"))
         film.width = v->toInt(1, kLargestFilm);
@@ -52,6 +52,8 @@ FilmSettings readFilm(JsonReader const& reader)
         film.height = v->toInt(1, kLargestFilm);
     if (auto const v = reader.find("exposure"))
         film.exposure = v->toFloat(-64, 64);
+    if (auto const v = reader.find("view"))
+        film.view = v->toString();
     if (auto const v = reader.find("alpha"))
         film.alpha = v->toBool();
     if (auto const v = reader.find("layers"))

@@ -30,4 +30,9 @@ Picture developed(Film const& film, FilmSettings const& settings)
     return picture;
 }
 
+ScreenView screenView(FilmSettings const& settings, std::string const& ocioConfig)
+{
+    return {settings.exposure, settings.alpha == true, settings.view, ocioConfig};
+}
+
 } // namespace zsi::host

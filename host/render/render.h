@@ -2,6 +2,7 @@
 /// Renders a scene into a picture: one use of a session.
 #pragma once
 
+#include "film/screenTransform.h"
 #include "render/session.h"
 
 namespace zsi::host {
@@ -20,5 +21,7 @@ Picture render(Scene const& scene, RenderOptions const& options = {},
 
 /// The film's picture as the scene's film settings want it.
 Picture developed(Film const& film, FilmSettings const& settings);
+/// How such a picture is shown; `ocioConfig` as in ScreenView.
+ScreenView screenView(FilmSettings const& settings, std::string const& ocioConfig = {});
 
 } // namespace zsi::host

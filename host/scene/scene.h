@@ -95,6 +95,7 @@ struct FilmSettings {
     int height = 360;
     std::optional<std::array<int, 4>> crop; ///< x0, y0, x1, y1 in pixels, end exclusive
     float exposure = 0.0f; ///< stops, applied to 8-bit output only
+    std::string view; ///< of 8-bit output, as in ScreenView
     /// True: with the alpha of the shaders. False: opaque. Unset: opaque where 8 bits are written,
     /// with alpha elsewhere.
     std::optional<bool> alpha;

@@ -219,6 +219,8 @@ TEST_F(Command, BadCallsEndInOneLineAndLeaveNothing)
         {render + "--crop 5,5,5,9", 2, {"--crop", "X0,Y0,X1,Y1"}},
         {render + "--crop 0,0,33,24", 2, {"32x32"}},
         {render + "--integrator pth", 2, {"--integrator pth", "did you mean path?"}},
+        {render + "--view neutrl", 1, {"\"neutrl\"", "expected neutral"}},
+        {render + "--ocio none.ocio", 1, {"none.ocio"}},
         {render + "--layers depth", 2, {"--layers", "expected an .exr"}},
         {render + "--set film.width=0", 1, {"--set: film.width: expected"}},
         {"info --shader-path " ZSI_FIXTURE_DIR "/oldShaders", 1, {"version 2700", "version 2722"}},

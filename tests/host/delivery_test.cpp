@@ -213,7 +213,7 @@ TEST(Delivery, FilmAndSettingsCount)
         float want, alpha;
     };
     for (Row const& r : {Row{"a.png", {0, false}, 0.25f, 1}, Row{"b.png", {1, true}, 0.5f, 0.5f},
-                         Row{"c.png", {2, false}, 1, 1}}) {
+                         Row{"c.png", {2, false, "plain"}, 1, 1}}) {
         host::writePicture(folder.path / r.name, picture, r.view);
         Vec4f seen{0, 0, 0, 0};
         Vec2f const at(0.5f, 0.5f);
