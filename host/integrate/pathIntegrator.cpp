@@ -116,7 +116,7 @@ bool PathIntegrator::scatter(PathRay& ray, SurfacePoint const& surface, Path& pa
             next.type = kRayReflection;
             next.scatteredAt = surface.P;
             // Lights have been asked for where `transfer` tells what `sample` draws.
-            bool const shares = material.mixes
+            bool const shares = material.mixes && state.sampleType == kSampleMixture
                 && (context_.scene().lights().hasSurfaces()
                     || !context_.scene().sky(kRayReflection).isEmpty());
             next.lobeDensity = next.skyDensity = shares ? context_.lobeDensity(next.direction)

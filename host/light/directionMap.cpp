@@ -12,6 +12,9 @@ constexpr int kWidth = 512, kHeight = 256;
 constexpr int kFine = 2;
 /// Below this share of all light above the mean, drawing costs more than it saves.
 constexpr double kWorthwhile = 0.05;
+/// A cell has this share of its neighbours' light too: what a small lamp has beyond the directions
+/// asked for would else be left to chance.
+constexpr double kBeyond = 1.0 / 64;
 constexpr float kPi = 3.14159265f;
 
 /// Cells of equal height in the cosine have one solid angle.
@@ -40,20 +43,29 @@ int pick(float const* shares, int n, float u, float& rest)
 
 DirectionMap::DirectionMap(std::function<float(Vec3f)> const& radiance)
 {
-    std::vector<double> cells(std::size_t(kWidth) * kHeight);
-    double sum = 0;
+    std::vector<double> seen(std::size_t(kWidth) * kHeight);
     for (int y = 0; y < kHeight; ++y)
         for (int x = 0; x < kWidth; ++x) {
-            double& cell =
-                cells[static_cast<std::size_t>(y) * kWidth + static_cast<std::size_t>(x)];
+            double& cell = seen[static_cast<std::size_t>(y) * kWidth + static_cast<std::size_t>(x)];
             for (int i = 0; i < kFine * kFine; ++i) {
                 float const value =
                     radiance(direction(static_cast<float>(x) + (float(i & 1) + 0.5f) / kFine,
                                        static_cast<float>(y) + (float(i >> 1) + 0.5f) / kFine));
                 cell += value > 0.0f && std::isfinite(value) ? static_cast<double>(value) : 0.0;
             }
-            sum += cell;
         }
+    std::vector<double> cells = seen;
+    for (int y = 0; y < kHeight; ++y)
+        for (int x = 0; x < kWidth; ++x)
+            for (int i = 0; i < 9; ++i) {
+                int const row = std::clamp(y + i / 3 - 1, 0, kHeight - 1);
+                int const column = (x + i % 3 - 1 + kWidth) % kWidth;
+                cells[static_cast<std::size_t>(y * kWidth + x)] +=
+                    kBeyond * seen[static_cast<std::size_t>(row * kWidth + column)];
+            }
+    double sum = 0;
+    for (double const cell : cells)
+        sum += cell;
     double const mean = sum / static_cast<double>(cells.size());
     double above = 0;
     for (double& cell : cells) {

@@ -185,6 +185,7 @@ Film Session::newFilm() const
 RenderReport Session::render(Film& film, RenderJob const& job)
 {
     auto const begin = std::chrono::steady_clock::now();
+    prepared_.findLobes();
     Rendering rendering(prepared_, film, job);
     onThreads(job.threads, [&] { rendering.work(); });
     RenderReport report = rendering.report();

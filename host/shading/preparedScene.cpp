@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "shading/preparedScene.h"
 
+#include "sampling/directions.h"
+#include "shading/lobeProbe.h"
 #include "shading/shadingContext.h"
 
 #include <cstring>
@@ -32,7 +34,9 @@ std::size_t sizeOf(int kind)
 
 PreparedMaterial prepare(Shader const& shader)
 {
-    PreparedMaterial material{shader.material(), shader.entryPoints(), nullptr, {}};
+    PreparedMaterial material{};
+    material.shader = shader.material();
+    material.entryPoints = shader.entryPoints();
     // The contract has no other place where a material tells the index of its medium.
     for (char const* name : {"u_ior", "refractiveIndex"})
         if (Parameter const* p = shader.find(name); p && p->type == ParameterType::Float)
@@ -76,18 +80,44 @@ PreparedScene::PreparedScene(Scene const& scene, BuildProgress const& progress)
     for (Shader const& shader : scene_.materials)
         materials_.push_back(prepare(shader));
     environmentChanged();
-    findMixtures();
 }
 
-void PreparedScene::findMixtures()
+void PreparedScene::findLobes()
 {
     constexpr std::uint32_t kDraws = 64;
     Inquiry inquiry(*this);
-    for (PreparedMaterial& material : materials_)
+    skiesAgree_ = true;
+    for (std::uint32_t i = 0; i < kDraws && environment() && skiesAgree_; ++i) {
+        inquiry.sampler.start(i);
+        Vec2f const u = inquiry.sampler.next2D();
+        Vec3f const d = around({0, 0, 1}, 2.0f * u.x - 1.0f, u.y);
+        skiesAgree_ = inquiry.context.sky(kRayReflection, d) == inquiry.context.sky(kRayDiffuse, d);
+    }
+    for (PreparedMaterial& material : materials_) {
+        material.mixes = false;
+        material.ofGathered = material.ofOthers = {};
         for (std::uint32_t i = 0; i < kDraws && material.scatters() && !material.mixes; ++i) {
             inquiry.sampler.start(i);
-            material.mixes = inquiry.context.drawsMixture(material);
+            ShadeState state = inquiry.context.trialRecord(material, kRayCamera);
+            material.shader->sample(&inquiry.context, state);
+            material.mixes = state.sampleType == kSampleMixture;
         }
+        if (!material.mixes || !environment())
+            continue;
+        std::uint32_t draw = 0;
+        auto const record = [&](std::uint32_t rayType) {
+            inquiry.sampler.start(draw++);
+            return inquiry.context.trialRecord(material, rayType);
+        };
+        material.ofOthers = probeLobes(material, kRayReflection, inquiry.context, record);
+        material.ofGathered = probeLobes(material, kRayDiffuse, inquiry.context, record);
+    }
+}
+
+bool PreparedScene::listsSky(PreparedMaterial const& material, std::uint32_t rayType) const
+{
+    SharedLobes const& lobes = rayType == kRayDiffuse ? material.ofGathered : material.ofOthers;
+    return lobes.same && (!lobes.gathers || skiesAgree_) && !sky(kRayReflection).isEmpty();
 }
 
 void PreparedScene::environmentChanged() { skies_ = std::make_unique<Sky[]>(2); }
@@ -112,7 +142,6 @@ void PreparedScene::materialChanged(std::size_t index)
     materials_[index] = prepare(scene_.materials[index]);
     if (((materials_[index].entryPoints & kTransmission) != 0) != wasClear)
         rays_.rebuildInstances({});
-    findMixtures();
 }
 
 void PreparedScene::instancesChanged(BuildProgress const& progress)

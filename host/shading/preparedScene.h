@@ -11,6 +11,12 @@
 
 namespace zsi::host {
 
+/// How a material's `shade` brings the same light by its list and by its rays.
+struct SharedLobes {
+    bool same = false; ///< by both alike, so that they may divide it between them
+    bool gathers = false; ///< some of it by gathered rays, which see the diffuse picture of the sky
+};
+
 struct PreparedMaterial {
     enum class Source { Uv, Uv1, Tangent, Bitangent, Color };
     struct Slot {
@@ -27,6 +33,8 @@ struct PreparedMaterial {
     /// Whether its samples are drawn from the lobes that `transfer` tells, so that both may share
     /// lights between them: some of its draws say so (kSampleMixture).
     bool mixes = false;
+    /// Of `shade`, where it mixes: asked by gathered rays, and by others.
+    SharedLobes ofGathered, ofOthers;
 
     /// Whether paths can go on by `sample` with light taken by `transfer`.
     bool scatters() const { return (entryPoints & kSample) && (entryPoints & kTransfer); }
@@ -53,6 +61,9 @@ public:
     /// Meshes are others. Renews all that stands on them.
     void meshesChanged(BuildProgress const& progress = {});
 
+    /// What the lobes of materials are by the values that their parameters have now.
+    void findLobes();
+
     Scene const& scene() const { return scene_; }
     RayScene const& rays() const { return rays_; }
     LightSet const& lights() const { return lights_; }
@@ -62,6 +73,9 @@ public:
     }
     /// Where the environment is brightest, as rays of the type see it.
     DirectionMap const& sky(std::uint32_t rayType) const;
+    /// Whether the material's `shade`, for a ray of the type, may have the sky in its list of
+    /// lights.
+    bool listsSky(PreparedMaterial const& material, std::uint32_t rayType) const;
     PreparedMaterial const& materialOf(SurfacePoint const& s) const
     {
         return materials_[static_cast<std::size_t>(scene_.instances[s.instance].material)];
@@ -77,13 +91,12 @@ private:
         DirectionMap map;
     };
 
-    void findMixtures();
-
     Scene const& scene_;
     RayScene rays_;
     LightSet lights_;
     std::vector<PreparedMaterial> materials_;
     std::unique_ptr<Sky[]> skies_; ///< reflected, diffuse
+    bool skiesAgree_ = true; ///< both rays see the same
 };
 
 } // namespace zsi::host

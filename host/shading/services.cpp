@@ -36,6 +36,14 @@ LightSample* ShadingContext::getLightSamples(int, Vec3f const* P, Vec3f const* n
     call_->askedLights_ = true;
     LightSample* head = nullptr;
     LightSample** end = &head;
+    if (*P == call_->surface.P && scene_.listsSky(call_->material, call_->ray.type)) {
+        call_->askedSky_ = true;
+        if (LightSample sample; askSky(*normal, sample)) {
+            head = &lightRecords_.add();
+            *head = sample;
+            end = &head->next;
+        }
+    }
     for (std::size_t i = 0; i < scene_.lights().size(); ++i) {
         Arrival picked;
         LightSample sample;
@@ -93,6 +101,30 @@ float ShadingContext::lobeDensity(Vec3f L)
     float const density = maxComponent(state.outBrdf) * state.sampleCosine;
     return density > 0.0f && std::isfinite(density) ? density
                                                     : std::numeric_limits<float>::infinity();
+}
+
+bool ShadingContext::askSky(Vec3f normal, LightSample& sample)
+{
+    DirectionMap const& map = scene_.sky(kRayReflection);
+    Vec3f const d = map.sample(sampler_->next2D());
+    float const cosine = dot(d, normal);
+    if (!(cosine > 0.0f))
+        return false;
+    float const lobe = lobeDensity(d);
+    if (std::isinf(lobe)) // nothing is sent on from there
+        return false;
+    Vec3f const light = sky(kRayReflection, d);
+    if (!(maxComponent(light) > 0.0f))
+        return false;
+    ++rays_;
+    if (scene_.rays().occluded({shadowStart(call_->surface.P, d), d}, Visibility::All))
+        return false;
+    sample = {};
+    sample.L = d;
+    sample.color = light / (3.14159265f * (map.density(d) + lobe));
+    sample.shadow = {1, 1, 1};
+    sample.weight = minOf(cosine, 1.0f);
+    return true;
 }
 
 Vec3f ShadingContext::ambientLight(Vec3f const* P, Vec3f const* N)
@@ -185,9 +217,15 @@ bool ShadingContext::child(Vec3f const* origin, Vec3f const* direction, float im
         ray.importance = full;
     }
     ray.scatteredAt = *origin;
+    ray.lobeDensity = std::numeric_limits<float>::infinity();
     bool const listed = scene_.lights().hasSurfaces() && call_->askedLights_;
-    ray.lobeDensity = listed && call_->material.scatters() ? lobeDensity(ray.direction)
-                                                           : std::numeric_limits<float>::infinity();
+    if (call_->askedSky_ || (listed && call_->material.scatters())) {
+        float const lobe = lobeDensity(ray.direction);
+        if (listed)
+            ray.lobeDensity = lobe;
+        if (call_->askedSky_)
+            ray.skyDensity = lobe;
+    }
 
     changeMedia(ray, call_->ray.direction, call_->surface, call_->material.ior);
     return true;
@@ -274,7 +312,7 @@ Vec3f ShadingContext::traceLobe(Vec3f const* origin, Vec3f const* direction, flo
 template <class Density>
 Vec3f ShadingContext::gather(PathRay ray, Density const& density)
 {
-    if (scene_.sky(ray.type).isEmpty())
+    if (scene_.sky(ray.type).isEmpty() || call_->askedSky_)
         return rgb(source_.radiance(ray));
     ray.skyDensity = density(ray.direction);
     Vec3f const sky = fromSky(

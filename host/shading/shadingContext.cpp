@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "shading/shadingContext.h"
 
+#include "sampling/directions.h"
+
 #include <algorithm>
 #include <cstring>
 
@@ -135,23 +137,30 @@ Vec3f ShadingContext::sky(std::uint32_t rayType, Vec3f d)
     return rgb(environment(ray));
 }
 
-bool ShadingContext::drawsMixture(PreparedMaterial const& material)
+ShadeState ShadingContext::trialRecord(PreparedMaterial const& material, std::uint32_t rayType)
 {
+    using Source = PreparedMaterial::Source;
+    Vec2f const place = sampler_->next2D(), way = sampler_->next2D();
     PathRay ray;
-    ray.direction = {0, 0, -1};
+    ray.type = rayType;
+    ray.direction = -around({0, 0, 1}, 0.2f + 0.8f * way.x, way.y);
     ShadeState state = record(ray);
-    Vec2f const place = sampler_->next2D();
     state.P = state.Pref = {place.x, place.y, 0};
     state.E = state.P - ray.direction;
     state.N = state.Ng = state.Nref = {0, 0, 1};
+    auto const deliver = [&](PreparedMaterial::Slot const& slot, auto const& value) {
+        std::memcpy(state.attributes + slot.offset, &value, sizeof value);
+    };
     for (PreparedMaterial::Slot const& slot : material.attributes)
-        if (slot.source == PreparedMaterial::Source::Uv
-            || slot.source == PreparedMaterial::Source::Uv1)
-            std::memcpy(state.attributes + slot.offset, &place, sizeof place);
+        if (slot.source == Source::Uv || slot.source == Source::Uv1)
+            deliver(slot, place);
+        else if (slot.source == Source::Color)
+            deliver(slot, Vec4f(1, 1, 1, 1));
+        else
+            deliver(slot, slot.source == Source::Tangent ? Vec3f(1, 0, 0) : Vec3f(0, 1, 0));
     std::fill_n(state.allowReflection, 3, std::uint8_t(1));
     std::fill_n(state.allowTransmission, 3, std::uint8_t(1));
-    material.shader->sample(this, state);
-    return state.sampleType == kSampleMixture;
+    return state;
 }
 
 bool ShadingContext::shade(PathRay const& ray, SurfacePoint const& surface, Vec4f& result)
@@ -175,6 +184,7 @@ void ShadingContext::passIgnored(PathRay& ray, SurfacePoint const& surface)
 {
     ray.origin =
         offsetPoint(surface.P, surface.Ng * (dot(ray.direction, surface.Ng) < 0.0f ? -1.0f : 1.0f));
+    ray.skyDensity = std::numeric_limits<float>::infinity(); // what lies behind is its alone
     ++ray.ignored;
 }
 

@@ -75,6 +75,7 @@ public:
         ShadingContext& context_;
         Gathered gathered_;
         bool askedLights_ = false;
+        bool askedSky_ = false; ///< as one of the lights
         Call* outer_;
         std::size_t lightMark_;
     };
@@ -90,8 +91,9 @@ public:
     /// that density.
     template <class Value, class Density>
     Vec3f fromSky(std::uint32_t rayType, Value const& value, Density const& density);
-    /// One draw of the material at a place of its own choice: is it one of kSampleMixture?
-    bool drawsMixture(PreparedMaterial const& material);
+    /// To try a material with: a place, and a ray of the type that meets it from above, drawn from
+    /// the sampler; all six switches of `sample` are set.
+    ShadeState trialRecord(PreparedMaterial const& material, std::uint32_t rayType);
     /// The point of light `light` that is to light `P`: its place, direction and, where rays meet
     /// the light, density are told. False where it is behind `normal` or brings nothing for sure.
     bool pickLight(std::size_t light, Vec3f P, Vec3f normal, Arrival& picked);
@@ -136,6 +138,8 @@ private:
     Vec4f environment(PathRay const& ray);
     /// What a ray sees of the surface light that it met.
     Vec3f emission(PathRay const& ray, SurfacePoint const& surface) const;
+    /// The sky as one light of the running call's list.
+    bool askSky(Vec3f normal, LightSample& sample);
     ShadeState record(PathRay const& ray) const;
     void fillSurface(PathRay const& ray, SurfacePoint const& s, PreparedMaterial const& material,
                      ShadeState& state) const;

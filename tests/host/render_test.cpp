@@ -357,6 +357,36 @@ TEST(Render, SmallLampsInTheSkyAreFound)
     }
 }
 
+// Materials that draw directions of their own share such a lamp with their lights' list: it shows
+// as a sun of its width and brightness does, which stands in the list alone.
+TEST(Render, LampsInTheSkyAreSharedWithDrawnRays)
+{
+    Vec3f const lamp = normalize(Vec3f(0.48f, 0.6f, 0.64f));
+    float const edge = std::cos(0.012217f);
+    Sky const lit([&](Vec3f d) { return dot(d, lamp) > edge ? grey(1e5f) : grey(0.1f); });
+    Sky const plain([](Vec3f) { return grey(0.1f); });
+    for (auto const& [name, values] : std::vector<std::pair<std::string, Stage::Values>>{
+             {"corvid_Mtl_Metal", {{"u_roughValue", 0.5f}}},
+             {"corvid_Mtl_MetallicPaint", {{"u_flakeDensity", 0.0f}, {"u_coatRoughValue", 0.3f}}},
+             {"MarlowLegacy", {{"transparencyMode", -1}, {"usingHDRbuffer", true}}}})
+        for (char const* integrator : kIntegrators) {
+            auto const shown = [&](Sky const& sky, float sun) {
+                Stage stage;
+                stage.scene.settings.integrator = integrator;
+                stage.scene.settings.samples = 64;
+                stage.scene.settings.maxDepth = 1;
+                stage.sky(sky);
+                stage.card(stage.material(name, values));
+                if (sun > 0.0f)
+                    stage.scene.lights.push_back(host::SunLight{lamp, grey(sun), 1.4f});
+                stage.watch({0, 0, 0}, {-0.5f, -0.4f, 1});
+                return mean(stage.render()).z;
+            };
+            float const want = shown(plain, 1e5f * 2 * (1 - edge));
+            EXPECT_NEAR(shown(lit, 0) / want, 1, 0.03f) << name << ' ' << integrator;
+        }
+}
+
 TEST(Render, SurfaceLightsAreSeenAndLightTheirSurroundings)
 {
     struct Row {
