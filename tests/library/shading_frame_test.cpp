@@ -7,10 +7,6 @@
 namespace zsi {
 namespace {
 
-using test::inner;
-using test::minus;
-using test::outer;
-using test::times;
 using test::Vec3d;
 
 SLArray<Vec3f> const kWorld{{{1, 0, 0}, {0, 1, 0}, {0, 0, 1}}};
@@ -66,8 +62,8 @@ TEST(SafeReflect, KeepsTheMarginInThePlaneOrFallsBackToTheNormal)
         Vec3f I = random.unit();
         if (dot(I, Ng) > 0)
             I = -I; // from outside
-        Vec3d const mirror = minus(I, times(N, 2 * test::dotOf(I, N)));
-        double const height = inner(mirror, Ng);
+        Vec3d const mirror = Vec3d(I) - Vec3d(N) * (2 * dot(Vec3d(I), Vec3d(N)));
+        double const height = dot(mirror, Vec3d(Ng));
         if (dot(I, Ng) > -0.1f || dot(I, N) > -0.1f || std::fabs(height - 0.05) < 1e-6)
             continue; // too near to a decision, or to a division by nothing
         Vec3d const got = reflect(I, Ng, N);
@@ -76,11 +72,11 @@ TEST(SafeReflect, KeepsTheMarginInThePlaneOrFallsBackToTheNormal)
             ++kept;
             continue;
         }
-        ASSERT_NEAR(inner(got, got), 1, 1e-6);
-        ASSERT_NEAR(inner(got, Ng), 0.05, 1e-4);
-        ASSERT_NEAR(inner(got, outer(I, N)), 0, 1e-4) << "in the plane of I and N";
+        ASSERT_NEAR(dot(got, got), 1, 1e-6);
+        ASSERT_NEAR(dot(got, Vec3d(Ng)), 0.05, 1e-4);
+        ASSERT_NEAR(dot(got, cross(Vec3d(I), Vec3d(N))), 0, 1e-4) << "in the plane of I and N";
         // Of the two such vectors, the one on N's side of the ray.
-        ASSERT_GT(inner(outer(I, got), outer(I, N)), 0);
+        ASSERT_GT(dot(cross(Vec3d(I), got), cross(Vec3d(I), Vec3d(N))), 0);
         ++bent;
     }
     EXPECT_GT(kept, 1000);

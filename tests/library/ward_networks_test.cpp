@@ -26,32 +26,8 @@ struct Variant : test::Subject {
     }
 };
 
-TEST(WardNetworks, NoiseBlendsBetweenItsThresholds)
+TEST(WardNetworks, NoiseHasOctavesOfItsPlace)
 {
-    // Noise of the host; weight of the second colour.
-    for (test::Line const& line : test::table(R"(
-plain, half way                              | type=0 thresholdLow=.25 thresholdHigh=.75 | .5 .5
-at the low threshold                         | type=0 thresholdLow=.25 thresholdHigh=.75 | .25 0
-above the high one                           | type=0 thresholdLow=.25 thresholdHigh=.75 | .8 1
-equal: the value itself, above               | type=0 thresholdLow=.5 thresholdHigh=.5   | .75 .75
-and below                                    | type=0 thresholdLow=.5 thresholdHigh=.5   | .25 .25
-the wrong way round: below low comes first   | type=0 thresholdLow=.75 thresholdHigh=.25 | .5 0
-fractal: (1/2 + 1/4 + 1)/2                   | type=1 levels=2                           | .75 .875
-a fraction is a whole octave                 | type=1 levels=2.1                         | .75 .9375
-less than one level                          | type=1 levels=.01                         | .75 .75
-no levels                                    | type=1                                    | .75 .5
-turbulence: 1/2 + 1/4                        | type=2 levels=2                           | .25 .75
-beyond 1                                     | type=2 levels=3 thresholdHigh=4           | 1 .4375
-unknown: 0 through the thresholds            | type=3 levels=2 thresholdLow=-1           | .9 .5
-unknown, negative                            | type=-1 levels=2 thresholdLow=.1          | .9 0
-)")) {
-        Variant v("120b7820");
-        v.prefix = "_ward_diffuse_color_Noise_";
-        v.set("color1=0,1,.25,0 color2=1,0,.75,1 thresholdHigh=1 " + line.settings);
-        v.host.onNoise = [&](Vec4f) { return line.want[0]; };
-        float const w = line.want[1];
-        EXPECT_TRUE(test::near(v.albedo(), Vec3f(w, 1 - w, 0.25f + 0.5f * w), 2e-6)) << line.why;
-    }
     // Octaves of a placed position, of which the phase is none; an end to any number of levels.
     Variant v("120b7820");
     v.prefix = "_ward_diffuse_color_Noise_";
@@ -221,23 +197,6 @@ TEST(WardNetworks, EveryNodeFeedsItsInputAndEveryRootItsChannel)
             EXPECT_NEAR(got[3], (0.6f * slope + 0.8f) / std::sqrt(1 + slope * slope), 1e-3f);
             EXPECT_NEAR(got[4], 1 - cut, 1e-5f);
         }
-}
-
-TEST(WardNetworks, BitmapLiesAlongUvOrOnABox)
-{
-    for (test::Line const& line : test::table(R"(
-uv, 1, 1: .05 + .05 + .3 + .04 | uv=.5,.25 xform=.1,0,0,0,.2,0,0,0,.3,0,0,0,.04,0,0,1          | .44
-placed on z: .01 + .04 + .09   | isCube=1 Nref=0,0,-1 xform=.1,0,0,0,.2,0,0,0,.3,0,1,0,0,0,0,1 | .14
-z turned to x                  | isCube=1 Nref=0,0,-1 xform=0,0,1,0,0,1,0,0,1,0,0,0,0,0,0,1    | .1
-face of x                      | isCube=1 Nref=.6,-.6,.5                                       | .3
-face of y                      | isCube=1 Nref=.5,.6,-.6                                       | .1
-)")) {
-        Variant v("82261344");
-        v.prefix = "_ward_cutout_map_UnifiedBitmap_";
-        v.texture(v.prefix + "texture", [](Vec2f p) { return Vec4f(p.x, 9, 9, 9); });
-        v.set("amount=.5 Pref=.1,.2,.3 cutoutAmount=.5 " + line.settings);
-        EXPECT_NEAR(v.results()[4], 1 - line.want[0] / 4, 1e-6f) << line.why;
-    }
 }
 
 TEST(WardNetworks, ReliefTurnsAndGrowsWithItsObject)

@@ -18,10 +18,7 @@ struct Paint : test::Subject {
         set(settings);
         test::setAttribute(state, byName.at("vtxcolor").offset, Vec4f(0.5f, 0, 0, 1)); // half open
     }
-    void whiteRoom()
-    {
-        host.onTrace = host.onIndirect = [](Vec3f, Vec3f) { return kWhite; };
-    }
+    void whiteRoom() { set("trace=1,1,1 indirect=1,1,1"); }
     /// Slopes as the widths of the flakes assume: Gaussian, mean square 0.1.
     auto& gaussianFlakes()
     {
@@ -58,70 +55,6 @@ TEST(CarPaint, FunctionsOfCurvesAndFlakes)
     test::FunctionTexture<Vec2f> normals([](Vec2f uv) { return Vec4f(uv.x, uv.y, 0.9f, 0); });
     s.flakeNormalTexture.texture = &normals;
     EXPECT_EQ(s.f_getFlakeNormal(&host, state, {0.25f, 1}), Vec3f(-0.5f, 1, 0.9f));
-}
-
-TEST(CarPaint, MaskCutsItOut)
-{
-    // Mask, and what is seen of black paint before white of alpha 0.5.
-    for (test::Line const& line : test::table(R"(
-colour | maskingColor=.1,.5,1                                  | .1 .5 1     .5
-map    | maskingColor=1,0,1 maskingMode=1 maskingTexture=.25,.75,.5,1 | .25 .75 .5 .5
-)")) {
-        Paint p("xriteIsSolid=1 xriteDiffuse=0,0,0 fresnel=0,0,1,1 " + line.settings);
-        p.host.onThrough = [](Vec3f, Vec3f) { return Vec4f(1, 1, 1, 0.5f); };
-        EXPECT_TRUE(test::near(p.shade(), test::vec3(line.want), 1e-6)) << line.why;
-        EXPECT_NEAR(p.state.Ci.w, line.want.at(3), 1e-6f);
-        p.material().transmission(&p.host, p.state);
-        EXPECT_EQ(p.state.transmissionColor, test::vec3(line.want)) << line.why;
-    }
-}
-
-TEST(CarPaint, BaseFlakesAndCoatShareTheRoomAndItsOcclusion)
-{
-    // Seen in a white room; the same half occluded; by cubes, which are half as bright, and
-    // likewise. The host knows what occludes its reflections.
-    for (test::Line const& line : test::table(R"(
-base under the coat | xriteIsSolid=1 xriteDiffuse=1,1,1 diffIntensity=.5               | .52 .28   .26 .13
-base alone          | xriteIsSolid=1 xriteDiffuse=1,1,1 fresnel=0,0,1,1                | 1 .5      .5 .25
-flakes alone        | flakeColor=1,1,1 flakeColor2=1,1,1 contributionFactor=.8 fresnel=0,0,1,1 xriteDiffuse=0,0,0 | .8 .4 .4 .2
-coat alone          | fresnel=1,0,1,1 specIntensity=.5                                 | .5 .5     .25 .125
-)"))
-        for (int i = 0; i < 4; ++i) {
-            Paint p(line.settings);
-            p.whiteRoom();
-            p.set("ambientOcclusionMode", i % 2 ? 2.0f : 0.0f);
-            if (i >= 2)
-                p.set("diffuseCube=.5,.5,.5,1 specularCube=.5,.5,.5,1 reflectCube=.5,.5,.5,1");
-            auto& normals =
-                p.texture("flakeNormalTexture", [](Vec2f) { return Vec4f(0.5f, 0.5f, 1, 1); });
-            EXPECT_NEAR(p.shade().x, line.want.at(static_cast<std::size_t>(i)), 1e-5f)
-                << line.why << i;
-            EXPECT_TRUE(normals.lookups.empty() || !line.why.starts_with("base")) << "not read";
-        }
-}
-
-TEST(CarPaint, FlakesThatLeanShowTheSecondColour)
-{
-    // Red flakes that turn green. Slope of the flakes; distance; share of green: squared slope over
-    // itself plus the mean square, both times the squared coarseness. Of many: 1 - e E1(1).
-    for (test::Line const& line : test::table(R"(
-flat         | coarseness=1  | 0 0           .1  0
-as the mean  | coarseness=1  | .31622777 0   .1  .5
-either way   | coarseness=-1 | .3 -.3        .1  .6428571
-flat at last | coarseness=0  | .3 0          .1  0
-far          | coarseness=1  | .3 0          1e6 .4036526
-)")) {
-        Paint p("flakeColor=1,0,0 flakeColor2=0,1,0 contributionFactor=1 xriteDiffuse=0,0,0 "
-                "fresnel=0,0,1,1 "
-                + line.settings);
-        p.texture("flakeNormalTexture", [&](Vec2f) {
-            return Vec4f(0.5f + line.want.at(0) / 2, 0.5f + line.want.at(1) / 2, 1, 1);
-        });
-        p.state.E = {0, 0, line.want.at(2)};
-        p.whiteRoom();
-        EXPECT_TRUE(test::near(p.shade(), {1 - line.want.at(3), line.want.at(3), 0}, 1e-3))
-            << line.why;
-    }
 }
 
 /// A flake is 1/2048 wide at the defaults, a pixel a thousandth of the distance.
@@ -175,6 +108,24 @@ TEST(CarPaint, FlakesGlintNearAndFadeFarWithTheSameBrightness)
         last = x;
     }
     EXPECT_NEAR(changes, 130, 30);
+}
+
+/// Red flakes that turn green under a light that they mirror: alone by their own slope of .3, whose
+/// square is .09 of .09 and the mean .1; far away by the slope h of the half vector, over h^2 and
+/// the width .11 of them all.
+TEST(CarPaint, FlopShowsUnderLights)
+{
+    for (bool const far : {false, true})
+        for (float const h : {0.0f, 0.2f, 0.33166248f, 0.6f}) {
+            Paint p("flakeColor=1,0,0 flakeColor2=0,1,0 contributionFactor=1 xriteDiffuse=0,0,0 "
+                    "fresnel=0,0,1,1 coarseness=1 flakeNormalTexture=.65,.5,1,1");
+            p.state.E = {0, 0, far ? 1e6f : 0.1f};
+            Vec3f const half = normalize(Vec3f(h, 0, 1));
+            p.host.addLight(half * (2 * half.z) - Vec3f(0, 0, 1), kWhite);
+            Vec3f const c = p.shade();
+            float const want = far ? h * h / (h * h + 0.11f) : 0.09f / 0.19f;
+            EXPECT_NEAR(c.y / (c.x + c.y), want, 2e-3f) << far << h;
+        }
 }
 
 /// White paint under a dome of lights shows what it shows in a white room.

@@ -62,16 +62,8 @@ struct Vec3d {
         return l > 0 ? a * (1 / l) : a;
     }
 };
-constexpr Vec3d plus(Vec3d a, Vec3d b) { return a + b; }
-constexpr Vec3d times(Vec3d a, double k) { return a * k; }
-constexpr Vec3d minus(Vec3d a, Vec3d b) { return a - b; }
-constexpr double inner(Vec3d a, Vec3d b) { return dot(a, b); }
-constexpr Vec3d outer(Vec3d a, Vec3d b) { return cross(a, b); }
-inline Vec3d unitOf(Vec3d a) { return normalize(a); }
 inline Vec3f toFloat(Vec3d a) { return {float(a.x), float(a.y), float(a.z)}; }
 inline double distance(Vec3d a, Vec3d b) { return std::sqrt(dot(a - b, a - b)); }
-inline double clampUnit(double t) { return t < 0 ? 0 : t > 1 ? 1 : t; }
-inline double dotOf(Vec3f a, Vec3f b) { return dot(Vec3d(a), Vec3d(b)); }
 
 /// Whether the distance is within the tolerance; NaN never is.
 inline testing::AssertionResult near(Vec3d got, Vec3d want, double tolerance)

@@ -5,6 +5,7 @@
 
 #include "support/loadedLibrary.h"
 #include "support/scriptedHost.h"
+#include "support/stateFields.h"
 
 #include <map>
 #include <memory>
@@ -17,17 +18,38 @@ inline std::vector<float> numbers(std::string text)
     std::replace(text.begin(), text.end(), ',', ' ');
     std::istringstream in(text);
     std::vector<float> v;
-    for (float f; in >> f;)
-        v.push_back(f);
-    EXPECT_TRUE(in.eof()) << text;
+    for (std::string word; in >> word;)
+        v.push_back(std::strtof(word.c_str(), nullptr));
     return v;
+}
+/// A constant of `n` numbers or, behind it, `n` more for each coordinate: what they add per unit.
+inline Vec4f plane(std::vector<float> const& v, std::size_t n, std::vector<float> const& at)
+{
+    EXPECT_TRUE(v.size() == n || v.size() == n * (at.size() + 1)) << v.size();
+    float result[4] = {};
+    for (std::size_t i = 0; i < v.size(); ++i)
+        result[i % n] += v[i] * (i < n ? 1 : at.at(i / n - 1));
+    return {result[0], result[1], result[2], result[3]};
 }
 inline Vec3f vec3(std::vector<float> const& v, std::size_t at = 0)
 {
     return {v.at(at), v.at(at + 1), v.at(at + 2)};
 }
 
-/// "why | settings | numbers" per line; empty lines are skipped.
+/// A line "why | settings | results".
+struct Row {
+    std::string why, settings, results;
+
+    explicit Row(std::string const& line)
+    {
+        std::istringstream cells(line);
+        std::getline(cells, why, '|');
+        std::getline(cells, settings, '|');
+        std::getline(cells, results);
+    }
+};
+
+/// A row whose results are numbers.
 struct Line {
     std::string why, settings;
     std::vector<float> want;
@@ -36,14 +58,9 @@ inline std::vector<Line> table(char const* text)
 {
     std::vector<Line> lines;
     std::istringstream in(text);
-    for (std::string line; std::getline(in, line);) {
-        std::istringstream cells(line);
-        std::string why, settings, want;
-        if (std::getline(cells, why, '|') && std::getline(cells, settings, '|')) {
-            std::getline(cells, want);
-            lines.push_back({why, settings, numbers(want)});
-        }
-    }
+    for (std::string line; std::getline(in, line);)
+        if (Row const row(line); line.find('|') != line.npos)
+            lines.push_back({row.why, row.settings, numbers(row.results)});
     EXPECT_FALSE(lines.empty());
     return lines;
 }
@@ -57,6 +74,7 @@ struct Subject {
     std::vector<std::unique_ptr<FunctionTexture<Vec3f>>> cubes;
     ScriptedHost host;
     ShadeState state = plainHit();
+    double tolerance = 2e-6; ///< of comparisons
 
     explicit Subject(std::string const& name)
         : shader(Library::instance().create(name))
@@ -100,38 +118,60 @@ struct Subject {
             *row.field = v.at(0) != 0;
         else if (row.type == "int")
             *reinterpret_cast<int*>(row.field) = static_cast<int>(v.at(0));
+        else if (row.type == "attribute")
+            std::memcpy(state.attributes + row.offset, v.data(), v.size() * sizeof(float));
         else if (row.type == "texture2D")
-            texture(name, [=](Vec2f) { return Vec4f(v.at(0), v.at(1), v.at(2), v.at(3)); });
+            texture(name, [=](Vec2f p) { return plane(v, 4, {p.x, p.y}); });
         else if (row.type == "textureCube")
-            cube(name, [=](Vec3f) { return Vec4f(v.at(0), v.at(1), v.at(2), v.at(3)); });
+            cube(name, [=](Vec3f p) { return plane(v, 4, {p.x, p.y, p.z}); });
         else {
             EXPECT_EQ(v.size() * sizeof(float), row.size) << name;
             std::memcpy(row.field, v.data(), std::min(row.size, v.size() * sizeof(float)));
         }
     }
-    /// Words "name=value": I, N, Pref, Nref, uv, or parameters; `prefix` (of a network's node) or
-    /// "u_" may be left out, and a texture is of one texel.
+    /// Words "name=value": a field of the record, what the host answers (`light` adds one: L,
+    /// colour, shadow, weight), or a parameter or attribute; `prefix` (of a network's node) or "u_"
+    /// may be left out. Textures and answers are planes: see `plane`.
     std::string prefix;
     void set(std::string const& settings)
     {
         std::istringstream in(settings);
         for (std::string word; in >> word;) {
             std::string const name = word.substr(0, word.find('='));
-            auto const v = numbers(word.substr(name.size() + 1));
-            if (name == "I" || name == "N" || name == "Pref" || name == "Nref")
-                (name == "I"          ? state.I
-                     : name == "N"    ? state.N
-                     : name == "Pref" ? state.Pref
-                                      : state.Nref) = vec3(v);
-            else if (name == "uv")
-                attribute("uv", Vec2f(v.at(0), v.at(1)));
-            else
-                set((byName.contains(prefix + name)     ? prefix
-                         : byName.contains("u_" + name) ? "u_"
-                                                        : "")
-                        + name,
-                    v);
+            if (name == "prefix")
+                prefix = word.substr(7);
+            else if (name == "tolerance")
+                tolerance = std::stod(word.substr(10));
+            else if (auto const v = numbers(word.substr(name.size() + 1)); !setHost(name, v))
+                if (!writeState(state, name, v))
+                    set((byName.contains(prefix + name)     ? prefix
+                             : byName.contains("u_" + name) ? "u_"
+                                                            : "")
+                            + name,
+                        v);
         }
+    }
+    bool setHost(std::string const& name, std::vector<float> const& v)
+    {
+        std::map<std::string, ScriptedHost::Answer*> const answers{
+            {"trace", &host.onTrace},       {"ambient", &host.onAmbient},
+            {"indirect", &host.onIndirect}, {"occlusion", &host.onOcclusion},
+            {"shadow", &host.onShadow},
+        };
+        auto const list = [](Vec3f d) { return std::vector{d.x, d.y, d.z}; };
+        if (auto const answer = answers.find(name); answer != answers.end())
+            *answer->second = [=](Vec3f, Vec3f d) { return rgb(plane(v, 3, list(d))); };
+        else if (name == "through")
+            host.onThrough = [=](Vec3f, Vec3f d) { return plane(v, 4, list(d)); };
+        else if (name == "noise")
+            host.onNoise = [=](Vec4f p) { return plane(v, 1, {p.x, p.y, p.z, p.w}).x; };
+        else if (name == "random")
+            host.randoms = v;
+        else if (name == "light")
+            host.addLight(vec3(v), vec3(v, 3), vec3(v, 6), v.at(9));
+        else
+            return false;
+        return true;
     }
     MaterialShader const& material() const { return static_cast<MaterialShader const&>(*shader); }
     Vec3f shade()
