@@ -46,6 +46,13 @@ if(ZSI_BUILD_HOST)
 
     configure_file(host/cmd/zsi.1.in ${staging}/zsi.1 @ONLY)
     install(FILES ${staging}/zsi.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1 COMPONENT runtime)
+    # With the classes of this build; other libraries' are in what `zsi schema` writes.
+    set(schema ${PROJECT_BINARY_DIR}/scene.schema.json)
+    add_custom_command(OUTPUT ${schema}
+        COMMAND zsi schema --shader-path ${PROJECT_BINARY_DIR}/shaders > ${schema}
+        DEPENDS zsi description zephyrShaders64 VERBATIM)
+    add_custom_target(schema ALL DEPENDS ${schema})
+    install(FILES ${schema} DESTINATION ${CMAKE_INSTALL_DATADIR}/zsi COMPONENT runtime)
     install(DIRECTORY scenes assets DESTINATION ${CMAKE_INSTALL_DATADIR}/zsi COMPONENT runtime)
 endif()
 

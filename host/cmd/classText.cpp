@@ -67,26 +67,6 @@ double decimal(float v)
     return std::isfinite(v) ? std::stod(fmt::format("{}", v)) : static_cast<double>(v);
 }
 
-/// Null for a texture, which is empty, and for what has no default.
-Json defaultJson(host::Parameter const& p)
-{
-    if (!p.about.hasDefault)
-        return nullptr;
-    if (p.type == host::ParameterType::Bool)
-        return *static_cast<bool const*>(p.field);
-    if (p.type == host::ParameterType::Int)
-        return *static_cast<int const*>(p.field);
-    std::vector<float> const v = floatsOf(p);
-    if (v.empty())
-        return nullptr;
-    if (v.size() == 1)
-        return decimal(v[0]);
-    Json list = Json::array();
-    for (float const x : v)
-        list.push_back(decimal(x));
-    return list;
-}
-
 std::string rangeText(host::Parameter const& p)
 {
     if (!p.about.slider)
@@ -208,6 +188,25 @@ Json parameterJson(host::Parameter const& p)
 }
 
 } // namespace
+
+Json defaultJson(host::Parameter const& p)
+{
+    if (!p.about.hasDefault)
+        return nullptr;
+    if (p.type == host::ParameterType::Bool)
+        return *static_cast<bool const*>(p.field);
+    if (p.type == host::ParameterType::Int)
+        return *static_cast<int const*>(p.field);
+    std::vector<float> const v = floatsOf(p);
+    if (v.empty())
+        return nullptr;
+    if (v.size() == 1)
+        return decimal(v[0]);
+    Json list = Json::array();
+    for (float const x : v)
+        list.push_back(decimal(x));
+    return list;
+}
 
 std::string classText(host::Shader const& shader)
 {

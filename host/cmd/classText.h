@@ -16,6 +16,9 @@ std::string classText(host::Shader const& shader); ///< for a terminal
 std::string classMarkdown(host::Shader const& shader); ///< a page, as in docs/shaders
 Json classJson(host::Shader const& shader); ///< docs/host.md tells the keys
 
+/// What a new object holds; null for a texture, which is empty, and for what has no default.
+Json defaultJson(host::Parameter const& parameter);
+
 /// A line for each class.
 std::string listText(std::vector<host::Shader> const& shaders);
 Json listJson(std::vector<host::Shader> const& shaders);

@@ -29,6 +29,7 @@ struct Subcommand {
 /// `shaderPath`: the global option, which outlives the subcommand and is filled by the parse.
 Subcommand addInfo(CLI::App& app, std::string const& shaderPath);
 Subcommand addRender(CLI::App& app, std::string const& shaderPath);
+Subcommand addSchema(CLI::App& app, std::string const& shaderPath);
 
 /// All shader libraries; those that cannot be used lead to warnings on stderr.
 host::ShaderLibraries loadLibraries(std::string const& shaderPath);

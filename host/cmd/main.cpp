@@ -67,7 +67,8 @@ int run(int argc, char** argv)
                    "ZSI_SHADER_PATH, else the folder `shaders` beside this program, else the "
                    "installed one")
         ->type_name("FOLDER[:FOLDER]");
-    Subcommand const subcommands[] = {addInfo(app, shaderPath), addRender(app, shaderPath)};
+    Subcommand const subcommands[] = {addInfo(app, shaderPath), addRender(app, shaderPath),
+                                      addSchema(app, shaderPath)};
     app.footer("Exit status: 0 done, 1 bad input, 2 bad command line, 130 interrupted.");
 
     try {
@@ -80,7 +81,7 @@ int run(int argc, char** argv)
     for (Subcommand const& subcommand : subcommands)
         if (subcommand.app->parsed())
             return subcommand.run();
-    throw UsageError("a subcommand is missing: info or render (zsi --help)");
+    throw UsageError("a subcommand is missing: info, render or schema (zsi --help)");
 }
 
 } // namespace

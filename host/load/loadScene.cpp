@@ -16,8 +16,10 @@ namespace {
 /// Parts in order; later ones refer to earlier ones by name.
 void read(JsonReader const& root, SceneBuilder& builder)
 {
-    root.expectKeys({"include", "camera", "film", "settings", "meshes", "materials", "instances",
+    root.expectKeys({"$schema", "include", "camera", "film", "settings", "meshes", "materials", "instances",
                      "lights", "environment"});
+    if (auto const v = root.find("$schema")) // for editors
+        v->toString();
     if (auto const v = root.find("camera"))
         builder.scene.camera = readCamera(*v);
     if (auto const v = root.find("film"))

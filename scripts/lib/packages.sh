@@ -6,7 +6,8 @@
 packages_build=(g++ cmake ninja-build libembree-dev libopenimageio-dev openimageio-tools
     libimath-dev libtbb-dev libassimp-dev zlib1g-dev nlohmann-json3-dev libcli11-dev libfmt-dev
     libelf-dev)
-packages_test=(libgtest-dev libbenchmark-dev binutils valgrind pkg-config dpkg-dev file groff-base)
+packages_test=(libgtest-dev libbenchmark-dev binutils valgrind pkg-config dpkg-dev file groff-base
+    python3-jsonschema)
 packages_lint=(clang-14 clang-format-14 clang-tidy-14 cppcheck)
 
 # install_missing PACKAGE...: installs those that are not there; sudo only if not root.

@@ -36,10 +36,11 @@ zsi=$prefix/bin/zsi
 has "linear RGB" spot
 "$zsi" render "$prefix/share/zsi/scenes/demo.json" -o demo.png --size 32x18 --samples 1 >demo.log
 [ -s demo.png ] || fail "no picture of the installed scene"
+grep -q corvid_Mtl_Glazing "$prefix/share/zsi/scene.schema.json" || fail "no schema"
 
 # The manual has every option that the command has, and is well-formed.
 page=$prefix/share/man/man1/zsi.1
-for subcommand in "" info render; do
+for subcommand in "" info render schema; do
     "$zsi" $subcommand --help | grep -oE -- '--[a-z][a-z-]*' | sort -u | while read -r option; do
         grep -qF -- "${option//-/\\-}" "$page" || fail "zsi.1: $option is missing"
     done
