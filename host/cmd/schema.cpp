@@ -35,6 +35,7 @@ char const* const kFormat = R"json({
     "height": {"type": "integer", "minimum": 1, "maximum": 32768, "default": 360},
     "exposure": {"type": "number", "minimum": -64, "maximum": 64, "default": 0,
                  "description": "stops, for 8-bit files"},
+    "view": {"type": "string", "description": "how colours become 8 bits (docs/scene-format.md)"},
     "alpha": {"type": "boolean", "description": "with the alpha of the shaders, or opaque"},
     "crop": {"type": "array", "items": {"type": "integer", "minimum": 0}, "minItems": 4, "maxItems": 4,
              "description": "x0, y0, x1, y1 in pixels from the upper left, the end exclusive"},

@@ -207,7 +207,7 @@ TEST_F(Command, BadCallsEndInOneLineAndLeaveNothing)
     };
     std::string const render = "render scene.json -o a.png ";
     Call const calls[] = {
-        {"", 2, {"info or render"}},
+        {"", 2, {"info, render or schema"}},
         {"rendr scene.json", 2, {"rendr", "did you mean render?"}},
         {"info a b", 2, {"unexpected argument"}},
         {"--threads 2 render scene.json -o a.png", 2, {"behind the subcommand"}},
