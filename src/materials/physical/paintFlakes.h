@@ -83,11 +83,11 @@ inline float lossOfNarrow(Vec3f w, Vec2f s, float a)
 inline float loss(Vec3f w, Vec2f s, float a)
 {
     constexpr float kNarrow = 0.12f;
+    float const sine = std::sqrt(w.x * w.x + w.y * w.y);
     float sum;
     if (a <= kNarrow) {
         sum = lossOfNarrow(w, s, a);
     } else {
-        float const sine = std::sqrt(w.x * w.x + w.y * w.y);
         Vec2f const along =
             sine > 0.0f ? Vec2f(w.x, w.y) * (0.8f * a / sine) : Vec2f(0.8f * a, 0.0f);
         Vec2f const across(-along.y, along.x);
@@ -96,7 +96,10 @@ inline float loss(Vec3f w, Vec2f s, float a)
             * (lossOfNarrow(w, s + along, part) + lossOfNarrow(w, s - along, part)
                + lossOfNarrow(w, s + across, part) + lossOfNarrow(w, s - across, part));
     }
-    return saturate(sum);
+    // Towards the horizon few slopes along w lose anything: their density, 1 / (sqrt(pi) a) at
+    // most, times the integral over lean of what they lose, which grows with the slope.
+    float const few = (0.1f + 0.7f * (s.x * s.x + s.y * s.y + 0.5f * a * a)) * w.z;
+    return saturate(minOf(sum, few / maxOf(a * sine, 1e-30f)));
 }
 
 /// What grooves of the slopes +-s and Gaussian width a, below a half, send out lower than it came,
