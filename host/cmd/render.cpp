@@ -230,6 +230,8 @@ int render(Arguments const& arguments, std::string const& shaderPath)
             return !interrupted;
         });
         reporter.detail("acceleration structures built");
+        for (std::string const& omission : session.omissions())
+            reporter.warning(scene.file + ": " + omission);
         host::Film film = session.newFilm();
         host::RenderJob job;
         job.window = film.window();

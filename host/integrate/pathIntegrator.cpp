@@ -17,25 +17,31 @@ Vec3f positive(Vec3f v) { return {maxOf(v.x, 0.0f), maxOf(v.y, 0.0f), maxOf(v.z,
 
 } // namespace
 
+/// Everything further on counts by `weight`.
+void PathIntegrator::Path::weigh(Vec3f weight, PathRay& ray)
+{
+    float const before = maxComponent(throughput);
+    throughput *= weight;
+    ray.importance *= maxComponent(throughput) / before;
+}
+
 Vec4f PathIntegrator::radiance(PathRay ray)
 {
     Path path;
-    for (;;) {
-        SurfacePoint surface;
-        Vec4f seen;
-        if (context_.intersect(ray, surface, seen)) {
-            if (context_.scene().materialOf(surface).scatters()) {
-                if (!scatter(ray, surface, path))
-                    return withAlpha(path.light, 1.0f);
-                continue;
-            }
-            if (!context_.shade(ray, surface, seen)) {
-                ShadingContext::passIgnored(ray, surface);
-                continue;
-            }
+    Vec4f seen;
+    SurfacePoint surface;
+    while (context_.intersect(ray, surface, seen)) {
+        if (context_.scene().materialOf(surface).continuesPaths) {
+            if (!scatter(ray, surface, path))
+                return withAlpha(path.light, 1.0f - path.clear);
+        } else if (context_.shade(ray, surface, seen)) {
+            break;
+        } else {
+            ShadingContext::passIgnored(ray, surface);
         }
-        return withAlpha(path.light + path.throughput * rgb(seen), path.straight ? seen.w : 1.0f);
     }
+    return withAlpha(path.light + path.throughput * rgb(seen),
+                     1.0f - path.clear - path.open * (1.0f - seen.w));
 }
 
 Vec3f PathIntegrator::directLight(ShadingContext::Call& call)
@@ -58,8 +64,6 @@ Vec3f PathIntegrator::directLight(ShadingContext::Call& call)
     };
     for (int side = 0; side < count; ++side)
         for (std::size_t i = 0; i < lights.size(); ++i) {
-            if (!material.mixes && std::holds_alternative<SurfaceLight>(lights[i]))
-                continue;
             Arrival picked;
             LightSample light;
             if (!context_.pickLight(i, state.P, sides[side], picked))
@@ -73,72 +77,114 @@ Vec3f PathIntegrator::directLight(ShadingContext::Call& call)
                 : 1.0f;
             sum += value * light.color * light.shadow * (share * kPi);
         }
-    if (material.mixes)
-        sum += context_.fromSky(kRayReflection, sent, [&](Vec3f) {
-            return maxComponent(state.outBrdf) * state.sampleCosine;
-        });
+    sum += context_.fromSky(kRayReflection, sent, [&](Vec3f) {
+        return maxComponent(state.outBrdf) * state.sampleCosine;
+    });
     return context_.finite(sum);
 }
 
 bool PathIntegrator::scatter(PathRay& ray, SurfacePoint const& surface, Path& path)
 {
+    if (context_.scene().materialOf(surface).showsMore && passes(ray, surface, path))
+        return true;
     PathRay next = ray;
     {
         ShadingContext::Call call(context_, ray, surface);
-        PreparedMaterial const& material = call.material;
         path.light += path.throughput * directLight(call);
-
-        ShadeState& state = call.state;
-        std::fill_n(state.allowReflection, 3, std::uint8_t(1));
-        std::fill_n(state.allowTransmission, 3, std::uint8_t(1));
-        state.sampleType = kSampleNone;
-        material.shader->sample(&context_, state);
-        if (state.sampleType == kSampleNone)
+        if (!draw(next, call, path))
             return false;
-        path.throughput *=
-            positive(context_.finite(state.outBrdf * (state.sampleCosine * state.sampleInvPdf)));
-        if (maxComponent(path.throughput) <= 0.0f || !isFinite(state.sampleDirection)
-            || !(dot(state.sampleDirection, state.sampleDirection) > 0.0f))
-            return false;
-
-        next.direction = normalize(state.sampleDirection);
-        next.E = surface.P;
-        next.ignored = 0;
-        next.origin = context_.rayStart(surface.P, next.direction);
-        // Straight on, as if nothing were there; a medium's boundary bends even what it hardly
-        // bends.
-        if (state.sampleDirection == ray.direction && !material.ior) {
-            next.passes += 1;
-            next.skyDensity = std::numeric_limits<float>::infinity();
-            next.type = ray.type == kRayCamera ? std::uint32_t(kRayTransmission) : ray.type;
-        } else {
-            next.depth += 1;
-            next.type = kRayReflection;
-            next.scatteredAt = surface.P;
-            // Lights have been asked for where `transfer` tells what `sample` draws.
-            bool const shares = material.mixes && state.sampleType == kSampleMixture
-                && (context_.scene().lights().hasSurfaces()
-                    || !context_.scene().sky(kRayReflection).isEmpty());
-            next.lobeDensity = next.skyDensity = shares ? context_.lobeDensity(next.direction)
-                                                        : std::numeric_limits<float>::infinity();
-            path.straight = false;
-        }
-        ShadingContext::changeMedia(next, ray.direction, surface,
-                                    material.ior ? &state.beyondIor : nullptr);
     }
     ray = next;
     return survives(ray, path);
 }
 
-bool PathIntegrator::survives(PathRay const& ray, Path& path)
+bool PathIntegrator::passes(PathRay& ray, SurfacePoint const& surface, Path& path)
 {
-    float const kept = maxComponent(path.throughput);
-    if (ray.depth < kRouletteDepth || kept >= 1.0f)
+    ShadingContext::Beside beside;
+    if (!context_.shadeBeside(ray, surface, beside)) {
+        ShadingContext::passIgnored(ray, surface);
         return true;
-    float const chance = maxOf(kept, 0.05f);
+    }
+    path.light += path.throughput * beside.color;
+    float const through = maxComponent(path.throughput * beside.behind);
+    if (through <= 0.0f)
+        return false;
+    PathRay straight = ray;
+    ShadingContext::passStraight(straight, surface);
+    Vec3f const own = Vec3f(1, 1, 1) - beside.behind;
+    float const kept = maxComponent(path.throughput * own);
+    float const chance = through / (through + kept);
+    if (kept > 0.0f && path.open > 0.0f) {
+        // Both are followed where the edge of the one before the other is seen.
+        straight.importance *= through / maxComponent(path.throughput);
+        Vec4f const seen = radiance(straight);
+        path.light += path.throughput * beside.behind * rgb(seen);
+        path.clear += path.open * beside.clear * (1.0f - seen.w);
+        path.open = 0.0f;
+    } else if (!(kept > 0.0f) || context_.sampler().next() < chance) {
+        path.open *= beside.clear;
+        path.weigh(beside.behind / chance, straight);
+        ray = straight;
+        return true;
+    } else {
+        path.weigh(own / (1.0f - chance), ray);
+        return false;
+    }
+    path.weigh(own, ray);
+    return false;
+}
+
+bool PathIntegrator::draw(PathRay& ray, ShadingContext::Call& call, Path& path)
+{
+    ShadeState& state = call.state;
+    PreparedMaterial const& material = call.material;
+    std::fill_n(state.allowReflection, 3, std::uint8_t(1));
+    std::fill_n(state.allowTransmission, 3, std::uint8_t(1));
+    state.sampleType = kSampleNone;
+    material.shader->sample(&context_, state);
+    if (state.sampleType == kSampleNone)
+        return false;
+    Vec3f const weight =
+        positive(context_.finite(state.outBrdf * (state.sampleCosine * state.sampleInvPdf)));
+    if (maxComponent(path.throughput * weight) <= 0.0f || !isFinite(state.sampleDirection)
+        || !(dot(state.sampleDirection, state.sampleDirection) > 0.0f))
+        return false;
+    path.weigh(weight, ray);
+
+    if (state.sampleType == kSampleStraight && state.sampleDirection == state.I) {
+        path.open *= (weight.x + weight.y + weight.z) / 3.0f;
+        ShadingContext::passStraight(ray, call.surface);
+        return true;
+    }
+    Vec3f const arrived = ray.direction;
+    ray.direction = normalize(state.sampleDirection);
+    ray.E = call.surface.P;
+    ray.ignored = 0;
+    ray.origin = context_.rayStart(call.surface.P, ray.direction);
+    ray.depth += 1;
+    ray.type = kRayReflection;
+    ray.scatteredAt = call.surface.P;
+    // Lights have been asked for where `transfer` tells what `sample` draws.
+    bool const shares = state.sampleType == kSampleMixture
+        && (context_.scene().lights().hasSurfaces()
+            || !context_.scene().sky(kRayReflection).isEmpty());
+    ray.lobeDensity = ray.skyDensity =
+        shares ? context_.lobeDensity(ray.direction) : std::numeric_limits<float>::infinity();
+    path.open = 0.0f;
+    ShadingContext::changeMedia(ray, arrived, call.surface,
+                                material.ior ? &state.beyondIor : nullptr);
+    return true;
+}
+
+bool PathIntegrator::survives(PathRay& ray, Path& path)
+{
+    if (ray.depth < kRouletteDepth || ray.importance >= 1.0f)
+        return true;
+    float const chance = maxOf(ray.importance, 0.05f);
     if (!(context_.sampler().next() < chance))
         return false;
     path.throughput = path.throughput / chance;
+    ray.importance /= chance;
     return true;
 }
 

@@ -6,7 +6,8 @@
 
 namespace zsi::host {
 
-/// Materials with both entry points are continued as paths; others are shaded and end them.
+/// Materials whose samples are drawn from what `transfer` tells are continued as paths, with what
+/// `shade` shows beside that; others are shaded and end them.
 class PathIntegrator final : public Integrator {
 public:
     using Integrator::Integrator;
@@ -17,12 +18,21 @@ private:
     struct Path {
         Vec3f light{0, 0, 0};
         Vec3f throughput{1, 1, 1};
-        bool straight = true; ///< still on the line of the ray that it began as
+        /// What is left of the line of the ray that it began as: how clear all before it is. 0 once
+        /// the path has turned.
+        float open = 1.0f;
+        float clear = 0.0f; ///< how clear all along branches of that line is
+
+        void weigh(Vec3f weight, PathRay& ray);
     };
     /// Adds the light at the surface and turns the ray; false when the path ends here.
     bool scatter(PathRay& ray, SurfacePoint const& surface, Path& path);
+    /// Adds what `shade` shows beside; true when the ray goes straight on.
+    bool passes(PathRay& ray, SurfacePoint const& surface, Path& path);
+    /// Draws the ray on from the surface; false when there is none.
+    bool draw(PathRay& ray, ShadingContext::Call& call, Path& path);
     Vec3f directLight(ShadingContext::Call& call);
-    bool survives(PathRay const& ray, Path& path);
+    bool survives(PathRay& ray, Path& path);
 };
 
 } // namespace zsi::host

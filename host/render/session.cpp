@@ -173,6 +173,12 @@ Session::Session(Scene const& scene, BuildProgress const& progress)
 {
 }
 
+std::vector<std::string> Session::omissions()
+{
+    prepared_.examineMaterials();
+    return host::omissions(scene().settings.integrator, prepared_);
+}
+
 Film Session::newFilm() const
 {
     FilmSettings const& film = scene().film;
@@ -185,7 +191,7 @@ Film Session::newFilm() const
 RenderReport Session::render(Film& film, RenderJob const& job)
 {
     auto const begin = std::chrono::steady_clock::now();
-    prepared_.findLobes();
+    prepared_.examineMaterials();
     Rendering rendering(prepared_, film, job);
     onThreads(job.threads, [&] { rendering.work(); });
     RenderReport report = rendering.report();

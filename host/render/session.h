@@ -64,6 +64,9 @@ public:
     }
     void meshesChanged(BuildProgress const& progress = {}) { prepared_.meshesChanged(progress); }
 
+    /// What the scene's integrator does not show of its materials, a line for each of them. Throws
+    /// InputError for an unknown integrator.
+    std::vector<std::string> omissions();
     /// An empty film with the scene's layers over its crop. Throws InputError for an unknown layer.
     Film newFilm() const;
     /// Adds the samples of the job to `film`, one of `newFilm` or of another session of the same

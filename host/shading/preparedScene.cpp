@@ -4,6 +4,7 @@
 #include "sampling/directions.h"
 #include "shading/lobeProbe.h"
 #include "shading/shadingContext.h"
+#include "texture/textureProbe.h"
 
 #include <cstring>
 #include <string_view>
@@ -82,26 +83,39 @@ PreparedScene::PreparedScene(Scene const& scene, BuildProgress const& progress)
     environmentChanged();
 }
 
-void PreparedScene::findLobes()
+void PreparedScene::examineMaterials()
 {
-    constexpr std::uint32_t kDraws = 64;
+    constexpr std::uint32_t kCalls = 64;
     Inquiry inquiry(*this);
     skiesAgree_ = true;
-    for (std::uint32_t i = 0; i < kDraws && environment() && skiesAgree_; ++i) {
+    for (std::uint32_t i = 0; i < kCalls && environment() && skiesAgree_; ++i) {
         inquiry.sampler.start(i);
         Vec2f const u = inquiry.sampler.next2D();
         Vec3f const d = around({0, 0, 1}, 2.0f * u.x - 1.0f, u.y);
         skiesAgree_ = inquiry.context.sky(kRayReflection, d) == inquiry.context.sky(kRayDiffuse, d);
     }
     for (PreparedMaterial& material : materials_) {
-        material.mixes = false;
-        material.ofGathered = material.ofOthers = {};
-        for (std::uint32_t i = 0; i < kDraws && material.scatters() && !material.mixes; ++i) {
-            inquiry.sampler.start(i);
-            ShadeState state = inquiry.context.trialRecord(material, kRayCamera);
-            material.shader->sample(&inquiry.context, state);
-            material.mixes = state.sampleType == kSampleMixture;
+        if (!material.scatters())
+            continue;
+        ShadingContext::Findings findings;
+        {
+            TextureProbe const noPictures;
+            for (std::uint32_t i = 0; i < kCalls; ++i) {
+                inquiry.sampler.start(i);
+                inquiry.context.examine(material, findings);
+            }
         }
+        using Asked = ShadingContext::Asked;
+        material.mixes = findings.mixes;
+        material.continuesPaths =
+            findings.mixes && !(findings.emits && !(findings.asked & Asked::kIndirect));
+        material.transmits = findings.transmits;
+        material.occludesLights = findings.asked & Asked::kOcclusion;
+        bool const hasAmbient = !(scene_.settings.ambient == Vec3f(0, 0, 0));
+        material.showsMore = findings.emits || ((findings.asked & Asked::kAmbient) && hasAmbient)
+            || (!findings.transmits && (findings.asked & (Asked::kStraight | Asked::kBeyond)));
+
+        material.ofGathered = material.ofOthers = {};
         if (!material.mixes || !environment())
             continue;
         std::uint32_t draw = 0;

@@ -30,13 +30,25 @@ struct PreparedMaterial {
     /// that bounds none.
     float const* ior;
     std::vector<Slot> attributes;
-    /// Whether its samples are drawn from the lobes that `transfer` tells, so that both may share
-    /// lights between them: some of its draws say so (kSampleMixture).
+
+    // What calls of its entry points have shown (PreparedScene::examineMaterials).
+
+    /// Its samples are drawn from the lobes that `transfer` tells, so that both may share lights
+    /// between them: some of its draws say so (kSampleMixture).
     bool mixes = false;
     /// Of `shade`, where it mixes: asked by gathered rays, and by others.
     SharedLobes ofGathered, ofOthers;
+    /// Paths go on by its samples: it mixes, and `shade` does not take its surroundings from
+    /// pictures of its own, which samples would count again.
+    bool continuesPaths = false;
+    /// Its samples go through the surface too: what lies behind is theirs, not `shade`'s alone.
+    bool transmits = false;
+    /// `shade` shows more than `sample` and `transfer` stand for (ShadingContext::shadeBeside).
+    bool showsMore = false;
+    /// `shade` darkens the light of lights by occlusion.
+    bool occludesLights = false;
 
-    /// Whether paths can go on by `sample` with light taken by `transfer`.
+    /// Whether it tells of its scattering at all.
     bool scatters() const { return (entryPoints & kSample) && (entryPoints & kTransfer); }
 };
 
@@ -61,8 +73,8 @@ public:
     /// Meshes are others. Renews all that stands on them.
     void meshesChanged(BuildProgress const& progress = {});
 
-    /// What the lobes of materials are by the values that their parameters have now.
-    void findLobes();
+    /// Finds out what materials do by the values that their parameters have now.
+    void examineMaterials();
 
     Scene const& scene() const { return scene_; }
     RayScene const& rays() const { return rays_; }
@@ -76,6 +88,7 @@ public:
     /// Whether the material's `shade`, for a ray of the type, may have the sky in its list of
     /// lights.
     bool listsSky(PreparedMaterial const& material, std::uint32_t rayType) const;
+    std::vector<PreparedMaterial> const& materials() const { return materials_; }
     PreparedMaterial const& materialOf(SurfacePoint const& s) const
     {
         return materials_[static_cast<std::size_t>(scene_.instances[s.instance].material)];

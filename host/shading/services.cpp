@@ -31,7 +31,7 @@ bool unit(Vec3f& v)
 
 LightSample* ShadingContext::getLightSamples(int, Vec3f const* P, Vec3f const* normal)
 {
-    if (!call_)
+    if (!call_ || !tellsOf(*normal))
         return nullptr;
     call_->askedLights_ = true;
     LightSample* head = nullptr;
@@ -58,6 +58,25 @@ LightSample* ShadingContext::getLightSamples(int, Vec3f const* P, Vec3f const* n
         end = &kept.next;
     }
     return head;
+}
+
+bool ShadingContext::tellsOf(Vec3f normal)
+{
+    if (call_->answers_ == Answers::All)
+        return true;
+    Vec3f const Ng = call_->surface.Ng;
+    bool const isFar = dot(normal, Ng) * dot(call_->ray.direction, Ng) > 0.0f;
+    return isFar && tellsBeyond();
+}
+
+bool ShadingContext::tellsBeyond()
+{
+    if (call_->answers_ == Answers::All)
+        return true;
+    call_->asked_ |= kBeyond;
+    bool const tells = call_->answers_ == Answers::Beside && !call_->material.transmits;
+    call_->heard_ = call_->heard_ || tells;
+    return tells;
 }
 
 bool ShadingContext::pickLight(std::size_t light, Vec3f P, Vec3f normal, Arrival& picked)
@@ -129,8 +148,13 @@ bool ShadingContext::askSky(Vec3f normal, LightSample& sample)
 
 Vec3f ShadingContext::ambientLight(Vec3f const* P, Vec3f const* N)
 {
-    if (call_)
-        call_->gathered_ = {true, *P, *N, settings_.ambient, {0, 0, 0}};
+    if (!call_)
+        return settings_.ambient;
+    call_->asked_ |= kAmbient;
+    if (call_->isSilent())
+        return {0, 0, 0};
+    call_->gathered_ = {true, *P, *N, settings_.ambient, {0, 0, 0}};
+    call_->heard_ = call_->heard_ || !(settings_.ambient == Vec3f(0, 0, 0));
     return settings_.ambient;
 }
 
@@ -244,6 +268,8 @@ bool ShadingContext::continuation(Vec3f const* origin, Vec3f const* direction, f
 Vec3f ShadingContext::traceContinue(int rayType, Vec3f const* origin, Vec3f const* direction,
                                     float importance)
 {
+    if (call_ && call_->answers_ != Answers::All)
+        return rgb(traceThrough(origin, direction, importance));
     PathRay ray;
     if (!continuation(origin, direction, importance, ray))
         return {0, 0, 0};
@@ -253,6 +279,10 @@ Vec3f ShadingContext::traceContinue(int rayType, Vec3f const* origin, Vec3f cons
 
 Vec4f ShadingContext::traceThrough(Vec3f const* P, Vec3f const* I, float importance)
 {
+    if (call_ && call_->answers_ != Answers::All) {
+        call_->asked_ |= kStraight;
+        return call_->answers_ == Answers::Behind ? Vec4f(1, 1, 1, 0) : Vec4f(0, 0, 0, 1);
+    }
     PathRay ray;
     if (!continuation(P, I, importance, ray))
         return {0, 0, 0, 0};
@@ -263,18 +293,22 @@ Vec4f ShadingContext::traceThrough(Vec3f const* P, Vec3f const* I, float importa
 
 Vec3f ShadingContext::traceReflection(Vec3f const* origin, Vec3f const* direction, float importance)
 {
-    return traceLobe(origin, direction, 0.0f, 2.0f, importance);
+    return traceSpecular(origin, direction, 0.0f, importance);
 }
 
 Vec3f ShadingContext::traceSpecular(Vec3f const* origin, Vec3f const* direction, float spread,
                                     float importance)
 {
+    if (call_ && call_->answers_ != Answers::All)
+        return {0, 0, 0};
     return traceLobe(origin, direction, spread, 2.0f, importance);
 }
 
 Vec3f ShadingContext::traceRefraction(Vec3f const* origin, Vec3f const* direction, float spread,
                                       float importance)
 {
+    if (call_ && !tellsBeyond())
+        return {0, 0, 0};
     // A refracted ray turns by |1 - 1/n| to |n - 1| of the facet's tilt: about a half for glass.
     return traceLobe(origin, direction, spread, 0.5f, importance);
 }
@@ -342,10 +376,15 @@ Vec3f ShadingContext::occlusion(Vec3f const* P, Vec3f const* N, float)
     // Traced light has been stopped by all that stands in its way already: where a material asks
     // for the occlusion of ambient and indirect light together, only the ambient part is occluded.
     Call::Gathered& gathered = call_->gathered_;
-    bool const ofGathered = gathered.pending && gathered.P == *P && gathered.N == *N;
+    bool const ofGathered = gathered.pending && gathered.P == *P && gathered.N == *N
+        && !(gathered.ambient + gathered.indirect == Vec3f(0, 0, 0));
     if (ofGathered) {
         gathered.pending = false;
         if (gathered.ambient == Vec3f(0, 0, 0))
+            return {1, 1, 1};
+    } else if (call_->answers_ != Answers::All) {
+        call_->asked_ |= kOcclusion;
+        if (call_->isSilent() || !call_->heard_) // there is nothing to be darkened
             return {1, 1, 1};
     }
     float const tMax = settings_.occlusionDistance > 0.0f ? settings_.occlusionDistance
@@ -375,6 +414,9 @@ Vec3f ShadingContext::indirectDiffuse(Vec3f const* P, Vec3f const* N, float impo
     Vec3f axis = *N;
     if (!call_ || !unit(axis))
         return {0, 0, 0};
+    call_->asked_ |= kIndirect;
+    if (!tellsOf(*N))
+        return {0, 0, 0};
     int const count = call_->ray.depth == 0 ? std::max(1, settings_.indirectSamples) : 1;
     Vec3f const side = gatherNormal(*P, axis);
     Sampler::Points const points = sampler_->next2D(count);
@@ -392,7 +434,9 @@ Vec3f ShadingContext::indirectDiffuse(Vec3f const* P, Vec3f const* N, float impo
         if (!child(P, &direction, importance, ray, scale))
             continue;
         ray.type = kRayDiffuse;
-        leaveToLightList(ray);
+        // Where `transfer` gives nothing, as through a leaf, the list stood for all of the lights.
+        if (std::isinf(ray.lobeDensity) && call_->askedLights_)
+            ray.lobeDensity = 0.0f;
         ray.origin = shadowStart(*P, direction);
         if (*P == call_->surface.P)
             sum += gather(ray, density) * scale;

@@ -18,17 +18,28 @@ bool isFront(Vec3f I, Vec3f Ng) { return dot(I, Ng) <= 0.0f; }
 } // namespace
 
 ShadingContext::Call::Call(ShadingContext& context, PathRay const& ray_,
-                           SurfacePoint const& surface_)
+                           SurfacePoint const& surface_, PreparedMaterial const& material_)
     : ray(ray_)
     , surface(surface_)
-    , material(context.scene_.materialOf(surface_))
+    , material(material_)
     , state(context.record(ray_))
     , context_(context)
     , outer_(context.call_)
     , lightMark_(context.lightRecords_.mark())
 {
-    context.fillSurface(ray, surface, material, state);
+    state.P = surface.P;
+    state.N = surface.N;
+    state.Ng = surface.Ng;
+    state.Pref = surface.objectP;
+    state.Nref = surface.objectN;
     context.call_ = this;
+}
+
+ShadingContext::Call::Call(ShadingContext& context, PathRay const& ray_,
+                           SurfacePoint const& surface_)
+    : Call(context, ray_, surface_, context.scene_.materialOf(surface_))
+{
+    context.fillSurface(ray, surface, material, state);
     if (ray.type == kRayCamera && !context.hasFirstHit_) {
         context.firstHit_ = {surface, length(surface.P - ray.E)};
         context.hasFirstHit_ = true;
@@ -163,6 +174,40 @@ ShadeState ShadingContext::trialRecord(PreparedMaterial const& material, std::ui
     return state;
 }
 
+void ShadingContext::examine(PreparedMaterial const& material, Findings& findings)
+{
+    ShadeState const trial = trialRecord(material, kRayCamera);
+    SurfacePoint s{};
+    s.N = s.Ng = s.objectN = trial.N;
+    // Near and far: projected maps have a depth.
+    float const reach = std::exp2(12.0f * sampler_->next() - 4.0f);
+    s.P = s.smoothP = s.objectP = Vec3f(trial.P.x, trial.P.y, sampler_->next()) * reach;
+    PathRay ray;
+    ray.direction = sampler_->next() < 0.5f ? trial.I : -trial.I;
+    ray.E = s.P - ray.direction;
+
+    Call call(*this, ray, s, material);
+    ShadeState& state = call.state;
+    std::memcpy(state.attributes, trial.attributes, sizeof state.attributes);
+
+    call.answers_ = Answers::None;
+    material.shader->shade(this, state);
+    Vec3f const shown = rgb(state.Ci);
+    findings.emits = findings.emits || !(shown == Vec3f(0, 0, 0));
+    findings.asked |= call.asked_ | (state.discardHit ? kStraight : 0u);
+
+    std::fill_n(state.allowTransmission, 3, std::uint8_t(1));
+    state.sampleType = kSampleNone;
+    material.shader->sample(this, state);
+    findings.transmits = findings.transmits
+        || (state.sampleType != kSampleNone
+            && dot(state.sampleDirection, s.Ng) * dot(ray.direction, s.Ng) > 0.0f);
+    std::fill_n(state.allowReflection, 3, std::uint8_t(1));
+    state.sampleType = kSampleNone;
+    material.shader->sample(this, state);
+    findings.mixes = findings.mixes || state.sampleType == kSampleMixture;
+}
+
 bool ShadingContext::shade(PathRay const& ray, SurfacePoint const& surface, Vec4f& result)
 {
     bool const hadFirstHit = hasFirstHit_;
@@ -188,6 +233,44 @@ void ShadingContext::passIgnored(PathRay& ray, SurfacePoint const& surface)
     ++ray.ignored;
 }
 
+void ShadingContext::passStraight(PathRay& ray, SurfacePoint const& surface)
+{
+    passIgnored(ray, surface);
+    ray.ignored = 0;
+    ray.E = surface.P;
+    ray.passes += 1;
+    if (ray.type == kRayCamera)
+        ray.type = kRayTransmission;
+}
+
+bool ShadingContext::shadeBeside(PathRay const& ray, SurfacePoint const& surface, Beside& result)
+{
+    bool const hadFirstHit = hasFirstHit_;
+    Call call(*this, ray, surface);
+    auto const shown = [&](Answers answers) {
+        call.answers_ = answers;
+        call.state.Ci = {0, 0, 0, 1};
+        call.material.shader->shade(this, call.state);
+        return call.state.Ci;
+    };
+    Vec3f const color = rgb(shown(Answers::Beside));
+    if (call.state.discardHit) {
+        hasFirstHit_ = hadFirstHit;
+        return false;
+    }
+    result.color = finite(color);
+    if (!(call.asked_ & kStraight) || call.material.transmits)
+        return true;
+    // What it shows is linear in what it is told.
+    Vec4f const white = shown(Answers::Behind);
+    Vec3f const own = call.heard_ ? rgb(shown(Answers::None)) : color;
+    Vec3f const behind = finite(rgb(white) - own);
+    result.behind = {clamp(behind.x, 0.0f, 1.0f), clamp(behind.y, 0.0f, 1.0f),
+                     clamp(behind.z, 0.0f, 1.0f)};
+    result.clear = clamp(1.0f - white.w, 0.0f, 1.0f);
+    return true;
+}
+
 ShadeState ShadingContext::record(PathRay const& ray) const
 {
     ShadeState state{};
@@ -207,11 +290,6 @@ ShadeState ShadingContext::record(PathRay const& ray) const
 void ShadingContext::fillSurface(PathRay const& ray, SurfacePoint const& s,
                                  PreparedMaterial const& material, ShadeState& state) const
 {
-    state.P = s.P;
-    state.N = s.N;
-    state.Ng = s.Ng;
-    state.Pref = s.objectP;
-    state.Nref = s.objectN;
     state.objectToWorld = scene_.scene().instances[s.instance].objectToWorld;
     if (!isFront(ray.direction, s.Ng))
         state.beyondIor = ray.media.without(s.instance);

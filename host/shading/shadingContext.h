@@ -47,8 +47,36 @@ public:
     bool shade(PathRay const& ray, SurfacePoint const& surface, Vec4f& result);
     /// The same ray goes on behind the surface as if nothing had been there.
     static void passIgnored(PathRay& ray, SurfacePoint const& surface);
+    /// The ray goes on straight through the surface, as `traceThrough` sends one.
+    static void passStraight(PathRay& ray, SurfacePoint const& surface);
+
+    /// What `shade` shows of a hit beside what `transfer` and `sample` stand for.
+    struct Beside {
+        Vec3f color{0, 0, 0}; ///< emitted, ambient, lit or shining through from the far side
+        Vec3f behind{0, 0, 0}; ///< how much is seen of what lies straight behind
+        float clear = 0.0f; ///< how much of the alpha is that of what lies there
+    };
+    /// Of a material that `showsMore`; false when it discards the hit.
+    bool shadeBeside(PathRay const& ray, SurfacePoint const& surface, Beside& result);
+
     /// `v`, or black when it is not finite, which is counted.
     Vec3f finite(Vec3f v);
+
+    /// What services tell a running call.
+    enum class Answers {
+        All,
+        Beside, ///< light from the far side, ambient light, and what `sample` does not trace
+        Behind, ///< that white and clear lies straight behind the surface
+        None, ///< neutral values
+    };
+    /// What a call has asked for.
+    enum Asked : unsigned {
+        kStraight = 1, ///< what lies straight behind
+        kBeyond = 2, ///< what is bent through, or lights the far side
+        kAmbient = 4,
+        kIndirect = 8, ///< light of the surroundings, diffuse
+        kOcclusion = 16, ///< of other light than what it has gathered
+    };
 
     /// A running call of a material's entry point. Light lists made for it are released with it.
     class Call {
@@ -66,6 +94,10 @@ public:
     private:
         friend class ShadingContext;
 
+        /// At a place of its own: neither transform nor attributes.
+        Call(ShadingContext& context, PathRay const& ray, SurfacePoint const& surface,
+             PreparedMaterial const& material);
+
         /// What the last queries for ambient and indirect light brought.
         struct Gathered {
             bool pending = false; ///< until the occlusion of that light is asked for
@@ -73,6 +105,11 @@ public:
         };
 
         ShadingContext& context_;
+        bool isSilent() const { return answers_ >= Answers::Behind; }
+
+        Answers answers_ = Answers::All;
+        unsigned asked_ = 0; ///< of Asked, while not all is answered
+        bool heard_ = false; ///< some of it may have been more than a neutral value
         Gathered gathered_;
         bool askedLights_ = false;
         bool askedSky_ = false; ///< as one of the lights
@@ -94,6 +131,13 @@ public:
     /// To try a material with: a place, and a ray of the type that meets it from above, drawn from
     /// the sampler; all six switches of `sample` are set.
     ShadeState trialRecord(PreparedMaterial const& material, std::uint32_t rayType);
+    /// What a material's entry points turn out to do.
+    struct Findings {
+        bool mixes = false, transmits = false, emits = false;
+        unsigned asked = 0; ///< of Asked
+    };
+    /// Calls the material's entry points at a place of its own choice; adds to `findings`.
+    void examine(PreparedMaterial const& material, Findings& findings);
     /// The point of light `light` that is to light `P`: its place, direction and, where rays meet
     /// the light, density are told. False where it is behind `normal` or brings nothing for sure.
     bool pickLight(std::size_t light, Vec3f P, Vec3f normal, Arrival& picked);
@@ -134,6 +178,10 @@ public:
     Vec3f cellNoise3D(Vec3f const* p) override;
 
 private:
+    /// Whether the running call is told of light that arrives from the side of `normal`.
+    bool tellsOf(Vec3f normal);
+    /// Whether it is told what is bent through the surface or lights its far side.
+    bool tellsBeyond();
     /// Colour and alpha of the environment along the ray.
     Vec4f environment(PathRay const& ray);
     /// What a ray sees of the surface light that it met.

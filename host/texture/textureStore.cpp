@@ -3,6 +3,7 @@
 
 #include "texture/latLong.h"
 #include "texture/textureFootprint.h"
+#include "texture/textureProbe.h"
 
 #include <cmath>
 #include <map>
@@ -23,7 +24,9 @@ public:
 
     void lookup(Vec4f* result, Vec2f const* uv) const override
     {
-        if (std::isfinite(uv->x) && std::isfinite(uv->y))
+        if (TextureProbe* const probe = TextureProbe::current()) [[unlikely]]
+            *result = probe->texel();
+        else if (std::isfinite(uv->x) && std::isfinite(uv->y))
             *result =
                 picture_.filtered(TextureFootprint::width(), fract(uv->x), 1.0f - fract(uv->y));
     }

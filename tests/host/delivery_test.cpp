@@ -277,7 +277,7 @@ TEST(Delivery, PathsKnowTheirMediaAndLightFromBehind)
         p->onShade = p->onTransfer = [](IShaderAPI*, ShadeState&) {};
         p->onSample = [&](IShaderAPI*, ShadeState& s) {
             seen.push_back({s.incomingIor, s.beyondIor});
-            s.sampleType = kSampleSmooth;
+            s.sampleType = kSampleMixture;
             s.sampleDirection = s.I;
             s.outBrdf = kWhite;
             s.sampleCosine = s.sampleInvPdf = 1;
@@ -310,7 +310,7 @@ TEST(Delivery, PathsKnowTheirMediaAndLightFromBehind)
                 s.outBrdf = grey(0.5f / 3.14159265f);
                 s.sampleCosine = std::fabs(s.sampleDirection.z);
             };
-            p->onSample = [](IShaderAPI*, ShadeState& s) { s.sampleType = kSampleNone; };
+            p->onSample = [](IShaderAPI*, ShadeState& s) { s.sampleType = kSampleMixture; };
             Stage sheet;
             sheet.scene.settings.integrator = "path";
             sheet.lamp({0, 0, side});
