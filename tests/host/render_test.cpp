@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Small pictures with known answers.
 #include "support/hostScene.h"
+#include "support/record.h"
 
 #include <array>
 #include <gtest/gtest.h>
@@ -13,10 +14,7 @@ constexpr char const* kIntegrators[] = {"shade", "path"};
 
 void expectNear(Vec4f got, Vec4f want, float tolerance, std::string const& why)
 {
-    EXPECT_NEAR(got.x, want.x, tolerance) << why;
-    EXPECT_NEAR(got.y, want.y, tolerance) << why;
-    EXPECT_NEAR(got.z, want.z, tolerance) << why;
-    EXPECT_NEAR(got.w, want.w, tolerance) << why;
+    EXPECT_TRUE(near(got, want, double(tolerance))) << why;
 }
 
 TEST(Render, AWhiteDiffuseSurfaceShowsTheLightThatArrives)

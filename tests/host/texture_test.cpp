@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Textures against what their files hold, computed here.
 #include "support/inputError.h"
+#include "support/record.h"
 #include "support/temporaryFolder.h"
 #include "texture/textureFootprint.h"
 #include "texture/textureStore.h"
@@ -205,10 +206,7 @@ TEST(Texture, ChannelsAndWindowsOfFloatFiles)
         for (int const i : {0, 1}) {
             auto const at = static_cast<float>(i) + 0.5f;
             Vec4f const seen = lookup(texture, Vec2f(at / size.x, 1 - at / size.y));
-            EXPECT_NEAR(seen.x, c.want[i].x, 1e-5f) << i;
-            EXPECT_NEAR(seen.y, c.want[i].y, 1e-5f) << i;
-            EXPECT_NEAR(seen.z, c.want[i].z, 1e-5f) << i;
-            EXPECT_NEAR(seen.w, c.want[i].w, 1e-5f) << i;
+            EXPECT_TRUE(test::near(seen, c.want[i], 1e-5)) << i;
         }
     }
 }
@@ -345,6 +343,11 @@ TEST(TextureCube, BlursKeepTheLightAndTheDirections)
         EXPECT_NEAR(lookup(blurred, d).x, want, i == 8 ? 0.01f : 1e-4f) << i;
         EXPECT_NEAR(lookup(sharp, d).x, want, i == 8 ? 0.01f : 1e-4f) << i;
     }
+    // A blur of 30 degrees leaves half of the light on the horizon, and reaches 15 degrees up.
+    auto const* const wide = store.loadCube(folder.path / "a.ppm", ColorSpace::Auto, 0.5235988f);
+    EXPECT_NEAR(lookup(wide, Vec3f(1, 0, 0)).x, 0.5f, 0.02f);
+    EXPECT_NEAR(lookup(wide, Vec3f(1, 0.26f, 0)).x, 0.8f, 0.18f);
+    EXPECT_NEAR(lookup(wide, Vec3f(1, 0.84f, 0)).x, 1, 0.02f);
     // The middle column lies towards -z, +x to the right of it.
     Values const spot(64, 32, 8, [](int i) {
         int const x = i / 3 % 64, y = i / 3 / 64;

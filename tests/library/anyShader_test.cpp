@@ -259,9 +259,9 @@ void changeParameter(test::Registered const& row)
 /// tells, with everything else at random.
 bool matters(std::string const& className, std::size_t row, unsigned tries)
 {
+    auto const one = library().create(className), two = library().create(className);
+    test::RecordingManager const registered(*one), changed(*two);
     for (unsigned seed = 0; seed < tries; ++seed) {
-        auto const one = library().create(className), two = library().create(className);
-        test::RecordingManager const registered(*one), changed(*two);
         test::Supply supply(seed, false);
         test::fillParameters(registered, supply, false);
         setUpNode(registered.rows[row].name, registered);

@@ -9,58 +9,13 @@
 namespace zsi::test {
 namespace {
 
-/// Class, name, and what does not hold: "unlit", `shade` adds lights by another sum; "oneWay", not
-/// reciprocal; "glossy", only what mirrors is asked for, and `transfer` has more; "clear", light
-/// also goes through, with no density; "leaning", the lobe leaves a part of the sky out; "gathers",
-/// the host's indirect light is another sum than that of paths. Then
-/// settings; about the widths of the lobe for the quadrature; least and most of all light that goes
-/// on; distance of the viewer, far if not given.
-constexpr char const* kTable = R"(
-corvid_Mtl_Metal narrow        | reflectColor=1,1,1 roughValue=.03                      | .03 .03 .98 1
-corvid_Mtl_Metal wide          | reflectColor=1,1,1 roughValue=.9                       | .9 .9 .98 1
-corvid_Mtl_Metal brushed       | reflectColor=1,1,1 roughValue=.4 anisotropyValue=.25   | .4 .1 .96 1
-corvid_Mtl_Metal brushedAcross | reflectColor=1,1,1 roughValue=.1 anisotropyValue=5     | .1 .5 .96 1
-corvid_Mtl_Metal turned        | reflectColor=1,1,1 roughValue=.6 anisotropyValue=.1 anisoRotationValue=1.5707963 | .06 .6 .95 1
-corvid_Mtl_Metal gold          | reflectColor=1,.7,.3 edgeColor=1,.9,.5 roughValue=.25  | .25 .25 .6 .9
-corvid_Mtl_Metal bent leaning oneWay | reflectColor=1,1,1 roughValue=.5 N=.6,0,.8    | .5 .5 .3 1
-corvid_Mtl_Metal holed clear   | reflectColor=1,1,1 cutoutMapEnable=1 cutoutMap=.25,0,0,1 cutoutAmount=2 | .2 .2 .98 1
-corvid_Mtl_MetallicPaint smooth | baseColor=1,1,1 flakeDensity=0 baseRoughValue=0 coatRoughValue=.1 | .3 .3 .97 1
-corvid_Mtl_MetallicPaint rough | baseColor=1,1,1 flakeDensity=0 baseRoughValue=1 coatRoughValue=.3 | .3 .3 .97 1
-corvid_Mtl_MetallicPaint crowd  | baseColor=1,1,1 flakeColor=1,1,1 pearlColor=.1,1,.2,.5 flakeDensity=.8 flakeSpread=.3 flakeRoughValue=.2 coatRoughValue=.15 | .2 .2 .98 1
-corvid_Mtl_MetallicPaint oneFlake oneWay | baseColor=.6,.2,.1 flakeSpread=.3 flakeRoughValue=.15 coatReflectivity=.3 coatRoughValue=.1 | .25 .25 .1 1 1
-corvid_Mtl_MetallicPaint fiveFlakes oneWay | baseColor=1,1,1 flakeColor=1,1,1 flakeSpread=.3 coatRoughValue=.2 finish=1 finishPeelamount=.2 | .25 .25 .6 1 20
-corvid_Mtl_MetallicPaint mirrors glossy unlit | flakeSpread=.3 flakeRoughValue=.15 coatReflectivity=.3 coatRoughValue=.1 | .2 .2 .2 1
-corvid_Mtl_Ward narrow unlit    | diffuseColor=.5,.5,.5 roughValue=.1                     | .1 .1 .1 1
-corvid_Mtl_Ward brushed unlit   | diffuseColor=.2,.5,.3 roughValue=.3 anisotropyValue=2.5 | .3 .3 .2 1
-corvid_Mtl_Ward diffuse         | diffuseColor=1,1,1 brdf00Reflectivity=0 brdf90Reflectivity=0 | .5 .5 .99 1
-corvid_Mtl_Ward_120b7820 plain unlit | roughValue=.25 | .25 .25 .01 1
-corvid_Mtl_Ward_33632204 plain unlit | roughValue=.25 | .25 .25 .01 1
-corvid_Mtl_Ward_5592d496 plain unlit | roughValue=.25 | .25 .25 .01 1
-corvid_Mtl_Ward_5ba0bfff plain unlit | roughValue=.25 | .25 .25 .01 1
-corvid_Mtl_Ward_82261344 plain unlit | roughValue=.25 | .25 .25 .01 1
-corvid_Mtl_Ward_aa598cb4 plain unlit | roughValue=.25 | .25 .25 .01 1
-corvid_Mtl_Ward_b9aac246 plain unlit | roughValue=.25 | .25 .25 .01 1
-corvid_Mtl_Ward_ccb3a2e6 plain unlit | roughValue=.25 | .25 .25 .01 1
-corvid_Mtl_Ward_f05db29e plain unlit | roughValue=.25 | .25 .25 .01 1
-MarlowLegacy narrow oneWay      | diffuseColor=.3,.3,.3 specularREG=.66,.05,1 specular2Color=0,0,0 transparencyMode=-1 | .05 .05 .3 1
-MarlowLegacy wide oneWay        | diffuseColor=0,0,0 specularColor=1,1,1 specularREG=0,1,1 specular2Color=0,0,0 transparencyMode=-1 | 1 1 .98 1
-MarlowLegacy matt               | diffuseColor=1,1,1 specularColor=0,0,0 specular2Color=0,0,0 transparencyMode=-1 | .5 .5 .99 1
-MarlowLegacy bent leaning oneWay gathers    | diffuseColor=1,1,1 specularREG=0,.5,1 reflectivityColor=.3,.3,.3 reflectLight=1 surfaceRoughness=.5 N=.6,0,.8 transparencyMode=-1 | .5 .5 .3 1
-MarlowLegacy white clear oneWay | diffuseColor=1,1,1 specularREG=.2,.3,1 specular2REG=.5,.6,.8 transparencyColor=.4,.4,.4 reflectivityColor=.3,.3,.3 reflectLight=1 surfaceRoughness=.4 | .4 .4 .98 1
-MarlowLegacy bends clear oneWay | diffuseColor=1,1,1 refractiveIndex=1.4 transparencyColor=.4,.4,.4 reflectivityColor=.3,.3,.3 surfaceRoughness=.4 maskingColor=.2,.2,.2 | .4 .4 .98 1
-MarlowLegacy black clear oneWay | diffuseColor=0,0,0 specularREG=0,.4,1 specularColor=.2,.2,.2 specular2Color=0,0,0 transparencyColor=.4,.4,.4 reflectivityColor=.5,.5,.5 | .4 .4 .89 .91
-corvid_Mtl_Dielectric rough stated clear | roughValue=.3 | .3 .3 .5 1
-corvid_Mtl_Glazing rough stated clear | rough=.09 | .3 .3 .1 1
-corvid_Mtl_Mirror white stated clear | tintColor=1,1,1 | .5 .5 .9 1
-)";
-
 Vec3d viewAt(double cosine, double azimuth)
 {
     double const s = std::sqrt(1 - cosine * cosine);
     return {s * std::cos(azimuth), s * std::sin(azimuth), cosine};
 }
 
-/// A line of the table, and its shader.
+/// A line of tests/data/sampling.txt, which tells what stands there.
 struct Setting {
     std::string className, name;
     std::set<std::string> flags;
@@ -77,7 +32,7 @@ struct Setting {
     static std::vector<Setting> all()
     {
         std::vector<Setting> settings;
-        for (Line const& l : table(kTable))
+        for (Line const& l : tableOf("sampling.txt"))
             settings.emplace_back(l);
         return settings;
     }

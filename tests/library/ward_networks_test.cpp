@@ -51,56 +51,7 @@ TEST(WardNetworks, NoiseHasOctavesOfItsPlace)
 
 TEST(WardNetworks, TileLaysBricksInMortar)
 {
-    // Red of bricks, green of mortar, distance of the eye. Cells of a quarter with mortar for a
-    // tenth at each end, rows not shifted, so that (.375, .375) is the middle of the second brick
-    // of the second row, and .26 and .49 are mortar. The noise is 1 for edges and rows, 0.75 for
-    // rows of a high seed; bricks draw (0.25, 0.25, 0.1), but 0.75 first in column 0 or with a high
-    // seed.
-    for (test::Line const& line : test::table(R"(
-brick                     | uv=.375,.375                                                 | 1 0 0
-mortar left of it         | uv=.26,.375                                                  | 0 1 0
-right of it               | uv=.49,.375                                                  | 0 1 0
-below it                  | uv=.375,.26                                                  | 0 1 0
-beside the square         | uv=-.1,.375                                                  | 0 0 0
-above it                  | uv=.375,1.1                                                  | 0 0 0
-goes on beside            | uv=-.625,.375 repeatX=1                                      | 1 0 0
-but not above             | uv=.375,1.375 repeatX=1                                      | 0 0 0
-fewer columns             | uv=.26,.375 horizontalCount=1.9                              | 1 0 0
-fewer rows                | uv=.375,.26 verticalCount=1.9                                | 1 0 0
-wider mortar along u      | uv=.3,.375 horizontalCount=3.7 horizontalGap=.3              | 0 1 0
-along v                   | uv=.375,.3 verticalCount=3.7 verticalGap=.3                  | 0 1 0
-wider bricks              | uv=.26,.375 brickWidth=2                                     | 1 0 0
-higher bricks             | uv=.375,.26 brickHeight=2                                    | 1 0 0
-second row shifted        | uv=.375,.375 lineShift=0                                     | 0 1 0
-first row not             | uv=.375,.125 lineShift=0                                     | 1 0 0
-rows at random            | uv=.375,.375 randomShift=1                                   | 0 1 0
-another seed, no shift    | uv=.375,.375 randomShift=1 randomSeed=9                      | 1 0 0
-second row edited         | uv=.26,.375 useRowEdit=1 perRow=2 changeRow=2                | 1 0 0
-first row not             | uv=.26,.125 useRowEdit=1 perRow=2 changeRow=2                | 0 1 0
-second column edited      | uv=.375,.26 useColumnEdit=1 perColumn=2 changeColumn=2       | 1 0 0
-first column not          | uv=.125,.26 useColumnEdit=1 perColumn=2 changeColumn=2       | 0 1 0
-the product               | uv=.375,.375 colorVariance=.5 fadeVariance=.5                | .45 0 0
-brighter, but not above 1 | uv=.375,.375 colorVariance=-4                                | 1 0 0
-all holes                 | uv=.375,.375 holes=100                                       | 0 1 0
-hole: .75 above 1/2       | uv=.125,.375 holes=1                                         | 0 1 0
-no hole: .25              | uv=.375,.375 holes=1                                         | 1 0 0
-at 1/4 not yet            | uv=.375,.375 holes=3                                         | 1 0 0
-above 1/5                 | uv=.375,.375 holes=4                                         | 0 1 0
-another seed              | uv=.375,.375 holes=1 randomSeed=9                            | 0 1 0
-fifth column              | uv=.95,.375 holes=1 randomShift=1                            | 1 0 0
-which is the first again  | uv=.95,.375 holes=1 randomShift=1 repeatX=1                  | 0 1 0
-edges displaced by .01    | uv=.27,.375 edgeRoughness=10                                 | 1 0 0
-over the end of the square | uv=.99,.375 edgeRoughness=40                                | 1 0 0
-along v too               | uv=.375,.99 edgeRoughness=40                                  | 1 0 0
-hardly displaced          | uv=.999,.375 edgeRoughness=1e-6                              | 0 1 0
-cells of no size          | uv=.375,.375 brickWidth=1e-40 horizontalCount=1e6 horizontalGap=.25 verticalCount=-.1  | 0 1 0
-placed by the third row   | uv=.01,.375 xform=1,0,0,0,0,1,0,0,.115,0,1,0,0,0,0,1         | 1 0 0
-and the fourth            | uv=.375,.01 xform=1,0,0,0,0,1,0,0,0,0,1,0,0,.115,0,1         | 1 0 0
-a pixel of .05 on an edge | uv=.275,.375                                                 | .5 .5 6.0355
-at .05 from the edge      | uv=.3,.375                                                   | 1 0 6.0355
-the same at 53 degrees    | uv=.3,.375 I=.8,0,-.6                                        | .8 .2 6.0355
-far away: the mean        | uv=.375,.375                                                 | .64 .36 1000
-)")) {
+    for (test::Line const& line : test::tableOf("bricks.txt")) {
         Variant v("f05db29e");
         v.prefix = "_ward_diffuse_color_Tile_";
         v.set("brickColor_UnifiedBitmap_texture=1,0,0,1 brickColor_UnifiedBitmap_amount=1 "

@@ -7,6 +7,8 @@
 #include "support/scriptedHost.h"
 #include "support/stateFields.h"
 
+#include <fstream>
+#include <iterator>
 #include <map>
 #include <memory>
 #include <sstream>
@@ -54,15 +56,21 @@ struct Line {
     std::string why, settings;
     std::vector<float> want;
 };
-inline std::vector<Line> table(char const* text)
+inline std::vector<Line> table(std::string const& text)
 {
     std::vector<Line> lines;
     std::istringstream in(text);
     for (std::string line; std::getline(in, line);)
-        if (Row const row(line); line.find('|') != line.npos)
+        if (Row const row(line); !line.starts_with('#') && line.find('|') != line.npos)
             lines.push_back({row.why, row.settings, numbers(row.results)});
     EXPECT_FALSE(lines.empty());
     return lines;
+}
+/// Of a file of tests/data.
+inline std::vector<Line> tableOf(char const* name)
+{
+    std::ifstream in(std::string(ZSI_SOURCE_DIR "/tests/data/") + name);
+    return table({std::istreambuf_iterator<char>(in), {}});
 }
 
 /// A shader with identity matrices, seen head-on; tangents along x and y.
