@@ -240,7 +240,7 @@ int render(Arguments const& arguments, std::string const& shaderPath)
         job.progress = [&](double done) { bar.show("rendering", done); };
         job.cancel = &interrupted;
         report = session.render(film, job);
-        picture = host::developed(film, scene.film);
+        picture = host::developed(film, scene);
         reporter.detail(fmt::format("rendered with \"{}\"", scene.settings.integrator));
     } catch (host::Cancelled const&) {
         // Told below, as an interruption while rendering is.

@@ -123,6 +123,8 @@ std::vector<unsigned char> encode(std::filesystem::path const& file, Picture con
         spec.full_width = picture.frameWidth;
         spec.full_height = picture.frameHeight;
         spec.erase_attribute("oiio:UnassociatedAlpha");
+        for (Attachment const& attachment : picture.attachments)
+            spec.attribute(attachment.name, attachment.text);
     }
     if (!output->open(file.filename().string(), spec))
         fail(file, output->geterror());

@@ -18,11 +18,19 @@ struct Layer {
     bool operator==(Layer const&) const = default;
 };
 
+/// A named text of a picture's file, such as the manifest of a layer.
+struct Attachment {
+    std::string name, text;
+
+    bool operator==(Attachment const&) const = default;
+};
+
 /// Layers over one window of a frame. The first is what the camera sees: linear R, G, B and A.
 struct Picture {
     int frameWidth = 0, frameHeight = 0; ///< of the whole picture, which a crop is a part of
     Window window; ///< the pixels that are here
     std::vector<Layer> layers;
+    std::vector<Attachment> attachments = {}; ///< for the header of an EXR
 
     int width() const { return window.width(); }
     int height() const { return window.height(); }

@@ -4,9 +4,9 @@
 namespace zsi::host {
 
 CameraSample Integrator::sample(Vec3f origin, Vec3f direction, float rasterX, float rasterY,
-                                Sampler& sampler)
+                                Sampler& sampler, SampleWants wants)
 {
-    context_.start(sampler, rasterX, rasterY);
+    context_.start(sampler, rasterX, rasterY, wants.parts);
     PathRay ray;
     ray.E = ray.origin = origin;
     ray.direction = direction;
@@ -16,7 +16,13 @@ CameraSample Integrator::sample(Vec3f origin, Vec3f direction, float rasterX, fl
     if (!finite && context_.nonFinite() == before)
         context_.countNonFinite();
     FirstHit const* const first = context_.firstHit();
-    return {color, finite, first ? &first->surface : nullptr, first ? first->distance : 0.0f};
+    CameraSample sample{color, finite, first ? &first->surface : nullptr,
+                        first ? first->distance : 0.0f};
+    if (wants.parts)
+        sample.parts = context_.parts();
+    if (wants.feature)
+        sample.feature = findFeature(context_, ray, sampler);
+    return sample;
 }
 
 } // namespace zsi::host

@@ -11,6 +11,7 @@ namespace zsi::host {
 struct LayerKind {
     LayerFormat format;
     std::string meaning; ///< one line, with the unit
+    SampleWants wants; ///< beside the sample's colour
     /// Writes a value for each channel; false where the sample has none. Null for counts.
     bool (*values)(CameraSample const& sample, float* values);
 };
@@ -19,8 +20,12 @@ struct LayerKind {
 std::vector<LayerKind> const& layerKinds();
 std::vector<std::string> layerNames(); ///< of those that a film may have beside the first
 
-/// The first kind, and those of `names` in the order of `layerKinds`, each once. Throws InputError
-/// for an unknown name.
-std::vector<LayerKind> chooseLayers(std::vector<std::string> const& names);
+/// The layers of a film that has the first kind, and those of `names` in the order of
+/// `layerKinds`, each once. "halves" stands for halves of the beauty and of what a denoiser wants
+/// beside it; `halved` has them of the beauty alone. Throws InputError for an unknown name.
+std::vector<LayerFormat> chooseLayers(std::vector<std::string> const& names, bool halved = false);
+
+/// The kind of a layer of such a film; null for a layer of another origin.
+LayerKind const* kindOf(LayerFormat const& format);
 
 } // namespace zsi::host

@@ -32,16 +32,28 @@ Vec4f PathIntegrator::radiance(PathRay ray)
     SurfacePoint surface;
     while (context_.intersect(ray, surface, seen)) {
         if (context_.scene().materialOf(surface).continuesPaths) {
-            if (!scatter(ray, surface, path))
+            if (!scatter(ray, surface, path)) {
+                context_.setParts(path.parts);
                 return withAlpha(path.light, 1.0f - path.clear);
+            }
         } else if (context_.shade(ray, surface, seen)) {
             break;
         } else {
             ShadingContext::passIgnored(ray, surface);
         }
     }
-    return withAlpha(path.light + path.throughput * rgb(seen),
-                     1.0f - path.clear - path.open * (1.0f - seen.w));
+    path.add(rgb(seen), context_.parts());
+    context_.setParts(path.parts);
+    return withAlpha(path.light, 1.0f - path.clear - path.open * (1.0f - seen.w));
+}
+
+void PathIntegrator::Path::add(Vec3f arrived, LightParts const& partsOfIt)
+{
+    light += throughput * arrived;
+    if (bends == 0)
+        parts.add(partsOfIt * throughput);
+    else if (bends == 1)
+        parts.direct += partsOfIt.straight() * throughput;
 }
 
 Vec3f PathIntegrator::directLight(ShadingContext::Call& call)
@@ -90,7 +102,8 @@ bool PathIntegrator::scatter(PathRay& ray, SurfacePoint const& surface, Path& pa
     PathRay next = ray;
     {
         ShadingContext::Call call(context_, ray, surface);
-        path.light += path.throughput * directLight(call);
+        Vec3f const lit = directLight(call);
+        path.add(lit, {.direct = lit});
         if (!draw(next, call, path))
             return false;
     }
@@ -105,7 +118,7 @@ bool PathIntegrator::passes(PathRay& ray, SurfacePoint const& surface, Path& pat
         ShadingContext::passIgnored(ray, surface);
         return true;
     }
-    path.light += path.throughput * beside.color;
+    path.add(beside.color, context_.parts());
     float const through = maxComponent(path.throughput * beside.behind);
     if (through <= 0.0f)
         return false;
@@ -118,7 +131,7 @@ bool PathIntegrator::passes(PathRay& ray, SurfacePoint const& surface, Path& pat
         // Both are followed where the edge of the one before the other is seen.
         straight.importance *= through / maxComponent(path.throughput);
         Vec4f const seen = radiance(straight);
-        path.light += path.throughput * beside.behind * rgb(seen);
+        path.add(beside.behind * rgb(seen), context_.parts() * beside.behind);
         path.clear += path.open * beside.clear * (1.0f - seen.w);
         path.open = 0.0f;
     } else if (!(kept > 0.0f) || context_.sampler().next() < chance) {
@@ -171,6 +184,7 @@ bool PathIntegrator::draw(PathRay& ray, ShadingContext::Call& call, Path& path)
     ray.lobeDensity = ray.skyDensity =
         shares ? context_.lobeDensity(ray.direction) : std::numeric_limits<float>::infinity();
     path.open = 0.0f;
+    path.bends += 1;
     ShadingContext::changeMedia(ray, arrived, call.surface,
                                 material.ior ? &state.beyondIor : nullptr);
     return true;

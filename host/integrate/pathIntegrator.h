@@ -23,7 +23,12 @@ private:
         float open = 1.0f;
         float clear = 0.0f; ///< how clear all along branches of that line is
 
+        int bends = 0;
+        LightParts parts = {}; ///< of `light`
+
         void weigh(Vec3f weight, PathRay& ray);
+        /// Light that arrives at the path's end.
+        void add(Vec3f arrived, LightParts const& partsOfIt);
     };
     /// Adds the light at the surface and turns the ray; false when the path ends here.
     bool scatter(PathRay& ray, SurfacePoint const& surface, Path& path);

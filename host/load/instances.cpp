@@ -41,7 +41,7 @@ void readParts(JsonReader const& reader, JsonReader const& chosen, int mesh, Mat
                                     "\"*\" for all others",
                                     names[i]));
         if (meshes[i] >= 0)
-            builder.addInstance(reader, {meshes[i], found->second, toWorld});
+            builder.addInstance(reader, {meshes[i], found->second, toWorld}, parts[i].node);
     }
 }
 

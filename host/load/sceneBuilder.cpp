@@ -38,7 +38,8 @@ int SceneBuilder::addMesh(Mesh mesh)
     return static_cast<int>(scene.meshes.size()) - 1;
 }
 
-void SceneBuilder::addInstance(JsonReader const& reader, Instance const& instance)
+void SceneBuilder::addInstance(JsonReader const& reader, Instance const& instance,
+                               std::string const& part)
 {
     Mat4f const& m = instance.objectToWorld;
     float const largest = largestCoordinate(static_cast<std::size_t>(instance.mesh));
@@ -48,6 +49,8 @@ void SceneBuilder::addInstance(JsonReader const& reader, Instance const& instanc
             reader.fail(fmt::format("reaches farther out than rays go, which is {}", kFarthest));
     }
     scene.instances.push_back(instance);
+    std::string const name = reader.path().substr(reader.path().find('.') + 1);
+    scene.instanceNames.push_back(part.empty() ? name : name + '/' + part);
 }
 
 float SceneBuilder::largestCoordinate(std::size_t mesh)

@@ -39,8 +39,9 @@ public:
     /// Tells that `reader` is read next.
     void begin(JsonReader const& reader) const;
     int addMesh(Mesh mesh);
-    /// Refuses what reaches farther out than rays go.
-    void addInstance(JsonReader const& reader, Instance const& instance);
+    /// Refuses what reaches farther out than rays go. `part`: of the thing that `reader` names.
+    void addInstance(JsonReader const& reader, Instance const& instance,
+                     std::string const& part = {});
     /// Meshes of the parts, -1 for one without triangles.
     std::vector<int> const& splitMesh(int whole);
     /// What stands in the scene only in parts needs no memory as a whole.

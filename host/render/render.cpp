@@ -1,6 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "render/render.h"
 
+#include "film/cryptomatte.h"
+#include "film/halves.h"
+
 namespace zsi::host {
 
 Picture render(Scene const& scene, RenderOptions const& options, RenderReport* report)
@@ -16,13 +19,22 @@ Picture render(Scene const& scene, RenderOptions const& options, RenderReport* r
     RenderReport const result = session.render(film, job);
     if (report)
         *report = result;
-    return developed(film, scene.film);
+    return developed(film, scene);
 }
 
-Picture developed(Film const& film, FilmSettings const& settings)
+Picture developed(Film const& film, Scene const& scene)
 {
     Picture picture = film.picture();
-    if (settings.alpha == false) {
+    auto const& asked = scene.film.layers;
+    if (std::find(asked.begin(), asked.end(), "halves") != asked.end())
+        appendHalves(picture, {film.half(0), film.half(1)});
+    ObjectNames const names = objectNames(scene);
+    for (LayerFormat const& layer : film.layers())
+        if (layer.value == LayerFormat::Value::Ids)
+            for (Attachment& line : cryptomatteHeader(
+                     layer.name, layer.name == "shaderId" ? names.shaders : names.objects))
+                picture.attachments.push_back(std::move(line));
+    if (scene.film.alpha == false) {
         std::vector<float>& rgba = picture.layers.front().values;
         for (std::size_t i = 3; i < rgba.size(); i += 4)
             rgba[i] = 1.0f;

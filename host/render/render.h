@@ -20,7 +20,7 @@ Picture render(Scene const& scene, RenderOptions const& options = {},
                RenderReport* report = nullptr);
 
 /// The film's picture as the scene's film settings want it.
-Picture developed(Film const& film, FilmSettings const& settings);
+Picture developed(Film const& film, Scene const& scene);
 /// How such a picture is shown; `ocioConfig` as in ScreenView.
 ScreenView screenView(FilmSettings const& settings, std::string const& ocioConfig = {});
 

@@ -2,11 +2,13 @@
 #include "render/session.h"
 
 #include "base/threads.h"
+#include "film/cryptomatte.h"
 #include "integrate/integrators.h"
 #include "integrate/layers.h"
 #include "render/cameraRays.h"
 #include "sampling/pixelFilter.h"
 
+#include <algorithm>
 #include <array>
 #include <chrono>
 #include <mutex>
@@ -35,10 +37,21 @@ public:
                  * ((job.samples.end - job.samples.begin + kSamples - 1) / kSamples))
         , tileLocks_(static_cast<std::size_t>(tiles_))
     {
-        for (LayerFormat const& format : film.layers())
-            for (LayerKind const& kind : layerKinds())
-                if (kind.format == format)
-                    layers_.push_back(kind.values);
+        for (LayerFormat const& format : film.layers()) {
+            LayerKind const* const kind = kindOf(format);
+            layers_.push_back(kind ? kind->values : nullptr);
+            wants_.parts |= kind && kind->wants.parts;
+            wants_.feature |= kind && kind->wants.feature;
+        }
+        if (std::ranges::any_of(film.layers(), [](LayerFormat const& format) {
+                return format.value == LayerFormat::Value::Ids;
+            })) {
+            ObjectNames const names = objectNames(scene.scene());
+            for (std::string const& name : names.shaders)
+                shaderIds_.push_back(cryptomatteId(name));
+            for (std::string const& name : names.objects)
+                objectIds_.push_back(cryptomatteId(name));
+        }
     }
 
     /// Works until nothing is left; for one thread.
@@ -117,27 +130,36 @@ private:
             float const rasterY = static_cast<float>(y) + 0.5f + offset.y;
             Vec3f origin, direction;
             camera_.ray(rasterX, rasterY, sampler.next2D(), origin, direction);
-            CameraSample sample = integrator.sample(origin, direction, rasterX, rasterY, sampler);
+            CameraSample sample =
+                integrator.sample(origin, direction, rasterX, rasterY, sampler, wants_);
             surfaces += sample.surface != nullptr;
             if (!sample.isFinite)
                 continue;
-            sample.color = limited(sample.color);
+            limit(sample);
+            if (sample.surface && !shaderIds_.empty()) {
+                sample.shaderId = shaderIds_[sample.surface->instance];
+                sample.objectId = objectIds_[sample.surface->instance];
+            }
             for (std::size_t layer = 0; layer < layers_.size(); ++layer) {
                 std::array<float, 4> values;
                 if (layers_[layer] && layers_[layer](sample, values.data()))
                     part.add(x, y, layer,
-                             std::span(values).first(film_.layers()[layer].channels.size()));
+                             std::span(values).first(
+                                 std::max<std::size_t>(1, film_.layers()[layer].channels.size())),
+                             i);
             }
         }
         return true;
     }
 
-    Vec4f limited(Vec4f sample) const
+    void limit(CameraSample& sample) const
     {
-        float const brightest = maxComponent(rgb(sample));
+        float const brightest = maxComponent(rgb(sample.color));
         if (!(settings_.sampleClamp > 0.0f) || brightest <= settings_.sampleClamp)
-            return sample;
-        return withAlpha(rgb(sample) * (settings_.sampleClamp / brightest), sample.w);
+            return;
+        float const kept = settings_.sampleClamp / brightest;
+        sample.color = withAlpha(rgb(sample.color) * kept, sample.color.w);
+        sample.parts = sample.parts * Vec3f(kept, kept, kept);
     }
 
     PreparedScene const& scene_;
@@ -150,6 +172,8 @@ private:
     int tilesAcross_, tiles_;
     std::int64_t units_; ///< all tiles for the first samples, then all for the next
     std::vector<bool (*)(CameraSample const&, float*)> layers_;
+    SampleWants wants_;
+    std::vector<float> shaderIds_, objectIds_; ///< of each instance
     std::vector<std::mutex> tileLocks_;
     std::atomic<std::int64_t> next_{0};
     std::mutex reportLock_;
@@ -182,10 +206,23 @@ std::vector<std::string> Session::omissions()
 Film Session::newFilm() const
 {
     FilmSettings const& film = scene().film;
-    std::vector<LayerFormat> formats;
-    for (LayerKind const& kind : chooseLayers(film.layers))
-        formats.push_back(kind.format);
-    return Film(film.width, film.height, windowOf(film), std::move(formats));
+    return Film(film.width, film.height, windowOf(film), chooseLayers(film.layers));
+}
+
+ObjectNames objectNames(Scene const& scene)
+{
+    ObjectNames names;
+    for (std::size_t i = 0; i < scene.instances.size(); ++i) {
+        Instance const& instance = scene.instances[i];
+        auto const material = static_cast<std::size_t>(instance.material);
+        names.shaders.push_back(instance.light >= 0 ? "light"
+                                    : material < scene.materialNames.size()
+                                    ? scene.materialNames[material]
+                                    : "material " + std::to_string(material));
+        names.objects.push_back(i < scene.instanceNames.size() ? scene.instanceNames[i]
+                                                               : "instance " + std::to_string(i));
+    }
+    return names;
 }
 
 RenderReport Session::render(Film& film, RenderJob const& job)

@@ -77,6 +77,12 @@ private:
     PreparedScene prepared_;
 };
 
+/// What layers of names call the material and the object of each instance.
+struct ObjectNames {
+    std::vector<std::string> shaders, objects;
+};
+ObjectNames objectNames(Scene const& scene);
+
 /// The scene's picture, or the part in its crop.
 Window windowOf(FilmSettings const& film);
 

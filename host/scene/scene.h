@@ -123,6 +123,7 @@ struct Scene {
     std::vector<Shader> materials;
     std::vector<std::string> materialNames;
     std::vector<Instance> instances;
+    std::vector<std::string> instanceNames; ///< for mattes; may be shorter
     std::vector<Light> lights;
     std::optional<Shader> environment; ///< none: black
     /// The camera sees the environment as a ray does that has reached its depth, which for some

@@ -274,7 +274,7 @@ Vec3f ShadingContext::traceContinue(int rayType, Vec3f const* origin, Vec3f cons
     if (!continuation(origin, direction, importance, ray))
         return {0, 0, 0};
     ray.type = static_cast<std::uint32_t>(rayType);
-    return rgb(source_.radiance(ray));
+    return rgb(answered(ray));
 }
 
 Vec4f ShadingContext::traceThrough(Vec3f const* P, Vec3f const* I, float importance)
@@ -288,7 +288,7 @@ Vec4f ShadingContext::traceThrough(Vec3f const* P, Vec3f const* I, float importa
         return {0, 0, 0, 0};
     if (ray.type == kRayCamera)
         ray.type = kRayTransmission;
-    return source_.radiance(ray);
+    return answered(ray);
 }
 
 Vec3f ShadingContext::traceReflection(Vec3f const* origin, Vec3f const* direction, float importance)
@@ -331,10 +331,10 @@ Vec3f ShadingContext::traceLobe(Vec3f const* origin, Vec3f const* direction, flo
         return {0, 0, 0};
     ray.type = kRayReflection;
     if (!(spread > 0.0f))
-        return rgb(source_.radiance(ray)) * scale;
+        return rgb(answered(ray)) * scale;
     leaveToLightList(ray);
     if (!(*origin == call_->surface.P))
-        return rgb(source_.radiance(ray)) * scale;
+        return rgb(answered(ray)) * scale;
     auto const density = [&](Vec3f d) {
         return dot(d, side) < 0.0f ? 0.0f
                                    : host::lobeDensity(dot(axis, d), width, turn)
@@ -347,11 +347,11 @@ template <class Density>
 Vec3f ShadingContext::gather(PathRay ray, Density const& density)
 {
     if (scene_.sky(ray.type).isEmpty() || call_->askedSky_)
-        return rgb(source_.radiance(ray));
+        return rgb(answered(ray));
     ray.skyDensity = density(ray.direction);
     Vec3f const sky = fromSky(
         ray.type, [&](Vec3f d) { return Vec3f(1, 1, 1) * density(d); }, density);
-    return rgb(source_.radiance(ray)) + sky;
+    return rgb(answered(ray)) + sky;
 }
 
 void ShadingContext::leaveToLightList(PathRay& ray) const
@@ -441,7 +441,7 @@ Vec3f ShadingContext::indirectDiffuse(Vec3f const* P, Vec3f const* N, float impo
         if (*P == call_->surface.P)
             sum += gather(ray, density) * scale;
         else
-            sum += rgb(source_.radiance(ray)) * scale;
+            sum += rgb(answered(ray)) * scale;
     }
     sum = sum / static_cast<float>(count);
     Call::Gathered& gathered = call_->gathered_;

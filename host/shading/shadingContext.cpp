@@ -2,6 +2,7 @@
 #include "shading/shadingContext.h"
 
 #include "sampling/directions.h"
+#include "shading/partsOfShade.h"
 
 #include <algorithm>
 #include <cstring>
@@ -61,8 +62,10 @@ ShadingContext::ShadingContext(PreparedScene const& scene, RadianceSource& sourc
 {
 }
 
-void ShadingContext::start(Sampler& sampler, float rasterX, float rasterY)
+void ShadingContext::start(Sampler& sampler, float rasterX, float rasterY, bool keepsParts)
 {
+    keepsParts_ = keepsParts;
+    parts_ = {};
     sampler_ = &sampler;
     rasterX_ = rasterX;
     rasterY_ = rasterY;
@@ -75,10 +78,12 @@ bool ShadingContext::intersect(PathRay const& ray, SurfacePoint& surface, Vec4f&
     Hit hit;
     if (!scene_.rays().intersect({ray.origin, ray.direction}, Visibility::All, hit)) {
         seen = environment(ray);
+        parts_ = {rgb(seen)};
         return false;
     }
     bool const isLight = scene_.scene().instances[hit.instance].light >= 0;
     seen = {0, 0, 0, 1};
+    parts_ = {};
     if (!isLight
         && (ray.depth >= maxDepth_ || ray.passes > kMaxPasses || ray.ignored > kMaxIgnoredHits))
         return false;
@@ -90,6 +95,7 @@ bool ShadingContext::intersect(PathRay const& ray, SurfacePoint& surface, Vec4f&
         hasFirstHit_ = true;
     }
     seen = withAlpha(emission(ray, surface), 1.0f);
+    parts_.emission = rgb(seen);
     return false;
 }
 
@@ -213,7 +219,12 @@ bool ShadingContext::shade(PathRay const& ray, SurfacePoint const& surface, Vec4
     bool const hadFirstHit = hasFirstHit_;
     Call call(*this, ray, surface);
     call.state.Ci = {0, 0, 0, 1};
-    call.material.shader->shade(this, call.state);
+    LightParts parts;
+    if (keepsParts_ && ray.depth <= 1)
+        parts = shadeInParts(*this, call);
+    else
+        call.material.shader->shade(this, call.state);
+    parts_ = parts; // rays on its behalf have left theirs
     if (call.state.discardHit) {
         hasFirstHit_ = hadFirstHit;
         return false;
@@ -223,6 +234,16 @@ bool ShadingContext::shade(PathRay const& ray, SurfacePoint const& surface, Vec4
     if (ray.depth > 0 || ray.passes > 0)
         result = withAlpha(finite(rgb(result)), std::isfinite(result.w) ? result.w : 1.0f);
     return true;
+}
+
+Vec4f ShadingContext::answered(PathRay const& ray)
+{
+    Arrived const before = arrived_; // what arrives in the course of it is its own affair
+    Vec4f const light = source_.radiance(ray);
+    arrived_ = before;
+    arrived_.all += rgb(light);
+    arrived_.parts.add(parts_);
+    return light;
 }
 
 void ShadingContext::passIgnored(PathRay& ray, SurfacePoint const& surface)
@@ -253,7 +274,15 @@ bool ShadingContext::shadeBeside(PathRay const& ray, SurfacePoint const& surface
         call.material.shader->shade(this, call.state);
         return call.state.Ci;
     };
-    Vec3f const color = rgb(shown(Answers::Beside));
+    if (keepsParts_ && ray.depth <= 1) {
+        call.answers_ = Answers::Beside;
+        call.state.Ci = {0, 0, 0, 1};
+        parts_ = shadeInParts(*this, call);
+    } else {
+        shown(Answers::Beside);
+        parts_ = {};
+    }
+    Vec3f const color = rgb(call.state.Ci);
     if (call.state.discardHit) {
         hasFirstHit_ = hadFirstHit;
         return false;

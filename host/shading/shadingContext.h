@@ -3,6 +3,7 @@
 #pragma once
 
 #include "sampling/sampler.h"
+#include "shading/lightParts.h"
 #include "shading/pathRay.h"
 #include "shading/preparedScene.h"
 
@@ -16,6 +17,12 @@ struct FirstHit {
     float distance; ///< from the camera
 };
 
+/// What rays that services sent out have brought, before the services weighted it.
+struct Arrived {
+    Vec3f all{0, 0, 0};
+    LightParts parts = {}; ///< of `all`
+};
+
 /// See docs/services.md for what the record holds and what each service does.
 class ShadingContext final : public IShaderAPI {
 public:
@@ -23,7 +30,8 @@ public:
     ShadingContext(PreparedScene const& scene, RadianceSource& source);
 
     /// Begins a camera sample: random numbers come from `sampler`; `rasterX`, `rasterY` are pixels.
-    void start(Sampler& sampler, float rasterX, float rasterY);
+    /// `keepsParts`: light is told apart by the way on which it came (`parts`).
+    void start(Sampler& sampler, float rasterX, float rasterY, bool keepsParts = false);
 
     PreparedScene const& scene() const { return scene_; }
     Sampler& sampler() { return *sampler_; }
@@ -35,6 +43,12 @@ public:
     void countNonFinite();
     /// Of the running sample; null while no surface was shown.
     FirstHit const* firstHit() const { return hasFirstHit_ ? &firstHit_ : nullptr; }
+
+    /// Of the light that was found last by `intersect`, `shade` or an integrator's `radiance`; of
+    /// what lies behind the second bend nothing is told.
+    LightParts const& parts() const { return parts_; }
+    void setParts(LightParts const& parts) { parts_ = parts; }
+    Arrived& arrived() { return arrived_; }
 
     // What an integrator is made of.
 
@@ -214,6 +228,8 @@ private:
     void leaveToLightList(PathRay& ray) const;
     Vec3f gatherNormal(Vec3f P, Vec3f N) const;
     Vec3f transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMax);
+    /// What the integrator answers for the ray.
+    Vec4f answered(PathRay const& ray);
 
     PreparedScene const& scene_;
     Settings const& settings_;
@@ -223,6 +239,9 @@ private:
     Sampler* sampler_ = nullptr;
     Call* call_ = nullptr;
     float rasterX_ = 0.0f, rasterY_ = 0.0f;
+    bool keepsParts_ = false;
+    LightParts parts_ = {};
+    Arrived arrived_ = {};
     FirstHit firstHit_ = {};
     bool hasFirstHit_ = false;
     std::uint64_t rays_ = 0;
@@ -246,7 +265,10 @@ Vec3f ShadingContext::fromSky(std::uint32_t rayType, Value const& value, Density
     ++rays_;
     if (scene_.rays().occluded({shadowStart(call_->surface.P, d), d}, Visibility::All))
         return {0, 0, 0};
-    return finite(sent * light / (map.density(d) + density(d)));
+    Vec3f const brought = finite(sent * light / (map.density(d) + density(d)));
+    arrived_.all += brought;
+    arrived_.parts.environment += brought;
+    return brought;
 }
 
 inline bool isFinite(Vec3f v)
