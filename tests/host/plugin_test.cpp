@@ -30,17 +30,6 @@ std::string content(fs::path const& file)
     return {std::istreambuf_iterator<char>(in), {}};
 }
 
-TEST(Plugin, FindsTheClassesOfAnyLibrary)
-{
-    EXPECT_TRUE(libraries().has("corvid_Mtl_Solid") && libraries().has("TinyLight"));
-    EXPECT_FALSE(libraries().has("Alone"));
-
-    Shader const shader = libraries().create("TinyMaterial");
-    EXPECT_EQ(shader.kind(), kMaterial);
-    EXPECT_EQ(shader.entryPoints(), kShade | kTransmission);
-    EXPECT_TRUE(shader.material() && !shader.light() && !shader.environment());
-}
-
 TEST(Plugin, EveryNumberOfTheLibraryHasASliderAroundItsDefault)
 {
     ShaderLibraries own;

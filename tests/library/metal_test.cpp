@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-// Metal: what its maps and bumps do to the lobe, its Fresnel curve, its two faces and its holes.
+// Metal: what its maps do to the lobe, its two faces and its holes.
 #include "support/textTable.h"
 
 namespace zsi {

@@ -1,12 +1,11 @@
 // SPDX-License-Identifier: Apache-2.0
-// The Ward material by numbers worked out by hand: what each channel does to the lobes, what a
-// light, a ray and a random number give, and what the host is asked for.
+// The Ward material where no table of numbers says it: maps, the blend of the cut-out, patterns.
 #include "support/textTable.h"
 
 namespace zsi {
 namespace {
 
-constexpr Vec3f kWhite(1, 1, 1), kNone(0, 0, 0);
+constexpr Vec3f kWhite(1, 1, 1);
 
 /// Diffuse (0.6, 0.5, 0.4) under a lobe (0.9, 0.8, 0.7) of width 0.2 that reflects half at every
 /// angle, which leaves (0.3, 0.25, 0.2) and (0.45, 0.4, 0.35).
