@@ -16,8 +16,8 @@ namespace {
 /// Parts in order; later ones refer to earlier ones by name.
 void read(JsonReader const& root, SceneBuilder& builder)
 {
-    root.expectKeys({"$schema", "include", "camera", "film", "settings", "meshes", "materials", "instances",
-                     "lights", "environment"});
+    root.expectKeys({"$schema", "include", "camera", "film", "settings", "meshes", "materials",
+                     "instances", "lights", "environment"});
     if (auto const v = root.find("$schema")) // for editors
         v->toString();
     if (auto const v = root.find("camera"))

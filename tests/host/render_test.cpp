@@ -80,6 +80,24 @@ TEST(Render, ShadowsLieWhereTheLightIsCovered)
     }
 }
 
+TEST(Render, TheSunIsAsWideAsItsAngle)
+{
+    // A card's edge 1 above the ground before a disc of 30 degrees: what part of it lies beyond.
+    struct Row {
+        float x, want;
+    };
+    for (Row const& r : {Row{0.7f, 0}, Row{0.9f, 0.26f}, Row{1.1f, 0.74f}, Row{1.3f, 1}}) {
+        Stage stage;
+        stage.scene.lights.push_back(host::SunLight{{0, 0, 1}, kWhite, 30});
+        stage.scene.settings.samples = 64;
+        stage.scene.settings.maxDepth = 1;
+        stage.card(stage.matte(), 0, 5);
+        stage.card(stage.matte(), 1);
+        stage.watch({r.x, 0, 0}, {0, 0, 0.5f});
+        EXPECT_NEAR(stage.middle().x, r.want, 0.03f) << r.x;
+    }
+}
+
 TEST(Render, ShadowRaysAreColouredByAllTheyGoThrough)
 {
     Stage::Values const pane{{"u_reflectance", 0.5f}, {"u_refractColor", Vec3f(0.8f, 0.5f, 1)}};
@@ -178,6 +196,20 @@ TEST(Render, AnIgnoredHitIsAsIfNothingWereThere)
     }));
     stage.watch({0, 0, 0}, {0, 0, 4});
     expectNear(stage.middle(), {1, 0, 4, 1}, 0, "type, depth, z of the ray's origin");
+}
+
+TEST(Render, AContinuedRayKeepsItsDepth)
+{
+    Stage stage;
+    stage.card(stage.probe(
+                   [](IShaderAPI* api, ShadeState& s) { s.Ci = api->traceThrough(&s.P, &s.I, 1); }),
+               2);
+    stage.card(stage.probe([](IShaderAPI*, ShadeState& s) {
+        s.Ci = {static_cast<float>(s.rayType), static_cast<float>(s.rayDepth), s.E.z, 1};
+    }));
+    stage.watch({0, 0, 0}, {0, 0, 4});
+    expectNear(stage.middle(), {kRayTransmission, 0, 2, 1}, 0,
+               "type, depth, z of the ray's origin");
 }
 
 TEST(Render, AMirrorSeesTheEnvironmentAndNothingThatHidesFromIt)
