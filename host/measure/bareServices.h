@@ -1,0 +1,45 @@
+// SPDX-License-Identifier: Apache-2.0
+/// Services of a shading call where there is a surface and nothing else.
+#pragma once
+
+#include "sampling/sampler.h"
+#include "shading/noise.h"
+
+#include <zsi/zsi.h>
+
+namespace zsi::host {
+
+/// Random numbers and noise as in a rendering; no lights, and every ray sees black and is free.
+class BareServices final : public IShaderAPI {
+public:
+    /// Random numbers come from `sampler`, which must outlive this.
+    explicit BareServices(Sampler& sampler)
+        : sampler_(sampler)
+    {
+    }
+
+    using V = Vec3f const*;
+    LightSample* getLightSamples(int, V, V) override { return nullptr; }
+    Vec3f ambientLight(V, V) override { return {0, 0, 0}; }
+    Vec3f shadowTransmission(V, V) override { return {1, 1, 1}; }
+    Vec3f traceContinue(int, V, V, float) override { return {0, 0, 0}; }
+    Vec3f traceReflection(V, V, float) override { return {0, 0, 0}; }
+    Vec4f traceThrough(V, V, float) override { return {0, 0, 0, 0}; }
+    Vec3f traceSpecular(V, V, float, float) override { return {0, 0, 0}; }
+    Vec3f traceRefraction(V, V, float, float) override { return {0, 0, 0}; }
+    Vec3f occlusion(V, V, float) override { return {1, 1, 1}; }
+    Vec3f indirectDiffuse(V, V, float) override { return {0, 0, 0}; }
+    float random() override { return sampler_.next(); }
+    Vec2f random2D() override { return sampler_.next2D(); }
+    float cellNoise1D(float x) override { return host::cellNoise1D(x); }
+    float noise2D(Vec2f const* p) override { return host::noise2D(*p); }
+    float noise3DPoint(V p) override { return signedNoise3D(*p); }
+    float noise3D(Vec4f const* p) override { return noise4D(*p); }
+    float noise3DRecord(V p) override { return host::noise3D(*p); }
+    Vec3f cellNoise3D(V p) override { return host::cellNoise3D(*p); }
+
+private:
+    Sampler& sampler_;
+};
+
+} // namespace zsi::host
