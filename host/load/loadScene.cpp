@@ -44,8 +44,10 @@ void read(JsonReader const& root, SceneBuilder& builder)
         for (auto const& [name, instance] : v->members())
             readInstance(instance, builder);
     if (auto const v = root.find("lights"))
-        for (auto const& [name, light] : v->members())
+        for (auto const& [name, light] : v->members()) {
             readLight(light, builder);
+            builder.scene.lightNames.push_back(name);
+        }
     if (auto const v = root.find("environment"))
         readEnvironment(*v, builder);
     builder.dropWholeMeshes();

@@ -125,6 +125,7 @@ struct Scene {
     std::vector<Instance> instances;
     std::vector<std::string> instanceNames; ///< for mattes; may be shorter
     std::vector<Light> lights;
+    std::vector<std::string> lightNames; ///< may be shorter
     std::optional<Shader> environment; ///< none: black
     /// The camera sees the environment as a ray does that has reached its depth, which for some
     /// shaders is the picture that is reflected.
