@@ -1,6 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
-# What `cmake --install` puts below the prefix. Two components: `runtime`, the command and the
-# shaders; `development`, what others compile and link against.
+# What `cmake --install` puts below the prefix. Components: `runtime`, the command and the
+# shaders; `development`, what others compile and link against; `python`, the Python package.
 include(CMakePackageConfigHelpers)
 include(${CMAKE_CURRENT_LIST_DIR}/hostDependencies.cmake)
 
@@ -56,9 +56,20 @@ if(ZSI_BUILD_HOST)
     install(DIRECTORY scenes assets DESTINATION ${CMAKE_INSTALL_DATADIR}/zsi COMPONENT runtime)
 endif()
 
+if(ZSI_BUILD_PYTHON)
+    install(TARGETS _core LIBRARY DESTINATION ${ZSI_INSTALL_PYTHONDIR}/zsi COMPONENT python)
+    install(DIRECTORY ${PROJECT_BINARY_DIR}/python/zsi DESTINATION ${ZSI_INSTALL_PYTHONDIR}
+        COMPONENT python FILES_MATCHING PATTERN *.py PATTERN *.pyi PATTERN py.typed
+        PATTERN __pycache__ EXCLUDE)
+endif()
+
 set(doc_dir ${CMAKE_INSTALL_DATADIR}/doc)
 install(FILES LICENSE DESTINATION ${doc_dir}/zsi RENAME copyright COMPONENT runtime)
 install(FILES README.md CHANGELOG.md DESTINATION ${doc_dir}/zsi COMPONENT runtime)
 install(DIRECTORY docs DESTINATION ${doc_dir}/zsi COMPONENT runtime)
 install(FILES LICENSE DESTINATION ${doc_dir}/zsi-dev RENAME copyright COMPONENT development)
 install(DIRECTORY examples DESTINATION ${doc_dir}/zsi-dev COMPONENT development)
+if(ZSI_BUILD_PYTHON)
+    install(FILES LICENSE DESTINATION ${doc_dir}/python3-zsi RENAME copyright COMPONENT python)
+    install(DIRECTORY python/notebooks DESTINATION ${doc_dir}/python3-zsi COMPONENT python)
+endif()

@@ -32,6 +32,17 @@ zsi=$prefix/bin/zsi
 "$zsi" info >classes
 [ "$(wc -l <classes)" -eq "$(grep -c '^class ' "$source/tests/data/catalogue.txt")" ] ||
     fail "not all classes: $(cat classes)"
+# The Python package below the prefix finds the installed shaders; so does a wheel its own.
+count='import zsi; print(len(zsi.classes()), zsi.__file__)'
+if [ -d "$build/python" ]; then
+    package=$(dirname "$(dirname "$(find "$prefix" -path '*/zsi/_core*.so')")")
+    PYTHONPATH=$package /usr/bin/python3 -c "$count" >python.txt
+    [ "$(cat python.txt)" = "$(wc -l <classes) $package/zsi/__init__.py" ] || fail "$(cat python.txt)"
+    "$cmake" --build "$build" --target wheel >wheel.log || fail "$(cat wheel.log)"
+    /usr/bin/python3 -m zipfile -e "$build"/zsi-*.whl wheel
+    PYTHONPATH=wheel /usr/bin/python3 -c "$count" >wheel.txt
+    [ "$(cat wheel.txt)" = "$(wc -l <classes) $work/wheel/zsi/__init__.py" ] || fail "$(cat wheel.txt)"
+fi
 "$zsi" info voSpotLight >spot
 has "linear RGB" spot
 "$zsi" render "$prefix/share/zsi/scenes/demo.json" -o demo.png --size 32x18 --samples 1 >demo.log
@@ -129,6 +140,11 @@ done
 for package in "zsi (= " libembree-dev libopenimageio-dev libfmt-dev; do
     has "$package" development
 done
+if [ -d "$build/python" ]; then
+    dpkg-deb -f deb/python3-zsi_*.deb Depends >python
+    has "python3-numpy" python
+    has libembree3 python
+fi
 dpkg-deb -c deb/zsi_*.deb >content
 has ./usr/bin/zsi content
 has zephyrShaders64.so content
