@@ -13,6 +13,10 @@ namespace {
 constexpr float kFullImportance = 1.0f / 32.0f;
 /// From this depth on that goes for all that count less than 1, so that chains end by themselves.
 constexpr std::uint32_t kRouletteDepth = 3;
+/// Of a camera sample that has sent out more rays than this, further ones are traced with a chance
+/// that falls with their number: materials that send on more light than they get, by several rays
+/// each, would otherwise double their number with every bounce.
+constexpr float kFullRays = 256.0f;
 /// A shadow ray that went through so many surfaces is taken for blocked.
 constexpr int kMaxShadowSurfaces = 256;
 /// Shadow segments end a little before their goal, which may be a surface.
@@ -209,6 +213,19 @@ Vec3f ShadingContext::transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMa
     return {0, 0, 0};
 }
 
+bool ShadingContext::isSent(float& scale)
+{
+    float const all = kFullRays * static_cast<float>(std::max(1, settings_.indirectSamples));
+    if (sent_ >= all) {
+        float const chance = all / (sent_ + 1.0f);
+        if (!(sampler_->next() < chance))
+            return false;
+        scale /= chance;
+    }
+    sent_ += 1.0f;
+    return true;
+}
+
 bool ShadingContext::depart(Vec3f const* origin, Vec3f const* direction, PathRay& ray) const
 {
     if (!call_ || !isFinite(*origin))
@@ -232,12 +249,14 @@ bool ShadingContext::child(Vec3f const* origin, Vec3f const* direction, float im
     ray.depth += 1;
     ray.importance *= importance < 1.0f ? importance : 1.0f;
     scale = 1.0f;
+    if (!isSent(scale))
+        return false;
     float const full = ray.depth > kRouletteDepth ? 1.0f : kFullImportance;
     if (ray.importance < full) {
         float const chance = ray.importance / full;
         if (!(sampler_->next() < chance))
             return false;
-        scale = 1.0f / chance;
+        scale /= chance;
         ray.importance = full;
     }
     ray.scatteredAt = *origin;
@@ -256,13 +275,14 @@ bool ShadingContext::child(Vec3f const* origin, Vec3f const* direction, float im
 }
 
 bool ShadingContext::continuation(Vec3f const* origin, Vec3f const* direction, float importance,
-                                  PathRay& ray) const
+                                  PathRay& ray, float& scale)
 {
+    scale = 1.0f;
     if (!depart(origin, direction, ray))
         return false;
     ray.passes += 1;
     ray.importance *= importance < 1.0f ? maxOf(importance, 0.0f) : 1.0f;
-    return true;
+    return isSent(scale);
 }
 
 Vec3f ShadingContext::traceContinue(int rayType, Vec3f const* origin, Vec3f const* direction,
@@ -271,10 +291,11 @@ Vec3f ShadingContext::traceContinue(int rayType, Vec3f const* origin, Vec3f cons
     if (call_ && call_->answers_ != Answers::All)
         return rgb(traceThrough(origin, direction, importance));
     PathRay ray;
-    if (!continuation(origin, direction, importance, ray))
+    float scale;
+    if (!continuation(origin, direction, importance, ray, scale))
         return {0, 0, 0};
     ray.type = static_cast<std::uint32_t>(rayType);
-    return rgb(answered(ray));
+    return rgb(answered(ray)) * scale;
 }
 
 Vec4f ShadingContext::traceThrough(Vec3f const* P, Vec3f const* I, float importance)
@@ -284,11 +305,12 @@ Vec4f ShadingContext::traceThrough(Vec3f const* P, Vec3f const* I, float importa
         return call_->answers_ == Answers::Behind ? Vec4f(1, 1, 1, 0) : Vec4f(0, 0, 0, 1);
     }
     PathRay ray;
-    if (!continuation(P, I, importance, ray))
+    float scale;
+    if (!continuation(P, I, importance, ray, scale))
         return {0, 0, 0, 0};
     if (ray.type == kRayCamera)
         ray.type = kRayTransmission;
-    return answered(ray);
+    return answered(ray) * scale;
 }
 
 Vec3f ShadingContext::traceReflection(Vec3f const* origin, Vec3f const* direction, float importance)

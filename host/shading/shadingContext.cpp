@@ -69,6 +69,7 @@ void ShadingContext::start(Sampler& sampler, float rasterX, float rasterY, bool 
     sampler_ = &sampler;
     rasterX_ = rasterX;
     rasterY_ = rasterY;
+    sent_ = 0.0f;
     hasFirstHit_ = false;
 }
 

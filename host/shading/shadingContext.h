@@ -215,8 +215,10 @@ private:
     bool child(Vec3f const* origin, Vec3f const* direction, float importance, PathRay& ray,
                float& scale);
     /// A ray that goes on straight; false when there is none to trace.
-    bool continuation(Vec3f const* origin, Vec3f const* direction, float importance,
-                      PathRay& ray) const;
+    bool continuation(Vec3f const* origin, Vec3f const* direction, float importance, PathRay& ray,
+                      float& scale);
+    /// Whether one more ray of the camera sample is traced, `scale` made up for those that are not.
+    bool isSent(float& scale);
     Vec3f traceLobe(Vec3f const* origin, Vec3f const* direction, float spread, float turn,
                     float importance);
     /// Light along a ray drawn from a lobe at the running call's surface, together with what a
@@ -242,6 +244,7 @@ private:
     bool keepsParts_ = false;
     LightParts parts_ = {};
     Arrived arrived_ = {};
+    float sent_ = 0.0f; ///< rays that services have sent out for the camera sample
     FirstHit firstHit_ = {};
     bool hasFirstHit_ = false;
     std::uint64_t rays_ = 0;

@@ -274,20 +274,21 @@ TEST(Render, ChainsOfRaysEndAtRandomWithoutLoss)
     // Two cards that face each other glow with 1 and send on what they see: a geometric series, cut
     // off where the depth ends.
     struct Row {
-        float kept;
-        int depth, samples;
+        float kept, importance;
+        int rays, depth, samples;
         float want, tolerance;
     };
-    for (Row const& r : {Row{0.5f, 2, 1, 1.75f, 1e-5f}, Row{0.9f, 1, 1, 1.9f, 1e-5f},
-                         Row{0.8f, 1000, 256, 5, 0.1f}, Row{0.01f, 1000, 64, 1.0101f, 0.003f}}) {
+    for (Row const& r :
+         {Row{0.5f, 0.5f, 1, 2, 1, 1.75f, 1e-5f}, Row{0.9f, 0.9f, 1, 1, 1, 1.9f, 1e-5f},
+          Row{0.8f, 0.8f, 1, 1000, 256, 5, 0.1f}, Row{0.01f, 0.01f, 1, 1000, 64, 1.0101f, 0.003f},
+          // Rays that say they count for all, and fork: 2^1000 if nothing ended them.
+          Row{0.25f, 1.5f, 2, 1000, 16, 2, 0.1f}}) {
         auto const glow = [&](IShaderAPI* api, ShadeState& s) {
             Vec3f const back = -s.I;
-            s.Ci = withAlpha(kWhite
-                                 + (s.rayDepth < static_cast<std::uint32_t>(r.depth)
-                                        ? api->traceReflection(&s.P, &back, r.kept)
-                                        : Vec3f(0, 0, 0))
-                                     * r.kept,
-                             1);
+            Vec3f sent(0, 0, 0);
+            for (int i = 0; i < r.rays && s.rayDepth < static_cast<std::uint32_t>(r.depth); ++i)
+                sent += api->traceReflection(&s.P, &back, r.importance) * r.kept;
+            s.Ci = withAlpha(kWhite + sent, 1);
         };
         Stage stage;
         stage.scene.settings.maxDepth = r.depth + 1;
