@@ -6,6 +6,7 @@
 #include "plugin/shaderLibrary.h"
 
 #include <functional>
+#include <optional>
 #include <stdexcept>
 #include <string>
 
@@ -30,6 +31,14 @@ struct Subcommand {
 Subcommand addInfo(CLI::App& app, std::string const& shaderPath);
 Subcommand addRender(CLI::App& app, std::string const& shaderPath);
 Subcommand addSchema(CLI::App& app, std::string const& shaderPath);
+Subcommand addDenoise(CLI::App& app);
+
+/// The options of how 8-bit pictures show light.
+struct ViewOptions {
+    std::optional<std::string> view;
+    std::string ocioConfig;
+};
+void addViewOptions(CLI::App& command, ViewOptions& options);
 
 /// All shader libraries; those that cannot be used lead to warnings on stderr.
 host::ShaderLibraries loadLibraries(std::string const& shaderPath);

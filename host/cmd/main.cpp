@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "base/error.h"
 #include "cmd/command.h"
+#include "film/screenTransform.h"
 
 #include <CLI/CLI.hpp>
 #include <cerrno>
@@ -8,6 +9,7 @@
 #include <cstdio>
 #include <cstring>
 #include <fmt/format.h>
+#include <fmt/ranges.h>
 #include <new>
 #include <unistd.h>
 
@@ -68,7 +70,7 @@ int run(int argc, char** argv)
                    "installed one")
         ->type_name("FOLDER[:FOLDER]");
     Subcommand const subcommands[] = {addInfo(app, shaderPath), addRender(app, shaderPath),
-                                      addSchema(app, shaderPath)};
+                                      addSchema(app, shaderPath), addDenoise(app)};
     app.footer("Exit status: 0 done, 1 bad input, 2 bad command line, 130 interrupted.");
 
     try {
@@ -81,7 +83,7 @@ int run(int argc, char** argv)
     for (Subcommand const& subcommand : subcommands)
         if (subcommand.app->parsed())
             return subcommand.run();
-    throw UsageError("a subcommand is missing: info, render or schema (zsi --help)");
+    throw UsageError("a subcommand is missing: info, render, denoise or schema (zsi --help)");
 }
 
 } // namespace
@@ -93,6 +95,20 @@ host::ShaderLibraries loadLibraries(std::string const& shaderPath)
         for (std::string const& leftOut : libraries.loadDirectory(folder))
             warn(leftOut);
     return libraries;
+}
+
+void addViewOptions(CLI::App& command, ViewOptions& options)
+{
+    command
+        .add_option("--view", options.view,
+                    "How 8-bit pictures show light: a tone curve or a view of the OpenColorIO "
+                    "config")
+        ->type_name(fmt::format("{}|[DISPLAY/]VIEW", fmt::join(host::toneCurveNames(), "|")));
+    command
+        .add_option("--ocio", options.ocioConfig,
+                    "OpenColorIO config: its default view shows 8-bit pictures that name no other")
+        ->envname("OCIO")
+        ->type_name("FILE");
 }
 
 void print(std::string const& text)

@@ -5,6 +5,7 @@
 #include "cmd/command.h"
 #include "cmd/interruption.h"
 #include "cmd/progressBar.h"
+#include "denoise/denoise.h"
 #include "film/imageFile.h"
 #include "integrate/integrators.h"
 #include "integrate/layers.h"
@@ -41,8 +42,8 @@ struct Arguments {
     std::optional<std::int64_t> seed;
     std::optional<int> textureCache; ///< megabytes
     std::string integrator;
-    std::optional<std::string> view;
-    std::string ocioConfig;
+    ViewOptions view;
+    bool denoise = false;
     std::vector<std::string> layers, assignments;
     bool quiet = false, verbose = false;
 };
@@ -176,8 +177,12 @@ host::Scene load(Arguments const& arguments, host::ShaderLibraries const& librar
         scene.settings.integrator = arguments.integrator;
     if (!arguments.layers.empty())
         scene.film.layers = arguments.layers;
-    if (arguments.view)
-        scene.film.view = *arguments.view;
+    if (arguments.denoise
+        && std::find(scene.film.layers.begin(), scene.film.layers.end(), "halves")
+            == scene.film.layers.end())
+        scene.film.layers.push_back("halves");
+    if (arguments.view.view)
+        scene.film.view = *arguments.view.view;
     return scene;
 }
 
@@ -212,7 +217,7 @@ int render(Arguments const& arguments, std::string const& shaderPath)
     Reporter reporter(arguments);
     host::ShaderLibraries const libraries = loadLibraries(shaderPath);
     host::Scene const scene = load(arguments, libraries);
-    host::ScreenView const view = host::screenView(scene.film, arguments.ocioConfig);
+    host::ScreenView const view = host::screenView(scene.film, arguments.view.ocioConfig);
     host::screenTransform(view); // refuses what it cannot show before the picture is rendered
     for (std::string const& warning : scene.warnings)
         reporter.warning(warning);
@@ -241,6 +246,14 @@ int render(Arguments const& arguments, std::string const& shaderPath)
         job.cancel = &interrupted;
         report = session.render(film, job);
         picture = host::developed(film, scene);
+        if (arguments.denoise) {
+            host::DenoiseOptions options;
+            options.threads = arguments.threads;
+            options.cancel = &interrupted;
+            options.progress = [&](double done) { bar.show("denoising", done); };
+            if (auto result = host::denoised(picture, options))
+                picture = std::move(*result);
+        }
         reporter.detail(fmt::format("rendered with \"{}\"", scene.settings.integrator));
     } catch (host::Cancelled const&) {
         // Told below, as an interruption while rendering is.
@@ -293,16 +306,9 @@ Subcommand addRender(CLI::App& app, std::string const& shaderPath)
         ->check(CLI::Range(std::int64_t(0), kMaxSeed));
     command->add_option("--integrator", arguments->integrator, "How light is gathered")
         ->type_name(fmt::format("{}", fmt::join(host::integratorNames(), "|")));
-    command
-        ->add_option("--view", arguments->view,
-                     "How 8-bit pictures show light: a tone curve or a view of the OpenColorIO "
-                     "config")
-        ->type_name(fmt::format("{}|[DISPLAY/]VIEW", fmt::join(host::toneCurveNames(), "|")));
-    command
-        ->add_option("--ocio", arguments->ocioConfig,
-                     "OpenColorIO config: its default view shows 8-bit pictures that name no other")
-        ->envname("OCIO")
-        ->type_name("FILE");
+    addViewOptions(*command, arguments->view);
+    command->add_flag("--denoise", arguments->denoise,
+                      "Take the noise out of the picture; keeps both of its halves apart");
     command
         ->add_option("--layers", arguments->layers,
                      "Layers of an .exr beside the beauty: "

@@ -164,4 +164,58 @@ void writePicture(std::filesystem::path const& file, Picture const& picture, Scr
     goal.commit();
 }
 
+Picture readPicture(std::filesystem::path const& file)
+{
+    auto const bad = [&](std::string const& why) -> InputError {
+        return InputError(file.string() + ": " + why);
+    };
+    if (kindOf(file) != Kind::Exr)
+        throw bad("has no layers; expected an .exr file");
+    auto const input = OIIO::ImageInput::open(file.string());
+    if (!input)
+        throw bad(OIIO::geterror());
+    OIIO::ImageSpec const& spec = input->spec();
+    if (spec.deep || spec.depth > 1)
+        throw bad("expected a flat picture");
+    auto const channels = static_cast<std::size_t>(spec.nchannels);
+    auto const pixels =
+        static_cast<std::size_t>(spec.width) * static_cast<std::size_t>(spec.height);
+    std::vector<float> values(pixels * channels);
+    if (!input->read_image(0, 0, 0, -1, OIIO::TypeDesc::FLOAT, values.data()))
+        throw bad(input->geterror());
+    Picture picture{spec.full_width,
+                    spec.full_height,
+                    {spec.x, spec.y, spec.x + spec.width, spec.y + spec.height},
+                    {{"beauty", {}, {}}}};
+    std::vector<std::vector<std::size_t>> from(1); // each layer's channels in the file
+    for (std::size_t c = 0; c < channels; ++c) {
+        std::string const& name = spec.channelnames[c];
+        std::size_t const dot = name.rfind('.');
+        std::string const layer = dot == std::string::npos ? "beauty" : name.substr(0, dot);
+        std::size_t l = 0;
+        while (l < picture.layers.size() && picture.layers[l].name != layer)
+            ++l;
+        if (l == picture.layers.size()) {
+            picture.layers.push_back({layer, {}, {}});
+            from.emplace_back();
+        }
+        picture.layers[l].channels.push_back(dot == std::string::npos ? name
+                                                                      : name.substr(dot + 1));
+        from[l].push_back(c);
+    }
+    if (picture.layers.front().channels != std::vector<std::string>{"R", "G", "B", "A"})
+        throw bad("expected the channels R, G, B and A");
+    for (std::size_t l = 0; l < from.size(); ++l) {
+        picture.layers[l].values.reserve(pixels * from[l].size());
+        for (std::size_t i = 0; i < pixels; ++i)
+            for (std::size_t c : from[l])
+                picture.layers[l].values.push_back(values[i * channels + c]);
+    }
+    // Those of layers have a slash; the others tell of the file itself.
+    for (OIIO::ParamValue const& line : spec.extra_attribs)
+        if (line.type() == OIIO::TypeDesc::STRING && line.name().find('/') != std::string::npos)
+            picture.attachments.push_back({line.name().string(), line.get_string()});
+    return picture;
+}
+
 } // namespace zsi::host

@@ -141,6 +141,23 @@ TEST_F(Command, RendersTheSceneAndOptionsOverrideIt)
     EXPECT_EQ(files().size(), before_.size() + 5) << "nothing but the pictures";
 }
 
+TEST_F(Command, DenoisesAfterRenderingOrLater)
+{
+    std::string const render = "render scene.json --layers halves,depth,objectId --samples 5 ";
+    zsi(render + "-o noisy.exr");
+    Result const later = zsi("denoise noisy.exr -o later.exr");
+    expectContains(later.out, {"later.exr: 32x32, denoised"});
+    zsi(render + "--denoise --threads 3 -o now.exr");
+    // The same file: the other layers and their texts have come through as well.
+    EXPECT_TRUE(content(folder_.path / "later.exr") == content(folder_.path / "now.exr"));
+    EXPECT_FALSE(content(folder_.path / "later.exr") == content(folder_.path / "noisy.exr"));
+    zsi("render scene.json -o plain.exr");
+    Result const plain = zsi("denoise plain.exr -o nothing.png");
+    EXPECT_EQ(plain.status, 1);
+    expectContains(plain.err, {"plain.exr", "halfA", "--layers halves"});
+    EXPECT_FALSE(fs::exists(folder_.path / "nothing.png"));
+}
+
 TEST_F(Command, ProgressFitsTheTerminal)
 {
     for (unsigned short const columns : std::array<unsigned short, 2>{30, 100}) {
@@ -176,7 +193,7 @@ TEST_F(Command, BadCallsEndInOneLineAndLeaveNothing)
     };
     std::string const render = "render scene.json -o a.png ";
     Call const calls[] = {
-        {"", 2, {"info, render or schema"}},
+        {"", 2, {"info, render, denoise or schema"}},
         {"rendr scene.json", 2, {"rendr", "did you mean render?"}},
         {"info a b", 2, {"unexpected argument"}},
         {"--threads 2 render scene.json -o a.png", 2, {"behind the subcommand"}},
