@@ -149,6 +149,31 @@ TEST(Agreement, PathsShowWhatShadingShows)
         }
 }
 
+TEST(Agreement, GlassFollowsBeerAndSchlick)
+{
+    for (char const* integrator : {"shade", "path"}) {
+        Stage stage;
+        stage.sky(kWhiteSky);
+        stage.slab(stage.material("corvid_Mtl_Dielectric",
+                                  {{"u_reflectance", 0.0f},
+                                   {"u_falloffEnable", true},
+                                   {"u_absorptionCoef", Vec3f(0.5f, 1, 2)}}),
+                   0, 0.4f, 2);
+        stage.scene.settings.samples = 16;
+        // Refracted at sin = 0.8 / 1.52, so that the way inside is 0.4 / cos of that.
+        stage.watch({0, 0, 0}, {0.8f, 0, 0.6f});
+        float const way = 0.4f / std::sqrt(1 - 0.64f / (1.52f * 1.52f));
+        // Schlick at a cosine of 0.6: 0.4^5 is reflected.
+        float const F = 0.01024f;
+        Estimate const seen = estimate(stage, integrator);
+        float const* const got[] = {&seen.mean.x, &seen.mean.y, &seen.mean.z};
+        for (int i = 0; i < 3; ++i) {
+            float const kept = std::pow(10.0f, -0.5f * static_cast<float>(1 << i) * way);
+            EXPECT_NEAR(*got[i], F + (1 - F) * kept, 4 * seen.error + 2e-3f) << integrator << i;
+        }
+    }
+}
+
 TEST(Agreement, LightThroughALeafCountsOnce)
 {
     // Half of the light that a disc of radius 1 sends from 2 above comes out below: 3 / 2 of 1 / 5.
