@@ -15,6 +15,8 @@ constexpr double kWorthwhile = 0.05;
 /// A cell has this share of its neighbours' light too: what a small lamp has beyond the directions
 /// asked for would else be left to chance.
 constexpr double kBeyond = 1.0 / 64;
+/// Parts of [0, 1) whose first cells are known (Chen and Asau 1974).
+constexpr int kParts = 128;
 constexpr float kPi = 3.14159265f;
 
 /// Cells of equal height in the cosine have one solid angle.
@@ -29,14 +31,27 @@ Vec3f direction(float column, float row)
 
 int clampedIndex(float x, int n) { return std::clamp(static_cast<int>(x), 0, n - 1); }
 
-/// The first entry above `u` of `n` ascending shares that end with 1; `rest` is the place within.
-int pick(float const* shares, int n, float u, float& rest)
+/// The first entry above `u` of ascending shares that end with 1, not before `i`, and the last one
+/// at the end; `rest` is the place within.
+int pick(float const* shares, int n, int i, float u, float& rest)
 {
-    auto const i = static_cast<int>(std::upper_bound(shares, shares + n - 1, u) - shares);
+    while (i < n - 1 && !(shares[i] > u))
+        ++i;
     float const before = i > 0 ? shares[i - 1] : 0.0f;
     float const share = shares[i] - before;
     rest = share > 0.0f ? clamp((u - before) / share, 0.0f, 1.0f) : 0.5f;
     return i;
+}
+
+/// For kParts equal parts of [0, 1) the first entry above their beginnings.
+void addFirsts(float const* shares, int n, std::vector<std::uint16_t>& firsts)
+{
+    int i = 0;
+    for (int part = 0; part < kParts; ++part) {
+        while (i < n - 1 && !(shares[i] > static_cast<float>(part) / kParts))
+            ++i;
+        firsts.push_back(static_cast<std::uint16_t>(i));
+    }
 }
 
 } // namespace
@@ -87,16 +102,23 @@ DirectionMap::DirectionMap(std::function<float(Vec3f)> const& radiance)
         }
         before += inRow;
         rows_.push_back(static_cast<float>(before / above));
+        addFirsts(&columns_[static_cast<std::size_t>(y) * kWidth], kWidth, first_);
     }
+    addFirsts(rows_.data(), kHeight, first_);
 }
 
-Vec3f DirectionMap::sample(Vec2f u) const
+DirectionMap::Drawn DirectionMap::sample(Vec2f u) const
 {
+    auto const first = [&](int row, float x) {
+        return int(
+            first_[static_cast<std::size_t>(row * kParts + clampedIndex(x * kParts, kParts))]);
+    };
     float inRow, inColumn;
-    int const row = pick(rows_.data(), kHeight, u.y, inRow);
-    int const column =
-        pick(&columns_[static_cast<std::size_t>(row) * kWidth], kWidth, u.x, inColumn);
-    return direction(static_cast<float>(column) + inColumn, static_cast<float>(row) + inRow);
+    int const row = pick(rows_.data(), kHeight, first(kHeight, u.y), u.y, inRow);
+    int const column = pick(&columns_[static_cast<std::size_t>(row) * kWidth], kWidth,
+                            first(row, u.x), u.x, inColumn);
+    return {direction(static_cast<float>(column) + inColumn, static_cast<float>(row) + inRow),
+            cellDensity(row, column)};
 }
 
 float DirectionMap::density(Vec3f d) const

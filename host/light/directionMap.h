@@ -2,6 +2,7 @@
 /// Directions drawn in proportion to a radiance.
 #pragma once
 
+#include <cstdint>
 #include <functional>
 #include <vector>
 #include <zsi/vecmath.h>
@@ -19,8 +20,12 @@ public:
     explicit DirectionMap(std::function<float(Vec3f)> const& radiance);
 
     bool isEmpty() const { return rows_.empty(); }
+    struct Drawn {
+        Vec3f direction;
+        float density; ///< 1/sr
+    };
     /// A unit direction for `u` in [0, 1)^2; neighbours stay neighbours.
-    Vec3f sample(Vec2f u) const;
+    Drawn sample(Vec2f u) const;
     float density(Vec3f d) const; ///< of `sample` at unit `d`, 1/sr
 
 private:
@@ -28,6 +33,9 @@ private:
 
     std::vector<float> rows_; ///< shares up to and with each row
     std::vector<float> columns_; ///< shares up to and with each cell within its row
+    /// For equal parts of [0, 1) the first cell of the row, and behind the rows the first row, with
+    /// a share above it: where the search for a cell begins.
+    std::vector<std::uint16_t> first_;
 };
 
 } // namespace zsi::host

@@ -15,14 +15,15 @@ constexpr std::uint32_t reverseBits(std::uint32_t x)
     return (x >> 16) | (x << 16);
 }
 
-/// Second Sobol dimension; the first is the reversed index.
-constexpr std::uint32_t sobolSecond(std::uint32_t index)
+/// Second Sobol dimension with its bits reversed; the first is the index itself. The matrix is
+/// Pascal's triangle modulo 2, which is made of itself at half the size.
+constexpr std::uint32_t sobolSecond(std::uint32_t x)
 {
-    std::uint32_t result = 0;
-    for (std::uint32_t column = 1u << 31; index; index >>= 1, column ^= column >> 1)
-        if (index & 1u)
-            result ^= column;
-    return result;
+    x ^= x >> 16;
+    x ^= (x & 0xff00ff00u) >> 8;
+    x ^= (x & 0xf0f0f0f0u) >> 4;
+    x ^= (x & 0xccccccccu) >> 2;
+    return x ^ (x & 0xaaaaaaaau) >> 1;
 }
 
 /// Permutes so that each bit depends on the lower ones alone, as nested scrambling does from the
@@ -37,23 +38,25 @@ constexpr std::uint32_t permuteUpwards(std::uint32_t x, std::uint32_t seed)
     return x;
 }
 
-constexpr std::uint32_t owenScramble(std::uint32_t x, std::uint32_t seed)
-{
-    return reverseBits(permuteUpwards(reverseBits(x), seed));
-}
-
 /// A shuffled order of the indices keeps every aligned run of 2^k together, so that the points of
 /// two dimension pairs are unrelated while each stays well spread.
 constexpr std::uint32_t shuffled(std::uint32_t index, std::uint32_t seed)
 {
-    return owenScramble(index, seed);
+    return reverseBits(permuteUpwards(reverseBits(index), seed));
 }
+
+/// A Sobol number with its bits reversed, scrambled as nested intervals are.
+float scrambled(std::uint32_t reversed, std::uint32_t seed)
+{
+    return toUnitFloat(reverseBits(permuteUpwards(reversed, hash32(seed))));
+}
+
+constexpr std::uint32_t kFirst = 0x68bc21ebu, kSecond = 0x02e5be93u;
 
 Vec2f point(std::uint32_t index, std::uint32_t seed)
 {
     std::uint32_t const i = shuffled(index, seed);
-    return {toUnitFloat(owenScramble(reverseBits(i), hash32(seed ^ 0x68bc21ebu))),
-            toUnitFloat(owenScramble(sobolSecond(i), hash32(seed ^ 0x02e5be93u)))};
+    return {scrambled(i, seed ^ kFirst), scrambled(sobolSecond(i), seed ^ kSecond)};
 }
 
 } // namespace
@@ -75,8 +78,7 @@ std::uint32_t Sampler::nextSeed() { return hashCombine(pixelSeed_, dimension_++)
 float Sampler::next()
 {
     std::uint32_t const seed = nextSeed();
-    std::uint32_t const i = shuffled(index_, seed);
-    return toUnitFloat(owenScramble(reverseBits(i), hash32(seed ^ 0x68bc21ebu)));
+    return scrambled(shuffled(index_, seed), seed ^ kFirst);
 }
 
 Vec2f Sampler::next2D() { return point(index_, nextSeed()); }

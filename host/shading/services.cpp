@@ -129,7 +129,7 @@ float ShadingContext::lobeDensity(Vec3f L)
 bool ShadingContext::askSky(Vec3f normal, LightSample& sample)
 {
     DirectionMap const& map = scene_.sky(kRayReflection);
-    Vec3f const d = map.sample(sampler_->next2D());
+    auto const [d, drawn] = map.sample(sampler_->next2D());
     float const cosine = dot(d, normal);
     if (!(cosine > 0.0f))
         return false;
@@ -144,7 +144,7 @@ bool ShadingContext::askSky(Vec3f normal, LightSample& sample)
         return false;
     sample = {};
     sample.L = d;
-    sample.color = light / (3.14159265f * (map.density(d) + lobe));
+    sample.color = light / (3.14159265f * (drawn + lobe));
     sample.shadow = {1, 1, 1};
     sample.weight = minOf(cosine, 1.0f);
     return true;
@@ -483,8 +483,12 @@ Vec3f ShadingContext::rayStart(Vec3f origin, Vec3f direction) const
 
 Vec3f ShadingContext::shadowStart(Vec3f origin, Vec3f direction) const
 {
-    if (call_ && origin == call_->surface.P && dot(direction, call_->surface.Ng) > 0.0f)
-        return offsetPoint(call_->surface.smoothP, call_->surface.Ng);
+    if (call_ && origin == call_->surface.P && dot(direction, call_->surface.Ng) > 0.0f) {
+        if (!call_->smoothStart_)
+            call_->smoothStart_ =
+                offsetPoint(scene_.rays().smoothPoint(call_->surface), call_->surface.Ng);
+        return *call_->smoothStart_;
+    }
     return rayStart(origin, direction);
 }
 

@@ -188,7 +188,7 @@ void ShadingContext::examine(PreparedMaterial const& material, Findings& finding
     s.N = s.Ng = s.objectN = trial.N;
     // Near and far: projected maps have a depth.
     float const reach = std::exp2(12.0f * sampler_->next() - 4.0f);
-    s.P = s.smoothP = s.objectP = Vec3f(trial.P.x, trial.P.y, sampler_->next()) * reach;
+    s.P = s.objectP = Vec3f(trial.P.x, trial.P.y, sampler_->next()) * reach;
     PathRay ray;
     ray.direction = sampler_->next() < 0.5f ? trial.I : -trial.I;
     ray.E = s.P - ray.direction;
@@ -197,6 +197,7 @@ void ShadingContext::examine(PreparedMaterial const& material, Findings& finding
     ShadeState& state = call.state;
     std::memcpy(state.attributes, trial.attributes, sizeof state.attributes);
 
+    call.smoothStart_ = s.P; // the place is of no mesh
     call.answers_ = Answers::None;
     material.shader->shade(this, state);
     Vec3f const shown = rgb(state.Ci);

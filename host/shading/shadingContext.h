@@ -7,6 +7,7 @@
 #include "shading/pathRay.h"
 #include "shading/preparedScene.h"
 
+#include <optional>
 #include <zsi/vecmath.h>
 
 namespace zsi::host {
@@ -127,6 +128,7 @@ public:
         Gathered gathered_;
         bool askedLights_ = false;
         bool askedSky_ = false; ///< as one of the lights
+        std::optional<Vec3f> smoothStart_; ///< of shadow rays above the surface, once one asked
         Call* outer_;
         std::size_t lightMark_;
     };
@@ -258,7 +260,7 @@ Vec3f ShadingContext::fromSky(std::uint32_t rayType, Value const& value, Density
     DirectionMap const& map = scene_.sky(rayType);
     if (map.isEmpty())
         return {0, 0, 0};
-    Vec3f const d = map.sample(sampler_->next2D());
+    auto const [d, drawn] = map.sample(sampler_->next2D());
     Vec3f const sent = value(d);
     if (!(maxComponent(sent) > 0.0f))
         return {0, 0, 0};
@@ -268,7 +270,7 @@ Vec3f ShadingContext::fromSky(std::uint32_t rayType, Value const& value, Density
     ++rays_;
     if (scene_.rays().occluded({shadowStart(call_->surface.P, d), d}, Visibility::All))
         return {0, 0, 0};
-    Vec3f const brought = finite(sent * light / (map.density(d) + density(d)));
+    Vec3f const brought = finite(sent * light / (drawn + density(d)));
     arrived_.all += brought;
     arrived_.parts.environment += brought;
     return brought;

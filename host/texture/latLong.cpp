@@ -75,8 +75,7 @@ Vec4f lookupLatLong(TiledPicture const& picture, Vec3f d)
             x += width / 2;
         }
         y = std::clamp(y, 0, height - 1);
-        for (int i = 0; i < 4; ++i)
-            sum = sum + picture.texel(level, wrapped(x + i, width), y) * (wx.w[i] * wy.w[j]);
+        picture.addFour(level, wrapped(x, width), y, wx.w, wy.w[j], sum);
     }
     return sum;
 }

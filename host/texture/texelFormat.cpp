@@ -3,6 +3,7 @@
 
 #include <OpenImageIO/half.h>
 #include <algorithm>
+#include <bit>
 #include <cmath>
 #include <cstdint>
 #include <cstring>
@@ -44,6 +45,16 @@ float encodeSrgbFast(float linear)
 float valueOf(std::uint8_t code) { return static_cast<float>(code) * (1.0f / 255.0f); }
 float valueOf(std::uint16_t code) { return static_cast<float>(code) * (1.0f / 65535.0f); }
 float valueOf(half code) { return code; }
+
+/// The value of a finite half by arithmetic, for many at a time: a table of all is larger than the
+/// nearest cache.
+float valueOfFinite(std::uint16_t bits)
+{
+    std::uint32_t const rest = bits & 0x7fffu;
+    float const normal = std::bit_cast<float>((rest << 13) + (112u << 23));
+    float const tiny = static_cast<float>(static_cast<std::int32_t>(rest)) * 0x1p-24f;
+    return std::copysign(rest < 0x400u ? tiny : normal, (bits & 0x8000u) ? -1.0f : 1.0f);
+}
 
 template <class T>
 T at(std::byte const* values, std::size_t index)
@@ -131,6 +142,34 @@ Vec4f TexelCodec::readAs(TexelCodec const& codec, std::byte const* texel)
     }
 }
 
+template <class T, int Channels>
+void TexelCodec::addFourAs(TexelCodec const& codec, std::byte const* texels, float const* weights,
+                           float scale, Vec4f& sum)
+{
+    auto const add = [&](Vec4f const& texel, float weight) {
+        sum.x += texel.x * weight;
+        sum.y += texel.y * weight;
+        sum.z += texel.z * weight;
+        sum.w += texel.w * weight;
+    };
+    if constexpr (std::is_same_v<T, half> && Channels >= 3)
+        if (!codec.format_.srgb) {
+            std::uint16_t bits[4 * Channels];
+            std::memcpy(bits, texels, sizeof bits);
+            float v[4 * Channels];
+            for (int i = 0; i < 4 * Channels; ++i)
+                v[i] = valueOfFinite(bits[i]);
+            for (int i = 0; i < 4; ++i) {
+                float const* const texel = v + i * Channels;
+                add({texel[0], texel[1], texel[2], Channels == 4 ? texel[Channels - 1] : 1.0f},
+                    weights[i] * scale);
+            }
+            return;
+        }
+    for (std::size_t i = 0; i < 4; ++i)
+        add(readAs<T, Channels>(codec, texels + i * codec.format_.bytes()), weights[i] * scale);
+}
+
 TexelCodec::TexelCodec(TexelFormat const& format)
     : format_(format)
 {
@@ -138,6 +177,9 @@ TexelCodec::TexelCodec(TexelFormat const& format)
         Vec4f (*const readers[])(TexelCodec const&, std::byte const*) = {
             readAs<T, 1>, readAs<T, 2>, readAs<T, 3>, readAs<T, 4>};
         read_ = readers[format.channels - 1];
+        void (*const adders[])(TexelCodec const&, std::byte const*, float const*, float, Vec4f&) = {
+            addFourAs<T, 1>, addFourAs<T, 2>, addFourAs<T, 3>, addFourAs<T, 4>};
+        addFour_ = adders[format.channels - 1];
         if constexpr (!std::is_same_v<T, float>)
             for (std::size_t c = 0; c < values_.size(); ++c)
                 values_[c] = tableOf<T>(isEncoded(c));

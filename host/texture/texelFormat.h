@@ -29,6 +29,11 @@ public:
 
     /// RGBA: grey is repeated, alpha is 1 where there is none.
     Vec4f read(std::byte const* texel) const { return read_(*this, texel); }
+    /// Adds four texels side by side to `sum`, each times its weight and `scale`.
+    void addFour(std::byte const* texels, float const* weights, float scale, Vec4f& sum) const
+    {
+        addFour_(*this, texels, weights, scale, sum);
+    }
     /// A row of texels to `channels` values for each.
     void decode(std::byte const* texels, std::size_t count, float* values) const;
     /// The nearest that the format holds.
@@ -39,6 +44,9 @@ private:
     float value(std::byte const* texel, std::size_t channel) const;
     template <class T, int Channels>
     static Vec4f readAs(TexelCodec const& codec, std::byte const* texel);
+    template <class T, int Channels>
+    static void addFourAs(TexelCodec const& codec, std::byte const* texels, float const* weights,
+                          float scale, Vec4f& sum);
     template <class T>
     void decodeAs(std::byte const* texels, std::size_t count, float* values) const;
 
@@ -49,6 +57,7 @@ private:
 
     TexelFormat format_;
     Vec4f (*read_)(TexelCodec const&, std::byte const*);
+    void (*addFour_)(TexelCodec const&, std::byte const*, float const*, float, Vec4f&);
     std::array<float const*, 4> values_{}; ///< of each channel: linear values of all codes
 };
 

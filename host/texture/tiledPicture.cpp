@@ -31,6 +31,16 @@ TiledPicture::TiledPicture(TexelFormat const& format, int width, int height, boo
     block_ = memory.allocate(size);
 }
 
+void TiledPicture::addFour(Level const& level, int x, int y, float const* weights, float scale,
+                           Vec4f& sum) const
+{
+    // A row of a tile is in memory side by side.
+    if ((static_cast<std::size_t>(x) & kTileMask) + 3 < kTile && x + 3 < level.width)
+        return codec_.addFour(at(level, x, y), weights, scale, sum);
+    for (int i = 0; i < 4; ++i)
+        sum = sum + texel(level, (x + i) % level.width, y) * (weights[i] * scale);
+}
+
 Vec4f TiledPicture::bilinear(Level const& level, float s, float t) const
 {
     float const x = s * static_cast<float>(level.width) - 0.5f;

@@ -22,14 +22,11 @@ public:
     int levelCount() const { return static_cast<int>(levels_.size()); }
 
     /// Linear RGBA of a texel of `level`; 0 <= x < width, 0 <= y < height.
-    Vec4f texel(Level const& level, int x, int y) const
-    {
-        auto const column = static_cast<std::size_t>(x), row = static_cast<std::size_t>(y);
-        std::size_t const tile = (row >> kTileBits) * level.tilesAcross + (column >> kTileBits);
-        std::size_t const within = (row & kTileMask) << kTileBits | (column & kTileMask);
-        return codec_.read(
-            block_->read(level.offset + ((tile << 2 * kTileBits) + within) * texelBytes_));
-    }
+    Vec4f texel(Level const& level, int x, int y) const { return codec_.read(at(level, x, y)); }
+    /// Adds the four texels from x on to `sum`, each times its weight and `scale`; the row goes on
+    /// at its other end. 0 <= x < width.
+    void addFour(Level const& level, int x, int y, float const* weights, float scale,
+                 Vec4f& sum) const;
     /// Between texel centres; the picture repeats. s, t in [0, 1], t from the top.
     Vec4f bilinear(Level const& level, float s, float t) const;
     /// The same over a blend of the two levels whose texels are next to `width`, of which 1 is the
@@ -40,6 +37,14 @@ private:
     friend class TiledPictureWriter;
     static constexpr int kTileBits = 6;
     static constexpr std::size_t kTile = std::size_t(1) << kTileBits, kTileMask = kTile - 1;
+
+    std::byte const* at(Level const& level, int x, int y) const
+    {
+        auto const column = static_cast<std::size_t>(x), row = static_cast<std::size_t>(y);
+        std::size_t const tile = (row >> kTileBits) * level.tilesAcross + (column >> kTileBits);
+        std::size_t const within = (row & kTileMask) << kTileBits | (column & kTileMask);
+        return block_->read(level.offset + ((tile << 2 * kTileBits) + within) * texelBytes_);
+    }
 
     TiledPicture(TexelFormat const& format, int width, int height, bool levels, TileMemory& memory);
 

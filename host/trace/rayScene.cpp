@@ -22,18 +22,19 @@ struct PreparedInstance {
     Mesh const* mesh;
     Mat4f toWorld;
     Mat3f normalToWorld; ///< for `transformDirection`; the inverse transposed
+    float mirrored; ///< -1 where it turns left to right, else 1
 };
 
 /// Inverse transposed of the 3x3 part, up to a positive factor: its cofactors, with the sign of
 /// the determinant so that mirrored instances keep their outside. False when it has no inverse.
-bool normalMatrix(Mat4f const& a, Mat3f& result)
+bool normalMatrix(Mat4f const& a, Mat3f& result, float& mirrored)
 {
     Vec3f const r0{a.m[0], a.m[1], a.m[2]}, r1{a.m[4], a.m[5], a.m[6]}, r2{a.m[8], a.m[9], a.m[10]};
     Vec3f c0 = cross(r1, r2), c1 = cross(r2, r0), c2 = cross(r0, r1);
     float const determinant = dot(r0, c0);
     if (!std::isfinite(determinant) || determinant == 0.0f)
         return false;
-    float const s = determinant < 0.0f ? -1.0f : 1.0f;
+    float const s = mirrored = determinant < 0.0f ? -1.0f : 1.0f;
     c0 = c0 * s, c1 = c1 * s, c2 = c2 * s;
     result = {c0.x, c0.y, c0.z, c1.x, c1.y, c1.z, c2.x, c2.y, c2.z};
     return true;
@@ -225,9 +226,9 @@ struct RayScene::Impl {
         for (std::size_t i = 0; i < scene.instances.size(); ++i) {
             Instance const& instance = scene.instances[i];
             PreparedInstance prepared{&scene.meshes[static_cast<std::size_t>(instance.mesh)],
-                                      instance.objectToWorld, Mat3f::identity()};
+                                      instance.objectToWorld, Mat3f::identity(), 1.0f};
             // A flattened instance has no inside and no inverse; rays do not meet it.
-            if (normalMatrix(instance.objectToWorld, prepared.normalToWorld))
+            if (normalMatrix(instance.objectToWorld, prepared.normalToWorld, prepared.mirrored))
                 attach(build, instance, static_cast<std::uint32_t>(i));
             instances.push_back(prepared);
         }
@@ -311,42 +312,49 @@ SurfacePoint RayScene::surface(Hit const& hit) const
     s.triangle = hit.triangle;
     s.u = hit.u;
     s.v = hit.v;
-    Vec3f position[3];
-    for (std::size_t i = 0; i < 3; ++i)
-        position[i] = transformPoint(instance.toWorld, mesh.positions[corner[i]]);
-    float const w = 1.0f - hit.u - hit.v;
     // From the corners, not along the ray: the error does not grow with the ray's length.
-    s.P = position[0] * w + position[1] * hit.u + position[2] * hit.v;
     s.objectP = interpolate(mesh.positions, corner, hit.u, hit.v);
-    s.Ng = normalize(cross(position[1] - position[0], position[2] - position[0]));
-    s.smoothP = s.P;
+    s.P = transformPoint(instance.toWorld, s.objectP);
+    Vec3f const* const p = mesh.positions.data();
+    Vec3f const face = cross(p[corner[1]] - p[corner[0]], p[corner[2]] - p[corner[0]]);
+    s.Ng = normalize(transformDirection(instance.normalToWorld, face));
 
     if (mesh.normals.empty()) {
-        Vec3f const* p = mesh.positions.data();
+        s.Ng = s.Ng * instance.mirrored;
         s.N = s.Ng;
-        s.objectN = normalize(cross(p[corner[1]] - p[corner[0]], p[corner[2]] - p[corner[0]]));
+        s.objectN = normalize(face);
         return s;
     }
-    Vec3f normal[3];
-    for (std::size_t i = 0; i < 3; ++i)
-        normal[i] = normalize(transformDirection(instance.normalToWorld, mesh.normals[corner[i]]));
-    if (dot(s.Ng, normal[0] + normal[1] + normal[2]) < 0.0f)
+    Vec3f const* const n = mesh.normals.data();
+    if (dot(face, n[corner[0]] + n[corner[1]] + n[corner[2]]) < 0.0f)
         s.Ng = -s.Ng;
-    s.N = normalize(normal[0] * w + normal[1] * hit.u + normal[2] * hit.v);
+    s.objectN = normalize(interpolate(mesh.normals, corner, hit.u, hit.v));
+    s.N = normalize(transformDirection(instance.normalToWorld, s.objectN));
     if (!(dot(s.N, s.N) > 0.5f)) // opposite normals cancel out
         s.N = s.Ng;
     if (!(dot(s.Ng, s.Ng) > 0.5f)) // a sliver whose area is too small for a float
         s.Ng = s.N;
-    s.objectN = normalize(interpolate(mesh.normals, corner, hit.u, hit.v));
+    return s;
+}
 
+Vec3f RayScene::smoothPoint(SurfacePoint const& s) const
+{
+    PreparedInstance const& instance = impl_->instances[s.instance];
+    Mesh const& mesh = *instance.mesh;
+    if (mesh.normals.empty())
+        return s.P;
+    auto const& corner = mesh.triangles[s.triangle];
+    float const weight[3] = {1.0f - s.u - s.v, s.u, s.v};
     // The mean of the projections of P onto the corners' tangent planes, as far as P lies below
     // them.
-    float const weight[3] = {w, hit.u, hit.v};
     Vec3f rise{0, 0, 0};
-    for (int i = 0; i < 3; ++i)
-        rise += normal[i] * (-minOf(0.0f, dot(s.P - position[i], normal[i])) * weight[i]);
-    s.smoothP = s.P + rise;
-    return s;
+    for (std::size_t i = 0; i < 3; ++i) {
+        Vec3f const normal =
+            normalize(transformDirection(instance.normalToWorld, mesh.normals[corner[i]]));
+        Vec3f const way = s.P - transformPoint(instance.toWorld, mesh.positions[corner[i]]);
+        rise += normal * (-minOf(0.0f, dot(way, normal)) * weight[i]);
+    }
+    return s.P + rise;
 }
 
 Vec3f offsetPoint(Vec3f P, Vec3f n)

@@ -33,10 +33,6 @@ struct SurfacePoint {
     Vec3f Ng; ///< unit, of the face, on the side that the mesh's normals point to
     Vec3f objectP;
     Vec3f objectN; ///< unit
-    /// `P` moved outwards onto the curved surface that the normals describe, from where shadow
-    /// rays of a coarse mesh do not meet its own facets (Hanika 2021, "Hacking the Shadow
-    /// Terminator").
-    Vec3f smoothP;
     std::uint32_t instance;
     std::uint32_t triangle;
     float u, v;
@@ -79,6 +75,9 @@ public:
     bool occluded(Ray const& ray, Visibility visible) const;
 
     SurfacePoint surface(Hit const& hit) const;
+    /// `P` moved outwards onto the curved surface that the normals describe, from where shadow rays
+    /// of a coarse mesh do not meet its own facets (Hanika 2021, "Hacking the Shadow Terminator").
+    Vec3f smoothPoint(SurfacePoint const& s) const;
 
 private:
     struct Impl;
