@@ -6,6 +6,7 @@
 #include "sceneData.h"
 
 #include <fmt/format.h>
+#include <fmt/ranges.h>
 #include <nlohmann/json.hpp>
 #include <pybind11/stl.h>
 
@@ -35,20 +36,33 @@ int positive(int value, char const* name)
     return value;
 }
 
-py::array_t<float> evaluate(ShaderOfScene const& self, Floats const& wi, Floats const& wo,
-                            bool cosine, int threads)
+/// The caller's array for results, as it is.
+py::array_t<float> ownedBy(py::array const& out, Shape const& shape)
 {
-    std::span<Vec3f const> const in = rows3(wi, "wi"), out = rows3(wo, "wo");
-    if (in.size() != out.size() && wi.ndim() == 2 && wo.ndim() == 2)
+    bool const fits = py::isinstance<py::array_t<float, py::array::c_style>>(out) && out.writeable()
+        && Shape(out.shape(), out.shape() + out.ndim()) == shape;
+    if (!fits)
+        throw InputError(fmt::format("out: expected a writable float32 array in C order of shape "
+                                     "({})",
+                                     fmt::join(shape, ", ")));
+    return py::reinterpret_borrow<py::array_t<float>>(out);
+}
+
+py::array_t<float> evaluate(ShaderOfScene const& self, Floats const& wi, Floats const& wo,
+                            bool cosine, int threads, std::optional<py::array> const& out)
+{
+    std::span<Vec3f const> const in = rows3(wi, "wi"), away = rows3(wo, "wo");
+    if (in.size() != away.size() && wi.ndim() == 2 && wo.ndim() == 2)
         throw InputError(fmt::format("wo: expected as many directions as wi has, {}, got {}",
-                                     in.size(), out.size()));
+                                     in.size(), away.size()));
     bool const single = wi.ndim() == 1 && wo.ndim() == 1;
-    auto const count = static_cast<py::ssize_t>(wi.ndim() == 2 ? in.size() : out.size());
-    py::array_t<float> values(single ? Shape{3} : Shape{count, 3});
+    auto const count = static_cast<py::ssize_t>(wi.ndim() == 2 ? in.size() : away.size());
+    Shape const shape = single ? Shape{3} : Shape{count, 3};
+    auto values = out ? ownedBy(*out, shape) : py::array_t<float>(shape);
     std::span<Vec3f> const rows = rowsOf(values);
     MaterialProbe const probe(self.shader());
     py::gil_scoped_release unlocked;
-    probe.evaluate(in, out, cosine, rows, threads);
+    probe.evaluate(in, away, cosine, rows, threads);
     return values;
 }
 
@@ -142,7 +156,7 @@ void bindMaterials(py::module_& m)
                  return toPython(*p);
              })
         .def("set", &ShaderOfScene::set)
-        .def("eval", evaluate, arg("wi"), arg("wo"), arg("cosine"), arg("threads"))
+        .def("eval", evaluate, arg("wi"), arg("wo"), arg("cosine"), arg("threads"), arg("out"))
         .def("sample", sample, arg("wi"), arg("n"), arg("seed"), arg("threads"))
         .def("albedo", albedo, arg("theta"), arg("n"), arg("seed"), arg("threads"))
         .def("histogram", histogram, arg("wi"), arg("n"), arg("rows"), arg("columns"), arg("seed"),

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 // Sessions, pictures and their files.
 #include "base/error.h"
+#include "denoise/denoise.h"
 #include "film/imageFile.h"
 #include "render/render.h"
 #include "render/session.h"
@@ -154,6 +155,17 @@ py::array_t<float> valuesOf(Picture const& picture, std::string const& name)
         layer.values.data(), py::cast(picture));
 }
 
+Picture denoise(Picture const& picture, int threads, py::object const& tell)
+{
+    return std::make_shared<host::Picture>(interruptibly(tell, [&](Progress& progress) {
+        host::DenoiseOptions options;
+        options.threads = threads;
+        options.cancel = &progress.cancel;
+        options.progress = [&](double done) { progress.done = done; };
+        return host::denoised(*picture, options).value_or(host::Picture());
+    }));
+}
+
 Picture pictureOf(std::vector<std::tuple<std::string, std::vector<std::string>, Floats>> const& all)
 {
     auto picture = std::make_shared<host::Picture>();
@@ -232,6 +244,11 @@ void bindRendering(py::module_& m)
         py::gil_scoped_release unlocked;
         host::writePicture(file, *picture, view);
     });
+    m.def("read", [](std::string const& file) {
+        py::gil_scoped_release unlocked;
+        return std::make_shared<host::Picture>(host::readPicture(file));
+    });
+    m.def("denoise", denoise);
     m.def("to_screen", toScreen);
 }
 

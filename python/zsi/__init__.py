@@ -26,7 +26,7 @@ from pathlib import Path as _Path
 
 from . import _core, merl
 from ._core import Error
-from ._picture import Picture, Session, render, to_screen, write
+from ._picture import Picture, Session, denoise, read, render, to_screen, write
 from ._place import INSTALLED_SHADERS as _INSTALLED
 from ._scene import Environment, Instance, Light, Scene, load
 from ._shaders import Histogram, Material, Samples, classes, material, shader_class
@@ -35,8 +35,8 @@ from ._sweep import Sheet, sweep
 __version__: str = _core.version
 __all__ = [
     "Environment", "Error", "Histogram", "Instance", "Light", "Material", "Picture", "Samples",
-    "Scene", "Session", "Sheet", "classes", "load", "load_shaders", "material", "merl", "render",
-    "shader_class", "sweep", "to_screen", "write",
+    "Scene", "Session", "Sheet", "classes", "denoise", "load", "load_shaders", "material", "merl", "read",
+    "render", "shader_class", "sweep", "to_screen", "write",
 ]
 
 

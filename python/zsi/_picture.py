@@ -101,6 +101,24 @@ def render(scene: Scene, *, samples: int | None = None, threads: int = 0,
     return Session(scene).render(samples=samples, threads=threads, on_progress=on_progress)
 
 
+def denoise(picture: Picture, *, threads: int = 0,
+            on_progress: Callable[[float], object] | None = None) -> Picture:
+    """The picture with its beauty freed from noise.
+
+    It needs both halves of its samples: render with "halves" among ``scene.film.layers``, or read
+    an EXR file that ``zsi render --denoise`` wrote. on_progress and Ctrl-C as for `render`. Raises
+    Error for a picture without halves.
+    """
+    result = Picture({}, _core_picture=_core.denoise(picture._core, threads, on_progress))
+    result.report, result._view = picture.report, picture._view
+    return result
+
+
+def read(file: str | os.PathLike[str]) -> Picture:
+    """An EXR file with all its layers as a picture. Raises Error where it is none."""
+    return Picture({}, _core_picture=_core.read(os.fspath(file)))
+
+
 def _view(picture: Picture, exposure: float | None, alpha: bool | None, view: str | None,
           ocio_config: str | os.PathLike[str]) -> _core.ScreenView:
     scenes = picture._view

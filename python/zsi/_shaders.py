@@ -95,15 +95,16 @@ class Material(Shader):
     """
 
     def eval(self, wi: npt.ArrayLike, wo: npt.ArrayLike, *, cosine: bool = False,
-             threads: int = 0) -> FloatArray:
+             threads: int = 0, out: FloatArray | None = None) -> FloatArray:
         """The scattering value for each pair of directions, 1/sr.
 
         wi, wo: (N, 3) or (3,), unit, away from the surface; one for all where only one is (3,).
         cosine: with the factor |cos wo| in it; without, a Lambertian of reflectance r gives r / pi.
+        out: an array for the result, which saves fresh memory in loops over many directions.
         Returns (N, 3) float32, linear RGB; (3,) for two single directions. Perfectly specular
         parts have no value. Raises Error for other shapes and for a class without ``transfer``.
         """
-        return self._handle.eval(wi, wo, cosine, threads)
+        return self._handle.eval(wi, wo, cosine, threads, out)
 
     def sample(self, wi: npt.ArrayLike, n: int = 1, *, seed: int = 1, threads: int = 0) -> Samples:
         """n draws of a direction to go on with, for each wi.

@@ -1,6 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
 """The Python package, as users call it. ZSI_COMMAND: the command, whose messages are compared."""
 
+import json
 import os
 import pathlib
 import signal
@@ -64,6 +65,12 @@ class Measuring(unittest.TestCase):
         np.testing.assert_array_equal(m.eval(wi[7], wo), m.eval(np.tile(wi[7], (1000, 1)), wo))
         self.assertEqual(m.eval(wi[0], wo[0]).tolist(), value[0].tolist())
         self.assertEqual(m.eval(-wi, wo).max(), 0)  # opaque
+        out = np.empty((1000, 3), np.float32)
+        self.assertIs(m.eval(wi, wo, out=out), out)
+        np.testing.assert_array_equal(out, value)
+        for wrong in (out[:9], out.astype(float), np.asfortranarray(out)):
+            with self.assertRaisesRegex(zsi.Error, "^out: expected"):
+                m.eval(wi, wo, out=wrong)
 
     def test_draws_agree_with_values_albedo_and_histogram(self):
         m = zsi.material("corvid_Mtl_Ward", u_diffuseColor=[0.4, 0.2, 0.1], u_roughValue=0.3,
@@ -189,6 +196,11 @@ class Scenes(unittest.TestCase):
             with self.subTest(path), self.assertRaisesRegex(zsi.Error, message):
                 scene.set(path, value)
         self.assertTrue(same(zsi.render(scene), zsi.render(ball())))
+        # Whatever a file can say of them is here.
+        schema = json.loads(subprocess.check_output([os.environ["ZSI_COMMAND"], "schema"]))
+        for section in ("camera", "film", "settings"):
+            self.assertEqual(set(schema["properties"][section]["properties"]),
+                             set(getattr(scene, section)._get()))
 
     def test_files_are_those_of_the_command(self):
         with tempfile.TemporaryDirectory() as folder:
@@ -225,6 +237,22 @@ class Scenes(unittest.TestCase):
                 self.assertEqual(Image.open(file).getpixel((2, 1))[:3], expected)
             with self.assertRaisesRegex(zsi.Error, "expected an array"):
                 zsi.write(file, np.zeros((3, 5, 7)))
+
+    def test_a_denoised_picture_is_nearer_to_the_truth(self):
+        scene = ball(layers=["halves"])
+        scene.film.update(width=96, height=64)
+        noisy, truth = zsi.render(scene, samples=8), zsi.render(scene, samples=512)["beauty"]
+        with tempfile.TemporaryDirectory() as folder:
+            file = os.path.join(folder, "noisy.exr")
+            zsi.write(file, noisy)
+            read = zsi.read(file)
+        self.assertTrue(same(read, noisy))
+        clean = zsi.denoise(read)
+        self.assertTrue(same(clean, zsi.denoise(noisy, threads=1)))
+        error = [np.mean((p["beauty"] - truth) ** 2) for p in (noisy, clean)]
+        self.assertLess(error[1], 0.7 * error[0])
+        with self.assertRaisesRegex(zsi.Error, "halves"):
+            zsi.denoise(zsi.render(ball()))
 
     def test_rendering_can_be_ended_and_refuses_edits_meanwhile(self):
         scene = ball()
