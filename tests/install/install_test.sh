@@ -151,3 +151,9 @@ has zephyrShaders64.so content
 has /man1/zsi.1 content
 dpkg-deb -x deb/zsi_*.deb unpacked
 unpacked/usr/bin/zsi info | cmp - classes || fail "the packaged command lists other classes"
+if [ -d "$build/python" ]; then
+    dpkg-deb -x deb/python3-zsi_*.deb unpacked
+    package=$(dirname "$(dirname "$(find unpacked -name '_core*.so')")")
+    PYTHONPATH=$package /usr/bin/python3 -c "$count" >packaged.txt
+    has "$(wc -l <classes) " packaged.txt
+fi
