@@ -67,7 +67,9 @@ try {
 
     host::Scene const scene = makeScene(libraries);
     host::RenderOptions options;
-    options.progress = [](double done) { std::printf("\r%3.0f%%", done * 100); };
+    options.progress = [](zsi::host::RenderStatus const& status) {
+        std::printf("\r%3.0f%%", status.done * 100);
+    };
     host::RenderReport report;
     host::Picture const picture = host::render(scene, options, &report);
     host::writePicture(argv[2], picture, host::screenView(scene.film));

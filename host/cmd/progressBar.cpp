@@ -49,7 +49,7 @@ void ProgressBar::show(std::string const& what)
         draw(what);
 }
 
-void ProgressBar::show(std::string const& what, double done)
+void ProgressBar::show(std::string const& what, double done, std::string const& detail)
 {
     auto const now = Clock::now();
     if (what != what_) {
@@ -62,9 +62,12 @@ void ProgressBar::show(std::string const& what, double done)
     double const elapsed = std::chrono::duration<double>(now - begin_).count();
     std::string const percent = fmt::format("{:3.0f}%", std::floor(done * 100.0));
     std::string const head = what + ' ';
-    std::string const tail =
+    std::string tail =
         fmt::format(" {}  {} left", percent, clockText(elapsed * (1.0 - done) / done));
-    std::size_t const room = columns(), text = head.size() + tail.size() + 2;
+    std::size_t const room = columns();
+    if (!detail.empty() && head.size() + tail.size() + detail.size() + kFewestMarks + 4 <= room)
+        tail += "  " + detail;
+    std::size_t const text = head.size() + tail.size() + 2;
     if (room < text + kFewestMarks) {
         draw(room < text ? percent : head + tail);
         return;

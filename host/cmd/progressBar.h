@@ -19,7 +19,8 @@ public:
 
     /// Calls must not overlap.
     void show(std::string const& what); ///< of unknown length
-    void show(std::string const& what, double done); ///< `done` in [0, 1]
+    /// `done` in [0, 1]; `detail` behind the rest, where there is room for it.
+    void show(std::string const& what, double done, std::string const& detail = {});
 
 private:
     using Clock = std::chrono::steady_clock;

@@ -1,7 +1,9 @@
 // SPDX-License-Identifier: Apache-2.0
 // zsi render: a scene file to a picture file.
 #include "render/render.h"
+#include "base/activity.h"
 #include "base/error.h"
+#include "base/replacedFile.h"
 #include "cmd/command.h"
 #include "cmd/interruption.h"
 #include "cmd/progressBar.h"
@@ -23,6 +25,7 @@
 #include <limits>
 #include <memory>
 #include <optional>
+#include <sys/resource.h>
 #include <utility>
 
 namespace zsi::cmd {
@@ -39,6 +42,11 @@ struct Arguments {
     std::string size, crop;
     int threads = 0;
     std::optional<int> samples;
+    std::optional<float> noise;
+    double seconds = 0;
+    std::string checkpoint;
+    double checkpointSeconds = 30;
+    bool resume = false, stats = false;
     std::optional<std::int64_t> seed;
     std::optional<int> textureCache; ///< megabytes
     std::string integrator;
@@ -145,6 +153,50 @@ std::string nonFinite(host::Scene const& scene, host::RenderReport const& report
                        who.empty() ? "" : " (" + who + ")");
 }
 
+/// "64 samples a pixel", "16 to 256 samples a pixel (41.5 in the mean)".
+std::string samplesText(host::Film const& film)
+{
+    auto const [least, most] = film.sampleRange();
+    return least == most ? fmt::format("{} samples a pixel", least)
+                         : fmt::format("{} to {} samples a pixel ({:.1f} in the mean)", least, most,
+                                       film.meanSamples());
+}
+
+std::string statusText(host::RenderStatus const& status)
+{
+    return fmt::format("{:.0f} samples{}", status.samples,
+                       status.noise >= 0 ? fmt::format(", noise {:.2g}", status.noise) : "");
+}
+
+/// What --stats tells.
+std::string statsText(host::Scene const& scene, host::RenderReport const& report,
+                      std::string const& samples,
+                      std::array<std::uint64_t, host::kActivities> const& seen)
+{
+    auto const rays = [&](char const* kind, std::uint64_t count) {
+        return fmt::format("  {:<11}{:>14}  {:>8.3f} million/s\n", kind, count,
+                           static_cast<double>(count) * 1e-6 / report.seconds);
+    };
+    std::uint64_t looks = 0;
+    for (std::uint64_t const count : seen)
+        looks += count;
+    auto const share = [&](host::Activity what) {
+        return looks ? 100.0 * static_cast<double>(seen[static_cast<std::size_t>(what)])
+                / static_cast<double>(looks)
+                     : 0.0;
+    };
+    rusage usage = {};
+    getrusage(RUSAGE_SELF, &usage);
+    return "rays\n" + rays("camera", report.rays.camera)
+        + rays("reflection", report.rays.reflection) + rays("diffuse", report.rays.diffuse)
+        + rays("shadow", report.rays.shadow)
+        + fmt::format("time of rendering threads: tracing {:.0f} %, shading {:.0f} %, textures "
+                      "{:.0f} %\nmemory: {} MB at most\n{}\n{}\n",
+                      share(host::Activity::Tracing), share(host::Activity::Shading),
+                      share(host::Activity::Textures), usage.ru_maxrss >> 10, samples,
+                      nonFinite(scene, report));
+}
+
 /// The scene as the command line wants it.
 host::Scene load(Arguments const& arguments, host::ShaderLibraries const& libraries)
 {
@@ -171,6 +223,10 @@ host::Scene load(Arguments const& arguments, host::ShaderLibraries const& librar
                                      arguments.crop, scene.film.width, scene.film.height));
     if (arguments.samples)
         scene.settings.samples = *arguments.samples;
+    else if (arguments.noise || arguments.seconds > 0)
+        scene.settings.samples = kMaxSamples; // what the scene says was meant for no other limit
+    if (arguments.noise)
+        scene.settings.noise = *arguments.noise;
     if (arguments.seed)
         scene.settings.seed = static_cast<std::uint32_t>(*arguments.seed);
     if (!arguments.integrator.empty())
@@ -194,6 +250,16 @@ void checkWord(char const* option, std::string const& word, std::vector<std::str
                                      host::suggestion(word, known)));
 }
 
+bool keepsState(Arguments const& arguments)
+{
+    return arguments.resume || !arguments.checkpoint.empty();
+}
+
+std::string checkpointFile(Arguments const& arguments)
+{
+    return arguments.checkpoint.empty() ? arguments.output + ".checkpoint" : arguments.checkpoint;
+}
+
 void check(Arguments const& arguments)
 {
     if (!arguments.size.empty())
@@ -205,6 +271,8 @@ void check(Arguments const& arguments)
     for (std::string const& layer : arguments.layers)
         checkWord("--layers", layer, host::layerNames());
     host::checkPictureFile(arguments.output);
+    if (keepsState(arguments))
+        host::ReplacedFile::check(checkpointFile(arguments));
     if (!arguments.layers.empty() && !host::keepsLayers(arguments.output))
         throw UsageError(fmt::format("--layers: {} has no layers; expected an .exr file",
                                      host::printable(arguments.output)));
@@ -227,6 +295,8 @@ int render(Arguments const& arguments, std::string const& shaderPath)
 
     host::RenderReport report;
     host::Picture picture;
+    std::string samples;
+    std::array<std::uint64_t, host::kActivities> seen{};
     try {
         ProgressBar bar(!arguments.quiet);
         std::atomic<bool> const& interrupted = interruption.defer();
@@ -238,28 +308,47 @@ int render(Arguments const& arguments, std::string const& shaderPath)
         for (std::string const& omission : session.omissions())
             reporter.warning(scene.file + ": " + omission);
         host::Film film = session.newFilm();
-        host::RenderJob job;
-        job.window = film.window();
-        job.samples = {0, static_cast<std::uint32_t>(scene.settings.samples)};
-        job.threads = arguments.threads;
-        job.progress = [&](double done) { bar.show("rendering", done); };
-        job.cancel = &interrupted;
-        report = session.render(film, job);
-        picture = host::developed(film, scene);
-        if (arguments.denoise) {
-            host::DenoiseOptions options;
-            options.threads = arguments.threads;
-            options.cancel = &interrupted;
-            options.progress = [&](double done) { bar.show("denoising", done); };
-            if (auto result = host::denoised(picture, options))
+        host::RenderOptions options;
+        options.threads = arguments.threads;
+        options.progress = [&](host::RenderStatus const& status) {
+            bar.show("rendering", status.done, statusText(status));
+        };
+        options.cancel = &interrupted;
+        options.seconds = arguments.seconds;
+        if (keepsState(arguments))
+            options.checkpoint = checkpointFile(arguments);
+        options.checkpointSeconds = arguments.checkpointSeconds;
+        std::optional<host::ActivitySampler> activity;
+        if (arguments.stats)
+            activity.emplace();
+        report = host::renderProgressively(session, film, options);
+        if (activity)
+            seen = activity->counts();
+        if (film.sampleRange().second > 0) {
+            picture = host::developed(film, scene);
+            samples = samplesText(film);
+        }
+        if (arguments.denoise && !interrupted && !picture.layers.empty()) {
+            host::DenoiseOptions denoising;
+            denoising.threads = arguments.threads;
+            denoising.cancel = &interrupted;
+            denoising.progress = [&](double done) { bar.show("denoising", done); };
+            if (auto result = host::denoised(picture, denoising))
                 picture = std::move(*result);
         }
         reporter.detail(fmt::format("rendered with \"{}\"", scene.settings.integrator));
     } catch (host::Cancelled const&) {
         // Told below, as an interruption while rendering is.
     }
-    if (int const status = interruption.resume()) {
-        std::fputs("zsi: interrupted, no picture written\n", stderr);
+    int const status = interruption.resume();
+    if (status != 0) {
+        if (!picture.layers.empty())
+            host::writePicture(arguments.output, picture, view);
+        std::fputs(
+            picture.layers.empty()
+                ? "zsi: interrupted, no picture written\n"
+                : fmt::format("zsi: interrupted; {} has {}\n", arguments.output, samples).c_str(),
+            stderr);
         return status;
     }
     if (!scene.instances.empty() && report.surfaces == 0)
@@ -267,11 +356,16 @@ int render(Arguments const& arguments, std::string const& shaderPath)
                                      scene.instances.size()));
     host::writePicture(arguments.output, picture, view);
     reporter.detail("written to " + arguments.output);
+    // A file that was asked for by name stays: more samples can be added to it.
+    if (arguments.checkpoint.empty() && arguments.resume && report.complete)
+        std::filesystem::remove(checkpointFile(arguments));
     if (!reporter.quiet())
-        print(fmt::format("{}: {}x{}, {} samples a pixel, {} rays, {}, {:.2f} s\n",
-                          arguments.output, picture.width(), picture.height(),
-                          scene.settings.samples, report.rays, nonFinite(scene, report),
-                          report.seconds));
+        print(fmt::format("{}: {}x{}, {}, {}{} rays, {}, {:.2f} s\n", arguments.output,
+                          picture.width(), picture.height(), samples,
+                          report.noise >= 0 ? fmt::format("noise {:.2g}, ", report.noise) : "",
+                          report.rays.sum(), nonFinite(scene, report), report.seconds));
+    if (arguments.stats)
+        print(statsText(scene, report, samples, seen));
     return 0;
 }
 
@@ -293,6 +387,30 @@ Subcommand addRender(CLI::App& app, std::string const& shaderPath)
         ->check(CLI::Range(0, kMaxThreads));
     command->add_option("--samples", arguments->samples, "Samples a pixel, instead of the scene's")
         ->check(CLI::Range(1, kMaxSamples));
+    command
+        ->add_option("--noise", arguments->noise,
+                     "Stop where the picture's noise is below this, such as 0.01; without "
+                     "--samples as many as that takes")
+        ->check(CLI::PositiveNumber)
+        ->type_name("T");
+    command
+        ->add_option("--time", arguments->seconds,
+                     "Stop rendering after so many seconds; without --samples as many as fit")
+        ->check(CLI::PositiveNumber)
+        ->type_name("SECONDS");
+    command->add_flag("--resume", arguments->resume,
+                      "Keep the state of the render beside the picture, in FILE.checkpoint, and go "
+                      "on from it where it is there; it goes when the picture is complete");
+    command
+        ->add_option("--checkpoint", arguments->checkpoint,
+                     "Likewise in this file, which stays, so that samples can be added")
+        ->type_name("FILE");
+    command
+        ->add_option("--checkpoint-every", arguments->checkpointSeconds,
+                     "Seconds between two writings of that state; it never takes more than a "
+                     "fortieth of the time")
+        ->check(CLI::NonNegativeNumber)
+        ->type_name("SECONDS");
     command->add_option("--size", arguments->size, "Size in pixels, instead of the scene's")
         ->type_name("WxH");
     command
@@ -329,6 +447,8 @@ Subcommand addRender(CLI::App& app, std::string const& shaderPath)
                      "Megabytes of pictures in memory; more than that lies in scratch files")
         ->check(CLI::Range(1, kMaxCache))
         ->type_name("MB");
+    command->add_flag("--stats", arguments->stats,
+                      "Tell of rays by kind, where the time went, memory and samples");
     command->add_flag("-q,--quiet", arguments->quiet, "Tell of nothing but errors");
     command
         ->add_flag("-v,--verbose", arguments->verbose, "Tell what is loaded and how long it takes")

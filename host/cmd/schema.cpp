@@ -42,7 +42,9 @@ char const* const kFormat = R"json({
     "layers": {"type": "array", "items": {}, "description": "layers of an .exr beside the beauty"}}},
   "settings": {"type": ["object", "null"], "additionalProperties": false, "properties": {
     "samples": {"type": "integer", "minimum": 1, "maximum": 1048576, "default": 64,
-                "description": "per pixel"},
+                "description": "per pixel, at most"},
+    "noise": {"type": "number", "minimum": 0, "default": 0,
+              "description": "above 0: where it is lower, no more samples"},
     "maxDepth": {"type": "integer", "minimum": 0, "maximum": 1000, "default": 64,
                  "description": "rays one after another"},
     "occlusionSamples": {"type": "integer", "minimum": 1, "maximum": 4096, "default": 4},

@@ -74,6 +74,20 @@ public:
     /// Of a layer with halves: mean of a channel over either half of a pixel's samples.
     std::array<float, 2> halves(int x, int y, std::size_t layer, std::size_t channel) const;
 
+    /// All that a pixel holds, for files.
+    struct State {
+        std::span<ExactSum> sums;
+        std::span<std::uint32_t> counts;
+        std::span<std::vector<IdCount>> ids; ///< each by rising id
+    };
+    struct ConstState {
+        std::span<ExactSum const> sums;
+        std::span<std::uint32_t const> counts;
+        std::span<std::vector<IdCount> const> ids;
+    };
+    State state(int x, int y) { return stateOf<State>(*this, pixel(x, y)); }
+    ConstState state(int x, int y) const { return stateOf<ConstState>(*this, pixel(x, y)); }
+
 private:
     /// Where a layer's values stand within a pixel's. Its halves follow each other.
     struct Place {
@@ -85,6 +99,13 @@ private:
     {
         return static_cast<std::size_t>(y - window_.y0) * static_cast<std::size_t>(window_.width())
             + static_cast<std::size_t>(x - window_.x0);
+    }
+    template <class State, class Film>
+    static State stateOf(Film& film, std::size_t at)
+    {
+        return {std::span(film.sums_).subspan(at * film.sumsOfPixel_, film.sumsOfPixel_),
+                std::span(film.counts_).subspan(at * film.countsOfPixel_, film.countsOfPixel_),
+                std::span(film.ids_).subspan(at * film.idsOfPixel_, film.idsOfPixel_)};
     }
     std::size_t pixels() const
     {

@@ -73,11 +73,13 @@ FilmSettings readFilm(JsonReader const& reader)
 
 Settings readSettings(JsonReader const& reader)
 {
-    reader.expectKeys({"samples", "maxDepth", "occlusionSamples", "indirectSamples",
+    reader.expectKeys({"samples", "noise", "maxDepth", "occlusionSamples", "indirectSamples",
                        "occlusionDistance", "ambient", "sampleClamp", "seed", "integrator"});
     Settings settings;
     if (auto const v = reader.find("samples"))
         settings.samples = v->toInt(1, kMostSamples);
+    if (auto const v = reader.find("noise"))
+        settings.noise = v->toFloat(0);
     if (auto const v = reader.find("maxDepth"))
         settings.maxDepth = v->toInt(0, 1000);
     if (auto const v = reader.find("occlusionSamples"))

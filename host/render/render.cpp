@@ -10,13 +10,7 @@ Picture render(Scene const& scene, RenderOptions const& options, RenderReport* r
 {
     Session session(scene, [&](double) { return !options.cancel || !*options.cancel; });
     Film film = session.newFilm();
-    RenderJob job;
-    job.window = film.window();
-    job.samples = {0, static_cast<std::uint32_t>(std::max(0, scene.settings.samples))};
-    job.threads = options.threads;
-    job.cancel = options.cancel;
-    job.progress = options.progress;
-    RenderReport const result = session.render(film, job);
+    RenderReport const result = renderProgressively(session, film, options);
     if (report)
         *report = result;
     return developed(film, scene);

@@ -3,15 +3,9 @@
 #pragma once
 
 #include "film/screenTransform.h"
-#include "render/session.h"
+#include "render/progressive.h"
 
 namespace zsi::host {
-
-struct RenderOptions {
-    int threads = 0; ///< 0: one per processor
-    std::function<void(double)> progress = {}; ///< fraction done, 0..1, from any thread, serialised
-    std::atomic<bool> const* cancel = nullptr; ///< set to stop early
-};
 
 /// All samples of the scene's picture, or of its crop. The same scene and seed give the same
 /// picture bit for bit, whatever the number of threads. Throws Cancelled when stopped while the

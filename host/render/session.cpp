@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "render/session.h"
 
+#include "base/activity.h"
+#include "base/hash.h"
 #include "base/threads.h"
 #include "film/cryptomatte.h"
 #include "integrate/integrators.h"
@@ -24,18 +26,18 @@ constexpr std::uint32_t kSamples = 16;
 /// One rendering of a job: hands out units of work and adds their samples to the film.
 class Rendering {
 public:
-    Rendering(PreparedScene const& scene, Film& film, RenderJob const& job)
+    /// `unitAt`: the units of work by their number, below `units`.
+    Rendering(PreparedScene const& scene, Film& film, RenderJob const& job,
+              std::function<RenderUnit(std::int64_t)> unitAt, std::int64_t units,
+              std::span<char> done)
         : scene_(scene)
         , film_(film)
         , job_(job)
         , settings_(scene.scene().settings)
         , camera_(scene.scene().camera, scene.scene().film)
-        , window_(intersection(job.window, film.window()))
-        , tilesAcross_((window_.width() + kTile - 1) / kTile)
-        , tiles_(tilesAcross_ * ((window_.height() + kTile - 1) / kTile))
-        , units_(static_cast<std::int64_t>(tiles_)
-                 * ((job.samples.end - job.samples.begin + kSamples - 1) / kSamples))
-        , tileLocks_(static_cast<std::size_t>(tiles_))
+        , unitAt_(std::move(unitAt))
+        , units_(units)
+        , isDone_(done)
     {
         for (LayerFormat const& format : film.layers()) {
             LayerKind const* const kind = kindOf(format);
@@ -58,16 +60,17 @@ public:
     void work()
     {
         auto const integrator = makeIntegrator(settings_.integrator, scene_);
+        WatchedThread const watched;
         try {
             std::int64_t unit;
-            while (!cancelled() && (unit = next_++) < units_)
+            while (!cancelled() && !paused() && (unit = next_++) < units_)
                 render(*integrator, unit);
         } catch (...) {
             next_ = units_; // nothing more for the others
             throw;
         }
         std::lock_guard const lock(reportLock_);
-        report_.rays += integrator->context().rays();
+        report_.rays.add(integrator->context().rays());
         report_.nonFinite += integrator->context().nonFinite();
         auto const& counts = integrator->context().nonFiniteOf();
         report_.nonFiniteOf.resize(counts.size());
@@ -85,16 +88,18 @@ public:
 private:
     bool cancelled() const { return job_.cancel && job_.cancel->load(std::memory_order_relaxed); }
 
+    bool paused() const { return job_.pause && job_.pause->load(std::memory_order_relaxed); }
+    /// Units of the same pixels have the same lock.
+    std::mutex& lockOf(Window const& pixels)
+    {
+        std::uint32_t const at = hashCombine(static_cast<std::uint32_t>(pixels.x0),
+                                             static_cast<std::uint32_t>(pixels.y0));
+        return tileLocks_[at % tileLocks_.size()];
+    }
+
     void render(Integrator& integrator, std::int64_t unit)
     {
-        int const tile = static_cast<int>(unit % tiles_);
-        std::uint32_t const first =
-            job_.samples.begin + static_cast<std::uint32_t>(unit / tiles_) * kSamples;
-        SampleRange const samples{first, std::min(first + kSamples, job_.samples.end)};
-        int const left = window_.x0 + tile % tilesAcross_ * kTile;
-        int const top = window_.y0 + tile / tilesAcross_ * kTile;
-        Window const pixels = intersection({left, top, left + kTile, top + kTile}, window_);
-
+        auto const [pixels, samples] = unitAt_(unit);
         std::uint64_t surfaces = 0;
         Film part(film_.frameWidth(), film_.frameHeight(), pixels, film_.layers());
         for (int y = pixels.y0; y < pixels.y1; ++y)
@@ -102,14 +107,16 @@ private:
                 if (!render(integrator, x, y, samples, part, surfaces))
                     return;
         {
-            std::lock_guard const lock(tileLocks_[static_cast<std::size_t>(tile)]);
+            std::lock_guard const lock(lockOf(pixels));
             film_.add(part);
         }
         std::lock_guard const lock(reportLock_);
         ++done_;
+        if (!isDone_.empty())
+            isDone_[static_cast<std::size_t>(unit)] = 1;
         report_.surfaces += surfaces;
         if (job_.tileDone) {
-            std::lock_guard const tileLock(tileLocks_[static_cast<std::size_t>(tile)]);
+            std::lock_guard const tileLock(lockOf(pixels));
             job_.tileDone(pixels, samples);
         }
         if (job_.progress)
@@ -168,13 +175,13 @@ private:
     Settings const& settings_;
     CameraRays camera_;
     PixelFilter filter_;
-    Window window_;
-    int tilesAcross_, tiles_;
-    std::int64_t units_; ///< all tiles for the first samples, then all for the next
+    std::function<RenderUnit(std::int64_t)> unitAt_;
+    std::int64_t units_;
+    std::span<char> isDone_;
     std::vector<bool (*)(CameraSample const&, float*)> layers_;
     SampleWants wants_;
     std::vector<float> shaderIds_, objectIds_; ///< of each instance
-    std::vector<std::mutex> tileLocks_;
+    std::array<std::mutex, 256> tileLocks_;
     std::atomic<std::int64_t> next_{0};
     std::mutex reportLock_;
     std::int64_t done_ = 0;
@@ -206,7 +213,8 @@ std::vector<std::string> Session::omissions()
 Film Session::newFilm() const
 {
     FilmSettings const& film = scene().film;
-    return Film(film.width, film.height, windowOf(film), chooseLayers(film.layers));
+    return Film(film.width, film.height, windowOf(film),
+                chooseLayers(film.layers, scene().settings.noise > 0.0f));
 }
 
 ObjectNames objectNames(Scene const& scene)
@@ -225,16 +233,50 @@ ObjectNames objectNames(Scene const& scene)
     return names;
 }
 
-RenderReport Session::render(Film& film, RenderJob const& job)
+namespace {
+
+RenderReport run(Rendering& rendering, RenderJob const& job)
 {
     auto const begin = std::chrono::steady_clock::now();
-    prepared_.examineMaterials();
-    Rendering rendering(prepared_, film, job);
     onThreads(job.threads, [&] { rendering.work(); });
     RenderReport report = rendering.report();
     report.seconds =
         std::chrono::duration<double>(std::chrono::steady_clock::now() - begin).count();
     return report;
+}
+
+} // namespace
+
+RenderReport Session::render(Film& film, RenderJob const& job)
+{
+    // All tiles for the first samples, then all for the next.
+    Window const window = intersection(job.window, film.window());
+    std::int64_t const across = (window.width() + kTile - 1) / kTile;
+    std::int64_t const tiles = across * ((window.height() + kTile - 1) / kTile);
+    auto const unitAt = [=, samples = job.samples](std::int64_t unit) -> RenderUnit {
+        std::uint32_t const first =
+            samples.begin + static_cast<std::uint32_t>(unit / tiles) * kSamples;
+        int const left = window.x0 + static_cast<int>(unit % tiles % across) * kTile;
+        int const top = window.y0 + static_cast<int>(unit % tiles / across) * kTile;
+        return {intersection({left, top, left + kTile, top + kTile}, window),
+                {first, std::min(first + kSamples, samples.end)}};
+    };
+    prepared_.examineMaterials();
+    std::int64_t const units =
+        tiles * ((job.samples.end - job.samples.begin + kSamples - 1) / kSamples);
+    Rendering rendering(prepared_, film, job, unitAt, units, {});
+    return run(rendering, job);
+}
+
+RenderReport Session::render(Film& film, std::span<RenderUnit const> units, std::span<char> done,
+                             RenderJob const& job)
+{
+    prepared_.examineMaterials();
+    Rendering rendering(
+        prepared_, film, job,
+        [units](std::int64_t unit) { return units[static_cast<std::size_t>(unit)]; },
+        static_cast<std::int64_t>(units.size()), done);
+    return run(rendering, job);
 }
 
 } // namespace zsi::host

@@ -4,6 +4,7 @@
 
 #include "film/film.h"
 #include "shading/preparedScene.h"
+#include "shading/shadingContext.h"
 
 #include <atomic>
 #include <cstdint>
@@ -16,12 +17,19 @@ struct SampleRange {
     std::uint32_t begin = 0, end = 0;
 };
 
+/// Samples of some pixels.
+struct RenderUnit {
+    Window pixels;
+    SampleRange samples;
+};
+
 /// What to render, and who wants to know of it.
 struct RenderJob {
     Window window; ///< of the frame; what lies outside of the film is left out
     SampleRange samples;
     int threads = 0; ///< 0: one per processor
     std::atomic<bool> const* cancel = nullptr; ///< set to stop within a sample
+    std::atomic<bool> const* pause = nullptr; ///< set to stop when the begun units are done
     /// Called from any thread, one at a time.
     std::function<void(double done)> progress = {};
     /// Called likewise: these samples of the tile are in the film, which the call may read there.
@@ -32,9 +40,10 @@ struct RenderReport {
     std::uint64_t nonFinite = 0; ///< results that were not finite and were left out
     std::vector<std::uint64_t> nonFiniteOf = {}; ///< the same by material, last the environment's
     std::uint64_t surfaces = 0; ///< camera samples that saw a surface
-    std::uint64_t rays = 0;
+    RayCounts rays;
     double seconds = 0;
     bool complete = true; ///< false: cancelled, some samples are missing
+    double noise = -1; ///< of the picture (film/noise.h), where it was asked for
 };
 
 /// Keeps a scene prepared for rendering. The scene stays its owner's, outlives the session, and may
@@ -72,6 +81,10 @@ public:
     /// Adds the samples of the job to `film`, one of `newFilm` or of another session of the same
     /// scene. Throws InputError for an unknown integrator.
     RenderReport render(Film& film, RenderJob const& job);
+    /// Likewise the samples of `units` instead of those of the job, units of the same corner one
+    /// after another; `done`: as many as units, not 0 for those whose samples are in the film.
+    RenderReport render(Film& film, std::span<RenderUnit const> units, std::span<char> done,
+                        RenderJob const& job);
 
 private:
     PreparedScene prepared_;

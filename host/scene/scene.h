@@ -104,6 +104,7 @@ struct FilmSettings {
 
 struct Settings {
     int samples = 64; ///< per pixel
+    float noise = 0.0f; ///< where it is lower (film/noise.h), no more samples; 0: all samples
     int maxDepth = 64; ///< bends and bounces one after another
     int occlusionSamples = 4; ///< rays of one occlusion query
     int indirectSamples = 1; ///< rays of one indirect-diffuse query at the first hit

@@ -139,7 +139,7 @@ bool ShadingContext::askSky(Vec3f normal, LightSample& sample)
     Vec3f const light = sky(kRayReflection, d);
     if (!(maxComponent(light) > 0.0f))
         return false;
-    ++rays_;
+    ++rays_.shadow;
     if (scene_.rays().occluded({shadowStart(call_->surface.P, d), d}, Visibility::All))
         return false;
     sample = {};
@@ -177,7 +177,7 @@ Vec3f ShadingContext::shadowTransmission(Vec3f const* from, Vec3f const* to)
 
 Vec3f ShadingContext::transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMax)
 {
-    ++rays_;
+    ++rays_.shadow;
     if (scene_.rays().occluded({origin, direction, tMax}, Visibility::Opaque))
         return {0, 0, 0};
 

@@ -75,7 +75,9 @@ void ShadingContext::start(Sampler& sampler, float rasterX, float rasterY, bool 
 
 bool ShadingContext::intersect(PathRay const& ray, SurfacePoint& surface, Vec4f& seen)
 {
-    ++rays_;
+    ++(ray.type == kRayReflection    ? rays_.reflection
+           : ray.type == kRayDiffuse ? rays_.diffuse
+                                     : rays_.camera);
     Hit hit;
     if (!scene_.rays().intersect({ray.origin, ray.direction}, Visibility::All, hit)) {
         seen = environment(ray);

@@ -18,6 +18,21 @@ struct FirstHit {
     float distance; ///< from the camera
 };
 
+/// Rays that were traced, by kind.
+struct RayCounts {
+    std::uint64_t camera = 0, reflection = 0, diffuse = 0, shadow = 0;
+
+    std::uint64_t sum() const { return camera + reflection + diffuse + shadow; }
+    void add(RayCounts const& more)
+    {
+        camera += more.camera;
+        reflection += more.reflection;
+        diffuse += more.diffuse;
+        shadow += more.shadow;
+    }
+    bool operator==(RayCounts const&) const = default;
+};
+
 /// What rays that services sent out have brought, before the services weighted it.
 struct Arrived {
     Vec3f all{0, 0, 0};
@@ -36,7 +51,7 @@ public:
 
     PreparedScene const& scene() const { return scene_; }
     Sampler& sampler() { return *sampler_; }
-    std::uint64_t rays() const { return rays_; }
+    RayCounts const& rays() const { return rays_; }
     std::uint64_t nonFinite() const { return nonFinite_; }
     /// The same by material, and behind the last one of the environment.
     std::vector<std::uint64_t> const& nonFiniteOf() const { return nonFiniteOf_; }
@@ -249,7 +264,7 @@ private:
     float sent_ = 0.0f; ///< rays that services have sent out for the camera sample
     FirstHit firstHit_ = {};
     bool hasFirstHit_ = false;
-    std::uint64_t rays_ = 0;
+    RayCounts rays_;
     std::uint64_t nonFinite_ = 0;
     std::vector<std::uint64_t> nonFiniteOf_;
 };
@@ -267,7 +282,7 @@ Vec3f ShadingContext::fromSky(std::uint32_t rayType, Value const& value, Density
     Vec3f const light = sky(rayType, d);
     if (!(maxComponent(light) > 0.0f))
         return {0, 0, 0};
-    ++rays_;
+    ++rays_.shadow;
     if (scene_.rays().occluded({shadowStart(call_->surface.P, d), d}, Visibility::All))
         return {0, 0, 0};
     Vec3f const brought = finite(sent * light / (drawn + density(d)));

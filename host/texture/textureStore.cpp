@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "texture/textureStore.h"
 
+#include "base/activity.h"
+
 #include "texture/latLong.h"
 #include "texture/textureFootprint.h"
 #include "texture/textureProbe.h"
@@ -24,6 +26,7 @@ public:
 
     void lookup(Vec4f* result, Vec2f const* uv) const override
     {
+        Doing const looking(Activity::Textures);
         if (TextureProbe* const probe = TextureProbe::current()) [[unlikely]]
             *result = probe->texel();
         else if (std::isfinite(uv->x) && std::isfinite(uv->y))
@@ -71,6 +74,7 @@ public:
 
     void lookup(Vec4f* result, Vec3f const* d) const override
     {
+        Doing const looking(Activity::Textures);
         if (std::isfinite(d->x) && std::isfinite(d->y) && std::isfinite(d->z))
             *result = lookupLatLong(picture_, *d);
     }
@@ -149,6 +153,7 @@ struct TextureStore::Impl {
     Kept<Texture2D> textures2D;
     Kept<Texture1D> textures1D;
     Kept<TextureCube> cubes;
+    std::map<void const*, TextureOrigin> origins;
 
     template <class Texture, class Make>
     Texture const* keep(Kept<Texture>& kept, std::filesystem::path const& file, ColorSpace space,
@@ -161,7 +166,9 @@ struct TextureStore::Impl {
             return found->second.get();
         PictureFile picture(file, space);
         try {
-            return kept.emplace(key, make(picture)).first->second.get();
+            Texture const* const made = kept.emplace(key, make(picture)).first->second.get();
+            origins[made] = {file, key.substr(file.string().size())};
+            return made;
         } catch (std::system_error const& error) {
             picture.fail(error.what());
         } catch (std::bad_alloc const&) {
@@ -213,6 +220,12 @@ HostTextureCube const* TextureStore::loadIrradiance(std::filesystem::path const&
                                                     ColorSpace space)
 {
     return loadCube(file, space, 1.57079633f);
+}
+
+TextureOrigin TextureStore::origin(void const* texture) const
+{
+    auto const found = impl_->origins.find(texture);
+    return found == impl_->origins.end() ? TextureOrigin() : found->second;
 }
 
 std::vector<std::string> TextureStore::warnings() const

@@ -18,6 +18,12 @@ struct TextureOptions {
     std::size_t cacheBytes = std::size_t(128) << 20;
 };
 
+/// What a texture was made of.
+struct TextureOrigin {
+    std::filesystem::path file; ///< empty for a texture of another origin
+    std::string treatment; ///< how it was read and what was made of it
+};
+
 /// Owns every texture of a scene; the same file asked for twice is one object. Look-ups may come
 /// from any number of threads. All `load` operations read the file to its end and throw InputError
 /// that names it when it is missing, no picture, damaged or cut short.
@@ -39,6 +45,8 @@ public:
     /// The same picture convolved with the cosine lobe, divided by pi: what a white diffuse surface
     /// facing a direction shows.
     HostTextureCube const* loadIrradiance(std::filesystem::path const& file, ColorSpace space);
+
+    TextureOrigin origin(void const* texture) const;
 
     /// For a user whose pictures did not fit: what to do about it. Empty while all is well.
     std::vector<std::string> warnings() const;

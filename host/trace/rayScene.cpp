@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "trace/rayScene.h"
 
+#include "base/activity.h"
 #include "base/error.h"
 
 #include <algorithm>
@@ -276,6 +277,7 @@ void RayScene::rebuildInstances(BuildProgress const& progress)
 
 bool RayScene::intersect(Ray const& ray, Visibility visible, Hit& hit) const
 {
+    Doing const tracing(Activity::Tracing);
     if (!isTraceable(ray))
         return false;
     RTCRayHit r = embreeRay(ray);
@@ -291,6 +293,7 @@ bool RayScene::intersect(Ray const& ray, Visibility visible, Hit& hit) const
 
 bool RayScene::occluded(Ray const& ray, Visibility visible) const
 {
+    Doing const tracing(Activity::Tracing);
     if (!isTraceable(ray))
         return false;
     RTCRayHit r = embreeRay(ray);

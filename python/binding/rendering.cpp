@@ -87,7 +87,7 @@ public:
             }));
         py::dict told;
         told["samples"] = count;
-        told["rays"] = report.rays;
+        told["rays"] = report.rays.sum();
         told["surfaces"] = report.surfaces;
         told["nonFinite"] = report.nonFinite;
         told["seconds"] = report.seconds;

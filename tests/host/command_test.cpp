@@ -277,29 +277,43 @@ TEST_F(Command, WithLittleMemoryThereIsThePictureOrOneLine)
 }
 #endif
 
-TEST_F(Command, CtrlCLeavesNothing)
+TEST_F(Command, WhatIsStoppedIsWrittenAndWhatIsKilledGoesOn)
 {
-    pid_t const child = fork();
-    if (child == 0) {
-        if (chdir(folder_.path.c_str()) == 0 && freopen("/dev/null", "w", stderr))
-            execl(ZSI_COMMAND, "zsi", "render", "scene.json", "-o", "a.png", "--samples", "1000000",
-                  nullptr);
-        _exit(99);
-    }
-    auto const catchesSignals = [&] { // as the kernel tells: bit 1 of a hexadecimal mask
-        std::string const state = content("/proc/" + std::to_string(child) + "/status");
-        std::size_t const at = state.find("SigCgt:");
-        return at != std::string::npos
-            && (std::strtoull(&state[at + 7], nullptr, 16) & (1u << (SIGINT - 1)));
+    std::vector<char const*> call{
+        ZSI_COMMAND, "render",   "scene.json",         "-o", "a.exr", "--samples",
+        "3000",      "--resume", "--checkpoint-every", "0",  nullptr};
+    /// Sends the signal after the render has kept its state `delay` ago; the status of the end.
+    auto const stopped = [&](int signal, int delay) {
+        fs::path const state = folder_.path / "a.exr.checkpoint";
+        std::string const before = content(state);
+        pid_t const child = fork();
+        if (child == 0) {
+            if (chdir(folder_.path.c_str()) == 0 && freopen("err", "w", stderr)
+                && freopen("/dev/null", "w", stdout))
+                execv(ZSI_COMMAND, const_cast<char* const*>(call.data()));
+            _exit(99);
+        }
+        int status = 0;
+        while (content(state) == before && waitpid(child, &status, WNOHANG) == 0)
+            std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        std::this_thread::sleep_for(std::chrono::milliseconds(delay));
+        kill(child, signal);
+        waitpid(child, &status, 0);
+        return status;
     };
-    for (int i = 0; i < 1000 && !catchesSignals(); ++i)
-        std::this_thread::sleep_for(std::chrono::milliseconds(10));
-    std::this_thread::sleep_for(std::chrono::milliseconds(300)); // to be in the middle of it
-    kill(child, SIGINT);
-    int status = 0;
-    waitpid(child, &status, 0);
+    zsi("render scene.json -o want.exr --samples 3000");
+    for (int const delay : {0, 7, 20, 3, 50}) {
+        int const status = stopped(SIGKILL, delay);
+        EXPECT_TRUE(WIFSIGNALED(status)) << "ended by itself before it was killed";
+    }
+    EXPECT_FALSE(fs::exists(folder_.path / "a.exr"));
+    int const status = stopped(SIGINT, 5);
     EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 130) << status;
-    EXPECT_EQ(files(), before_);
+    expectContains(content(folder_.path / "err"), {"zsi: interrupted; a.exr has ", " samples"});
+    EXPECT_TRUE(fs::exists(folder_.path / "a.exr"));
+    EXPECT_EQ(zsi("render scene.json -o a.exr --samples 3000 --resume").status, 0);
+    EXPECT_TRUE(content(folder_.path / "a.exr") == content(folder_.path / "want.exr"));
+    EXPECT_FALSE(fs::exists(folder_.path / "a.exr.checkpoint"));
 }
 
 } // namespace

@@ -544,7 +544,7 @@ TEST(Render, ACancelledRenderEndsSoon)
     stage.card(stage.probe([&](IShaderAPI*, ShadeState&) { cancel = true; }));
     stage.scene.film.width = stage.scene.film.height = 512;
     host::render(stage.scene, options, &report);
-    EXPECT_LT(report.rays, 1000u) << "of 262144";
+    EXPECT_LT(report.rays.sum(), 1000u) << "of 262144";
 }
 
 } // namespace
