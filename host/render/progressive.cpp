@@ -95,7 +95,9 @@ private:
     /// afterwards, else of as many as make enough units of work. False when nothing is left.
     bool pass()
     {
-        auto const [begin, active] = remaining();
+        auto const left = remaining();
+        std::uint32_t const begin = left.first;
+        std::size_t const active = left.second;
         if (active == 0)
             return false;
         std::uint32_t end = std::min(blockEnd(begin), samples_);
