@@ -61,32 +61,35 @@ public:
     {
     }
 
-    py::tuple render(std::optional<int> samples, int threads, py::object const& tell)
+    py::tuple render(std::optional<int> samples, double seconds, int threads,
+                     py::object const& tell)
     {
-        host::Scene const& scene = data_->scene();
-        int const count = samples.value_or(scene.settings.samples);
-        if (count < 1)
-            throw InputError(fmt::format("samples: expected a number above 0, got {}", count));
+        if (samples.value_or(1) < 1)
+            throw InputError(fmt::format("samples: expected a number above 0, got {}", *samples));
         if (threads < 0)
             throw InputError(fmt::format("threads: expected 0 or more, got {}", threads));
-        data_->edit(); // not while another session renders
-        Rendering const here(*data_);
+        host::Settings& settings = data_->edit().settings; // not while another session renders
+        Rendering const here(*data_, settings);
+        settings.samples = samples.value_or(settings.samples);
+        host::Scene const& scene = data_->scene();
         host::RenderReport report;
+        double taken = 0;
         auto const picture =
             std::make_shared<host::Picture>(interruptibly(tell, [&](Progress& progress) {
                 prepare(progress);
                 host::Film film = session_->newFilm();
-                host::RenderJob job;
-                job.window = film.window();
-                job.samples = {0, static_cast<std::uint32_t>(count)};
-                job.threads = threads;
-                job.cancel = &progress.cancel;
-                job.progress = [&](double done) { progress.done = done; };
-                report = session_->render(film, job);
+                host::RenderOptions options;
+                options.threads = threads;
+                options.seconds = seconds;
+                options.cancel = &progress.cancel;
+                options.progress = [&](host::RenderStatus const& s) { progress.done = s.done; };
+                report = host::renderProgressively(*session_, film, options);
+                taken = film.meanSamples();
                 return host::developed(film, scene);
             }));
         py::dict told;
-        told["samples"] = count;
+        told["samples"] = taken;
+        told["noise"] = report.noise < 0 ? py::object(py::none()) : py::float_(report.noise);
         told["rays"] = report.rays.sum();
         told["surfaces"] = report.surfaces;
         told["nonFinite"] = report.nonFinite;
@@ -95,17 +98,25 @@ public:
     }
 
 private:
-    /// Keeps edits away.
+    /// Keeps edits away, and the scene's own settings for afterwards.
     struct Rendering {
-        explicit Rendering(SceneData& d)
+        Rendering(SceneData& d, host::Settings& s)
             : data(d)
+            , settings(s)
+            , before(s)
         {
             ++data.renderings;
         }
-        ~Rendering() { --data.renderings; }
+        ~Rendering()
+        {
+            settings = before;
+            --data.renderings;
+        }
         Rendering(Rendering const&) = delete;
         Rendering& operator=(Rendering const&) = delete;
         SceneData& data;
+        host::Settings& settings;
+        host::Settings const before;
     };
 
     void prepare(Progress const& progress)

@@ -128,7 +128,8 @@ PictureSettings<Settings> const& settings()
 {
     static PictureSettings<Settings> const all(
         "settings", &Scene::settings, host::readSettings,
-        {field("samples", &Settings::samples), field("maxDepth", &Settings::maxDepth),
+        {field("samples", &Settings::samples), field("noise", &Settings::noise),
+         field("maxDepth", &Settings::maxDepth),
          field("occlusionSamples", &Settings::occlusionSamples),
          field("indirectSamples", &Settings::indirectSamples),
          field("occlusionDistance", &Settings::occlusionDistance),

@@ -73,7 +73,8 @@ class Scene:
 
 class Session:
     def __init__(self, scene: Scene) -> None: ...
-    def render(self, samples: int | None, threads: int, on_progress: Callable[[float], object] | None
+    def render(self, samples: int | None, seconds: float, threads: int,
+               on_progress: Callable[[float], object] | None
                ) -> tuple[Picture, dict[str, Any], ScreenView]: ...
 
 class Picture:

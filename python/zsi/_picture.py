@@ -28,8 +28,8 @@ class Picture(Mapping[str, FloatArray]):
             [_layer(name, values, i == 0) for i, (name, values) in enumerate(layers.items())])
         self._view = _core.ScreenView(0.0, False, "", "")
         self.report: dict[str, Any] = {}
-        """What the rendering told: samples, rays, surfaces (camera samples that saw one),
-        nonFinite (results left out), seconds."""
+        """What the rendering told: samples (of a pixel, in the mean), noise (or None), rays,
+        surfaces (camera samples that saw one), nonFinite (results left out), seconds."""
 
     def __getitem__(self, layer: str) -> FloatArray:
         return self._core.values(layer)
@@ -81,24 +81,26 @@ class Session:
         self.scene = scene
         self._core = _core.Session(scene._core)
 
-    def render(self, *, samples: int | None = None, threads: int = 0,
+    def render(self, *, samples: int | None = None, seconds: float = 0, threads: int = 0,
                on_progress: Callable[[float], object] | None = None) -> Picture:
         """Renders the scene as it is now; see `zsi.render`."""
-        made, report, view = self._core.render(samples, threads, on_progress)
+        made, report, view = self._core.render(samples, seconds, threads, on_progress)
         picture = Picture({}, _core_picture=made)
         picture.report, picture._view = report, view
         return picture
 
 
-def render(scene: Scene, *, samples: int | None = None, threads: int = 0,
+def render(scene: Scene, *, samples: int | None = None, seconds: float = 0, threads: int = 0,
            on_progress: Callable[[float], object] | None = None) -> Picture:
     """Renders a scene into a picture with the layers that its film names.
 
-    samples: a pixel's, instead of the scene's. threads: 0 for one per processor. on_progress: is
+    samples: a pixel's, instead of the scene's; fewer where ``settings.noise`` is reached. seconds:
+    above 0, ends the rendering after them. threads: 0 for one per processor. on_progress: is
     called on this thread with the share that is done, 0 to 1; what it raises ends the rendering,
     and so does Ctrl-C. The same scene and seed give the same bits with any number of threads.
     """
-    return Session(scene).render(samples=samples, threads=threads, on_progress=on_progress)
+    return Session(scene).render(samples=samples, seconds=seconds, threads=threads,
+                                 on_progress=on_progress)
 
 
 def denoise(picture: Picture, *, threads: int = 0,

@@ -262,6 +262,11 @@ class Scenes(unittest.TestCase):
         with self.assertRaises(KeyboardInterrupt):
             zsi.render(scene)
         self.assertLess(time.monotonic() - begun, 5)
+        self.assertLess(zsi.render(scene, seconds=0.3).report["seconds"], 5)
+        scene.settings.noise = 0.5
+        self.assertEqual(zsi.render(scene, samples=4).report["samples"], 4)
+        self.assertLess(zsi.render(scene).report["noise"], 0.5)
+        scene.settings.noise = 0
 
         def edit(done):
             scene.materials["paint"].u_roughValue = 1
