@@ -10,6 +10,7 @@ CameraSample Integrator::sample(Vec3f origin, Vec3f direction, float rasterX, fl
     PathRay ray;
     ray.E = ray.origin = origin;
     ray.direction = direction;
+    ray.cone = context_.cameraCone();
     std::uint64_t const before = context_.nonFinite();
     Vec4f const color = radiance(ray);
     bool const finite = isFinite(rgb(color)) && std::isfinite(color.w);

@@ -187,6 +187,9 @@ bool PathIntegrator::draw(PathRay& ray, ShadingContext::Call& call, Path& path)
     path.bends += 1;
     ShadingContext::changeMedia(ray, arrived, call.surface,
                                 material.ior ? &state.beyondIor : nullptr);
+    ray.cone = context_.bentCone(ray);
+    if (state.sampleType == kSampleMixture)
+        ray.cone = ray.cone.scattered(1.0f / state.sampleInvPdf);
     return true;
 }
 

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "shading/media.h"
+#include "shading/rayCone.h"
 
 #include <cstdint>
 #include <limits>
@@ -21,6 +22,7 @@ struct PathRay {
     int ignored = 0; ///< how many hits it passed as if nothing had been there
     float importance = 1.0f; ///< the most that it counts in the picture
     MediumStack media = {};
+    RayCone cone = {}; ///< from `E` on
     Vec3f scatteredAt{0, 0, 0}; ///< where it was last bent or bounced
     /// Of the lobe that it was drawn from, per steradian, where the lights were asked as well: what
     /// of a surface light's emission the ray stands for, and what the light list does, adds up to

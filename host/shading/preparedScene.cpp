@@ -6,6 +6,8 @@
 #include "shading/shadingContext.h"
 #include "texture/textureProbe.h"
 
+#include <array>
+#include <cmath>
 #include <cstring>
 #include <string_view>
 
@@ -168,6 +170,58 @@ void PreparedScene::meshesChanged(BuildProgress const& progress)
 {
     rays_ = RayScene(scene_, progress);
     lightsChanged();
+}
+
+struct PreparedScene::Triangle {
+    Mesh const& mesh;
+    std::array<std::uint32_t, 3> const& corner;
+    std::array<Vec3f, 3> edge; ///< world space, from each corner to the next
+};
+
+PreparedScene::Triangle PreparedScene::triangleOf(SurfacePoint const& s) const
+{
+    Instance const& instance = scene_.instances[s.instance];
+    Mesh const& mesh = scene_.meshes[static_cast<std::size_t>(instance.mesh)];
+    Triangle t{mesh, mesh.triangles[s.triangle], {}};
+    for (std::size_t i = 0; i < 3; ++i)
+        t.edge[i] =
+            transformDirection(instance.objectToWorld,
+                               mesh.positions[t.corner[(i + 1) % 3]] - mesh.positions[t.corner[i]]);
+    return t;
+}
+
+float PreparedScene::uvDensity(SurfacePoint const& s) const
+{
+    Triangle const t = triangleOf(s);
+    float const area = length(cross(t.edge[0], t.edge[1]));
+    auto const density = [&](std::vector<Vec2f> const& uv) {
+        Vec2f const a = uv[t.corner[1]] - uv[t.corner[0]], b = uv[t.corner[2]] - uv[t.corner[0]];
+        return std::sqrt(std::fabs(a.x * b.y - a.y * b.x) / area);
+    };
+    float slowest = t.mesh.uv.empty() ? 0.0f : density(t.mesh.uv);
+    if (!t.mesh.uv1.empty())
+        slowest = minOf(slowest, density(t.mesh.uv1));
+    return std::isfinite(slowest) ? slowest : 0.0f;
+}
+
+float PreparedScene::curvature(SurfacePoint const& s) const
+{
+    Triangle const t = triangleOf(s);
+    if (t.mesh.normals.empty())
+        return 0.0f;
+    Mat4f const& toWorld = scene_.instances[s.instance].objectToWorld;
+    float turn = 0.0f, size = 0.0f;
+    for (std::size_t i = 0; i < 3; ++i) {
+        // Turned as directions are: exact where the instance is not stretched.
+        Vec3f const change = transformDirection(
+            toWorld, t.mesh.normals[t.corner[(i + 1) % 3]] - t.mesh.normals[t.corner[i]]);
+        Vec3f const along = t.mesh.positions[t.corner[(i + 1) % 3]] - t.mesh.positions[t.corner[i]];
+        turn += dot(change, t.edge[i]);
+        size += length(t.edge[i]) * length(t.edge[i]) * length(t.edge[i])
+            / maxOf(length(along), 1e-30f);
+    }
+    float const k = turn / size;
+    return std::isfinite(k) ? k : 0.0f;
 }
 
 void PreparedScene::fillAttributes(SurfacePoint const& s, PreparedMaterial const& material,

@@ -97,12 +97,22 @@ public:
     void fillAttributes(SurfacePoint const& s, PreparedMaterial const& material,
                         ShadeState& state) const;
 
+    /// Texture coordinates per unit of world space around `s`: of its triangle, and of the uv set
+    /// that runs slower. 0 where they tell nothing.
+    float uvDensity(SurfacePoint const& s) const;
+    /// 1 / radius, world space, of the surface that the normals around `s` describe; positive where
+    /// it bulges to the side of `Ng`.
+    float curvature(SurfacePoint const& s) const;
+
 private:
     /// Made when it is first asked for, by whichever thread that is.
     struct Sky {
         std::once_flag made;
         DirectionMap map;
     };
+
+    struct Triangle;
+    Triangle triangleOf(SurfacePoint const& s) const;
 
     Scene const& scene_;
     RayScene rays_;

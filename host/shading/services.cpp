@@ -184,6 +184,8 @@ Vec3f ShadingContext::transmit(Vec3f E, Vec3f origin, Vec3f direction, float tMa
     PathRay ray = query(kRayShadow, direction);
     ray.E = E;
     ray.origin = origin;
+    if (call_)
+        ray.cone = call_->cone_;
     if (call_ && E == call_->surface.P)
         changeMedia(ray, call_->ray.direction, call_->surface, call_->material.ior);
     Vec3f passed{1, 1, 1};
@@ -237,6 +239,7 @@ bool ShadingContext::depart(Vec3f const* origin, Vec3f const* direction, PathRay
     ray.E = *origin;
     ray.origin = rayStart(*origin, ray.direction);
     ray.ignored = 0;
+    ray.cone = call_->cone_;
     ray.skyDensity = std::numeric_limits<float>::infinity();
     return true;
 }
@@ -249,16 +252,16 @@ bool ShadingContext::child(Vec3f const* origin, Vec3f const* direction, float im
     ray.depth += 1;
     ray.importance *= importance < 1.0f ? importance : 1.0f;
     scale = 1.0f;
-    if (!isSent(scale))
-        return false;
     float const full = ray.depth > kRouletteDepth ? 1.0f : kFullImportance;
     if (ray.importance < full) {
         float const chance = ray.importance / full;
         if (!(sampler_->next() < chance))
             return false;
-        scale /= chance;
+        scale = 1.0f / chance;
         ray.importance = full;
     }
+    if (!isSent(scale))
+        return false;
     ray.scatteredAt = *origin;
     ray.lobeDensity = std::numeric_limits<float>::infinity();
     bool const listed = scene_.lights().hasSurfaces() && call_->askedLights_;
@@ -271,6 +274,7 @@ bool ShadingContext::child(Vec3f const* origin, Vec3f const* direction, float im
     }
 
     changeMedia(ray, call_->ray.direction, call_->surface, call_->material.ior);
+    ray.cone = bentCone(ray);
     return true;
 }
 
@@ -355,13 +359,14 @@ Vec3f ShadingContext::traceLobe(Vec3f const* origin, Vec3f const* direction, flo
     if (!(spread > 0.0f))
         return rgb(answered(ray)) * scale;
     leaveToLightList(ray);
-    if (!(*origin == call_->surface.P))
-        return rgb(answered(ray)) * scale;
     auto const density = [&](Vec3f d) {
         return dot(d, side) < 0.0f ? 0.0f
                                    : host::lobeDensity(dot(axis, d), width, turn)
                 + host::lobeDensity(dot(axis, d - side * (2.0f * dot(d, side))), width, turn);
     };
+    ray.cone = ray.cone.scattered(density(ray.direction));
+    if (!(*origin == call_->surface.P))
+        return rgb(answered(ray)) * scale;
     return gather(ray, density) * scale;
 }
 
@@ -456,6 +461,7 @@ Vec3f ShadingContext::indirectDiffuse(Vec3f const* P, Vec3f const* N, float impo
         if (!child(P, &direction, importance, ray, scale))
             continue;
         ray.type = kRayDiffuse;
+        ray.cone = ray.cone.scattered(density(ray.direction));
         // Where `transfer` gives nothing, as through a leaf, the list stood for all of the lights.
         if (std::isinf(ray.lobeDensity) && call_->askedLights_)
             ray.lobeDensity = 0.0f;

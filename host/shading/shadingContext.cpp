@@ -25,6 +25,8 @@ ShadingContext::Call::Call(ShadingContext& context, PathRay const& ray_,
     , material(material_)
     , state(context.record(ray_))
     , context_(context)
+    , cone_(ray_.cone.after(length(surface_.P - ray_.E)))
+    , footprint_(context.footprint(cone_, surface_))
     , outer_(context.call_)
     , lightMark_(context.lightRecords_.mark())
 {
@@ -60,6 +62,60 @@ ShadingContext::ShadingContext(PreparedScene const& scene, RadianceSource& sourc
     , maxDepth_(static_cast<std::uint32_t>(settings_.maxDepth > 0 ? settings_.maxDepth : 0))
     , nonFiniteOf_(scene.scene().materials.size() + 1)
 {
+    for (Shader const& material : scene.scene().materials)
+        mapScales_.push_back(mapScale(material));
+    hasMaps_ = std::any_of(mapScales_.begin(), mapScales_.end(), [](float s) { return s > 0.0f; });
+}
+
+RayCone ShadingContext::cameraCone() const
+{
+    // Half a pixel: look-ups are interpolated, and several samples spread over the pixel.
+    Scene const& scene = scene_.scene();
+    return {0.0f,
+            std::tan(scene.camera.verticalFov * (3.14159265f / 360.0f))
+                / static_cast<float>(scene.film.height)};
+}
+
+RayCone ShadingContext::bentCone(PathRay const& next) const
+{
+    if (!hasMaps_)
+        return {};
+    PathRay const& ray = call_->ray;
+    SurfacePoint const& s = call_->surface;
+    float const outwards = scene_.curvature(s);
+    float const curvature = isFront(ray.direction, s.Ng) ? outwards : -outwards;
+    if (dot(ray.direction, s.Ng) * dot(next.direction, s.Ng) < 0.0f)
+        return call_->cone_.mirrored(curvature);
+    return call_->cone_.refracted(curvature, ray.media.current(), next.media.current());
+}
+
+float ShadingContext::mapScale(Shader const& material) const
+{
+    bool maps = false;
+    float slowest = std::numeric_limits<float>::infinity();
+    for (Parameter const& p : material.parameters()) {
+        if (p.type == ParameterType::Texture2D)
+            maps |= static_cast<TextureSampler2D const*>(p.field)->texture != nullptr;
+        else if (p.type == ParameterType::Mat4f) {
+            // Laid on by position, at a pace of its own.
+            auto const& m = static_cast<Mat4f const*>(p.field)->m;
+            if (std::any_of(std::begin(m), std::end(m), [](float v) { return v != 0.0f; }))
+                return 0.0f;
+        } else if (p.type == ParameterType::Mat3f) {
+            auto const& m = static_cast<Mat3f const*>(p.field)->m;
+            float const pace = minOf(std::hypot(m[0], m[1]), std::hypot(m[3], m[4]));
+            if (pace > 0.0f) // 0: not written, not used
+                slowest = minOf(slowest, pace);
+        }
+    }
+    return !maps ? 0.0f : std::isinf(slowest) ? 1.0f : slowest;
+}
+
+float ShadingContext::footprint(RayCone const& cone, SurfacePoint const& surface) const
+{
+    int const material = scene_.scene().instances[surface.instance].material;
+    float const scale = mapScales_[static_cast<std::size_t>(material)];
+    return scale > 0.0f ? std::fabs(cone.width) * scene_.uvDensity(surface) * scale : 0.0f;
 }
 
 void ShadingContext::start(Sampler& sampler, float rasterX, float rasterY, bool keepsParts)
@@ -121,6 +177,7 @@ Vec4f ShadingContext::environment(PathRay const& ray)
     EnvironmentShader const* const environment = scene_.environment();
     if (!environment)
         return {0, 0, 0, 0};
+    TextureFootprint const whole(0.0f);
     ShadeState state = record(ray);
     if (scene_.scene().environmentVisible
         && (ray.type == kRayCamera || ray.type == kRayTransmission))
@@ -262,6 +319,7 @@ void ShadingContext::passStraight(PathRay& ray, SurfacePoint const& surface)
 {
     passIgnored(ray, surface);
     ray.ignored = 0;
+    ray.cone = ray.cone.after(length(surface.P - ray.E));
     ray.E = surface.P;
     ray.passes += 1;
     if (ray.type == kRayCamera)

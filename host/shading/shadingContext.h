@@ -6,6 +6,7 @@
 #include "shading/lightParts.h"
 #include "shading/pathRay.h"
 #include "shading/preparedScene.h"
+#include "texture/textureFootprint.h"
 
 #include <optional>
 #include <zsi/vecmath.h>
@@ -51,6 +52,10 @@ public:
 
     PreparedScene const& scene() const { return scene_; }
     Sampler& sampler() { return *sampler_; }
+    /// Of a camera ray: a pixel, less what the filter of the film blurs anyway.
+    RayCone cameraCone() const;
+    /// Of a ray that leaves the running call's surface unscattered.
+    RayCone bentCone(PathRay const& next) const;
     RayCounts const& rays() const { return rays_; }
     std::uint64_t nonFinite() const { return nonFinite_; }
     /// The same by material, and behind the last one of the environment.
@@ -144,6 +149,8 @@ public:
         bool askedLights_ = false;
         bool askedSky_ = false; ///< as one of the lights
         std::optional<Vec3f> smoothStart_; ///< of shadow rays above the surface, once one asked
+        RayCone cone_; ///< of `ray`, where it met the surface
+        TextureFootprint footprint_;
         Call* outer_;
         std::size_t lightMark_;
     };
@@ -213,6 +220,12 @@ private:
     bool tellsOf(Vec3f normal);
     /// Whether it is told what is bent through the surface or lights its far side.
     bool tellsBeyond();
+    /// By material, how much slower than the mesh's own texture coordinates the slowest of its maps
+    /// runs; 0: not to be told, or there are none.
+    float mapScale(Shader const& material) const;
+    /// Width of `cone` in texture coordinates of the surface.
+    float footprint(RayCone const& cone, SurfacePoint const& surface) const;
+
     /// Colour and alpha of the environment along the ray.
     Vec4f environment(PathRay const& ray);
     /// What a ray sees of the surface light that it met.
@@ -254,6 +267,8 @@ private:
     Settings const& settings_;
     RadianceSource& source_;
     std::uint32_t maxDepth_;
+    std::vector<float> mapScales_; ///< of each material
+    bool hasMaps_ = false; ///< one of them is above 0
     LightRecords lightRecords_;
     Sampler* sampler_ = nullptr;
     Call* call_ = nullptr;

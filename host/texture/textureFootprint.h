@@ -5,7 +5,7 @@
 namespace zsi::host {
 
 /// While one lives, look-ups of 2D textures on this thread average over about `width` in texture
-/// coordinates (1: the picture's longer side) by reading smaller levels of the picture. Shaders
+/// coordinates (1: the picture) by reading smaller levels of the picture. Shaders
 /// look up points, so this is the way by which they get anything but single texels of a large
 /// picture seen from afar. Scopes nest; without one, or with width 0, textures are read at full
 /// size.

@@ -59,7 +59,8 @@ Vec4f TiledPicture::bilinear(Level const& level, float s, float t) const
 Vec4f TiledPicture::filtered(float width, float s, float t) const
 {
     Level const& first = levels_.front();
-    float const texels = width * static_cast<float>(std::max(first.width, first.height));
+    float const texels =
+        width * std::sqrt(static_cast<float>(first.width) * static_cast<float>(first.height));
     if (!(texels > 1.0f))
         return bilinear(first, s, t);
     auto const last = static_cast<float>(levels_.size() - 1);

@@ -30,7 +30,7 @@ public:
     /// Between texel centres; the picture repeats. s, t in [0, 1], t from the top.
     Vec4f bilinear(Level const& level, float s, float t) const;
     /// The same over a blend of the two levels whose texels are next to `width`, of which 1 is the
-    /// picture's longer side. Up to the size of a texel it is `bilinear` of level 0.
+    /// picture. Up to the size of a texel it is `bilinear` of level 0.
     Vec4f filtered(float width, float s, float t) const;
 
 private:

@@ -2,6 +2,7 @@
 // Small pictures with known answers.
 #include "support/hostScene.h"
 #include "support/record.h"
+#include "texture/textureFootprint.h"
 
 #include <array>
 #include <gtest/gtest.h>
@@ -457,6 +458,63 @@ TEST(Render, SurfaceLightsAreSeenAndLightTheirSurroundings)
             stage.watch(r.at + Vec3f(0, 0, 2), {0, 0, -0.5f});
             EXPECT_EQ(mean(stage.render()).x > 0, r.mesh.positions.size() > 200)
                 << "lights what lies behind: " << r.why;
+        }
+}
+
+// A chequered floor, every other texel white: from afar a sample sees the mean of many texels,
+// close up and through a magnified map the texels themselves; rays by way of a mirror keep on
+// widening.
+TEST(Render, MapsAreReadAsWideAsARayLooks)
+{
+    struct Chequer final : HostTexture2D { // tells the width that it is asked for
+        mutable std::vector<float> widths;
+        void reserved0() override { }
+        void reserved1() override { }
+        void lookup(Vec4f* result, Vec2f const*) const override
+        {
+            *result = {1, 1, 1, 1};
+            widths.push_back(host::TextureFootprint::width());
+        }
+    };
+    Mat3f magnified = Mat3f::identity();
+    magnified.m[0] = magnified.m[4] = 0.1f;
+    constexpr float kFov = 40, kHalfPixel = 0.36397023f / 8; // tan 20 degrees
+    struct Row {
+        char const* what;
+        float distance, scale;
+        bool mirrored;
+        float want; // width, of a floor 50 wide
+    };
+    for (char const* integrator : kIntegrators)
+        for (Row const& r : {Row{"near", 2, 1, false, 2 * kHalfPixel / 50},
+                             Row{"far", 50, 1, false, 50 * kHalfPixel / 50},
+                             Row{"magnified map", 2, 0.1f, false, 2 * kHalfPixel / 500},
+                             Row{"mirror", 3, 1, true, (3 + 3) * kHalfPixel / 50}}) {
+            Chequer const chequer;
+            HostTexture2D const* const map = &chequer;
+            Stage stage;
+            stage.scene.settings.integrator = integrator;
+            stage.card(stage.material(
+                           "corvid_Mtl_Ward",
+                           {{"u_diffuseMapEnable", true},
+                            {"u_diffuseMap", map},
+                            {"u_diffuseTransform", r.scale < 1 ? magnified : Mat3f::identity()}}),
+                       0, 25);
+            stage.sky(kWhiteSky);
+            stage.watch({0, 0, 0}, {0, 0, r.distance});
+            if (r.mirrored) {
+                stage.card(stage.mirror(1), 3, 2);
+                stage.scene.instances.back().objectToWorld.m[10] = -1; // faces down
+                stage.watch({0, 0, 3}, {0, 0, -r.distance + 0.001f});
+            }
+            stage.scene.camera.verticalFov = kFov;
+            stage.render(1);
+            ASSERT_FALSE(chequer.widths.empty()) << r.what;
+            std::sort(chequer.widths.begin(), chequer.widths.end());
+            float const middle = chequer.widths[chequer.widths.size() / 2];
+            // Towards the corners rays are up to 1.13 times as long.
+            EXPECT_GE(middle, r.want * 0.99f) << r.what << ' ' << integrator;
+            EXPECT_LE(middle, r.want * 1.14f) << r.what << ' ' << integrator;
         }
 }
 

@@ -314,7 +314,7 @@ TEST(Texture, AFootprintPicksTheLevelOfItsWidth)
     TextureStore store;
     auto const* const texture = store.load2D(folder.path / "a.ppm", ColorSpace::Linear);
     auto const contrast = [&](float texels) {
-        TextureFootprint const footprint(texels / 128);
+        TextureFootprint const footprint(texels / 90.509668f); // the root of 128 x 64
         return lookup(texture, Vec2f(3 / 128.0f, 0.5f)).x
             - lookup(texture, Vec2f(1 / 128.0f, 0.5f)).x;
     };
