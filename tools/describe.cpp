@@ -87,6 +87,10 @@ private:
         if (slider.step > 0)
             row["step"] = decimal(slider.step);
     }
+    static void add(Json& row, zsi::Suits const& suits)
+    {
+        row["objectSize"] = decimal(suits.objectSize);
+    }
     static void add(Json& row, zsi::When const& when)
     {
         Json condition{{"parameters", Json::array()}};

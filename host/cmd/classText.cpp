@@ -78,6 +78,12 @@ std::string rangeText(host::Parameter const& p)
 
 std::string meaningText(host::Parameter const& p)
 {
+    std::string meaning = p.about.meaning;
+    if (p.about.objectSize > 0)
+        meaning +=
+            fmt::format("; scenes that do not say take the default for an object of size {}, "
+                        "and as much more or less for others",
+                        p.about.objectSize);
     std::vector<std::string> conditions;
     for (host::Condition const& c : p.about.when) {
         std::string text = fmt::format("{}", fmt::join(c.parameters, " or "));
@@ -87,8 +93,8 @@ std::string meaningText(host::Parameter const& p)
         conditions.push_back(std::move(text));
     }
     if (conditions.empty())
-        return p.about.meaning;
-    return fmt::format("{}{}read with {}", p.about.meaning, p.about.meaning.empty() ? "" : "; ",
+        return meaning;
+    return fmt::format("{}{}read with {}", meaning, meaning.empty() ? "" : "; ",
                        fmt::join(conditions, ", "));
 }
 
@@ -176,6 +182,8 @@ Json parameterJson(host::Parameter const& p)
         if (p.about.slider->step > 0)
             json["step"] = p.about.slider->step;
     }
+    if (p.about.objectSize > 0)
+        json["objectSize"] = p.about.objectSize;
     for (host::Condition const& c : p.about.when) {
         Json condition{{"parameters", c.parameters}};
         if (c.from) {

@@ -121,6 +121,12 @@ public:
             std::fputs(fmt::format("zsi: {}, {:.2f} s\n", message, seconds).c_str(), stderr);
     }
 
+    void note(std::string const& message) const
+    {
+        if (verbose_)
+            std::fputs(("zsi: " + message + '\n').c_str(), stderr);
+    }
+
 private:
     using Clock = std::chrono::steady_clock;
     bool quiet_, verbose_;
@@ -292,6 +298,8 @@ int render(Arguments const& arguments, std::string const& shaderPath)
     if (scene.instances.empty() && !scene.environment)
         reporter.warning(scene.file + ": nothing to see: no instances and no environment");
     reporter.detail(contents(scene));
+    for (std::string const& note : scene.notes)
+        reporter.note(note);
 
     host::RenderReport report;
     host::Picture picture;

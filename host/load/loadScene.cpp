@@ -5,6 +5,7 @@
 #include "load/instances.h"
 #include "load/lights.h"
 #include "load/meshes.h"
+#include "load/objectLengths.h"
 #include "load/pictureSettings.h"
 #include "load/sceneBuilder.h"
 #include "load/sceneFile.h"
@@ -51,6 +52,7 @@ void read(JsonReader const& root, SceneBuilder& builder)
     if (auto const v = root.find("environment"))
         readEnvironment(*v, builder);
     builder.dropWholeMeshes();
+    suitOpenLengths(builder);
 }
 
 } // namespace

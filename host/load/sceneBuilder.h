@@ -47,7 +47,15 @@ public:
     /// What stands in the scene only in parts needs no memory as a whole.
     void dropWholeMeshes();
 
+    /// A length of a material that the scene does not write, by index and name.
+    struct OpenLength {
+        std::size_t material;
+        std::string parameter;
+        double objectSize; ///< for which the default is
+    };
+
     Scene& scene;
+    std::vector<OpenLength> openLengths;
     ShaderSource const& shaders;
     Names meshes{"mesh"}, materials{"material"};
 

@@ -46,6 +46,11 @@ Shader readShader(JsonReader const& reader, ShaderKind wanted, SceneBuilder& bui
             written.insert(name);
         }
     warnAboutUnwritten(reader, shader, written, builder);
+    for (Parameter const& p : shader.parameters())
+        if (p.about.objectSize > 0 && p.type == ParameterType::Float && wanted == kMaterial
+            && !written.contains(p.name))
+            builder.openLengths.push_back(
+                {builder.scene.materials.size(), p.name, p.about.objectSize});
     return shader;
 }
 

@@ -2,8 +2,8 @@
 #include "mesh/meshFile.h"
 
 #include "base/error.h"
-#include "base/names.h"
 #include "mesh/meshCompletion.h"
+#include "mesh/meshFileCheck.h"
 
 #include <algorithm>
 #include <assimp/Importer.hpp>
@@ -13,9 +13,7 @@
 #include <assimp/scene.h>
 #include <cctype>
 #include <fmt/format.h>
-#include <fstream>
 #include <set>
-#include <sstream>
 
 namespace zsi::host {
 
@@ -27,27 +25,6 @@ std::string extensionOf(std::filesystem::path const& file)
     for (char& c : extension)
         c = static_cast<char>(std::tolower(static_cast<unsigned char>(c)));
     return extension;
-}
-
-/// The importer never comes back from a PLY header that does not end or has a line of another kind.
-void checkPlyHeader(std::filesystem::path const& file)
-{
-    static std::set<std::string> const kWords{"format",  "comment",  "obj_info",
-                                              "element", "property", "end_header"};
-    constexpr int kMostLines = 1000;
-    std::ifstream in(file, std::ios::binary);
-    std::string line;
-    for (int number = 1; number <= kMostLines && std::getline(in, line); ++number) {
-        std::istringstream words(line);
-        std::string word;
-        words >> word;
-        if (number == 1 ? word != "ply" : !kWords.contains(word))
-            throw InputError(fmt::format("{}:{}: not a PLY header: \"{}\"", file.string(), number,
-                                         printable(line)));
-        if (word == "end_header")
-            return;
-    }
-    throw InputError(file.string() + ": the PLY header has no end_header");
 }
 
 /// Whether every face has corners: the importer ends the program over one that has none.
@@ -198,7 +175,11 @@ Mesh readMeshFile(std::filesystem::path const& file)
         throw InputError(file.string()
                          + ": expected a mesh file (.obj, .ply, .stl, .gltf or .glb)");
     if (extensionOf(file) == ".ply")
-        checkPlyHeader(file);
+        checkPly(file);
+    if (extensionOf(file) == ".stl")
+        checkStl(file);
+    if (extensionOf(file) == ".obj")
+        checkObj(file);
     Assimp::Importer importer;
     importer.SetPropertyInteger(AI_CONFIG_PP_SBP_REMOVE,
                                 aiPrimitiveType_POINT | aiPrimitiveType_LINE);

@@ -31,6 +31,7 @@ ParameterDescription readParameter(Json const& json)
     if (json.contains("minimum"))
         parameter.slider = {json.at("minimum").get<double>(), json.at("maximum").get<double>(),
                             json.value("step", 0.0)};
+    parameter.objectSize = json.value("objectSize", 0.0);
     for (Json const& condition : json.value("when", Json::array()))
         parameter.when.push_back(readCondition(condition));
     return parameter;

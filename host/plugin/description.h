@@ -28,6 +28,7 @@ struct ParameterDescription {
     bool hasDefault = true; ///< false: the host must write it before the shader reads it
     std::string group; ///< parameters that belong together; may be empty
     std::optional<SliderRange> slider;
+    double objectSize = 0; ///< the default, a length, is for an object so large; 0: not told
     std::vector<Condition> when; ///< the shader reads it only while all of these hold
 };
 
@@ -44,6 +45,7 @@ using LibraryDescription = std::map<std::string, ClassDescription>;
 ///   {"Class": {"summary": "...", "description": "...", "parameters": {"name": {
 ///       "meaning": "...", "default": true, "group": "...",
 ///       "minimum": 0, "maximum": 1, "step": 0.1,
+///       "objectSize": 2.5,
 ///       "when": [{"parameters": ["other"], "from": 1, "to": 3}]}}}}
 /// Other keys are for other readers. Empty when there is no such file; throws InputError when it
 /// cannot be understood.

@@ -132,6 +132,7 @@ struct Scene {
     /// shaders is the picture that is reflected.
     bool environmentVisible = false;
     std::shared_ptr<TextureStore> textures; ///< owns what the shaders' handles point to
+    std::vector<std::string> notes; ///< what the loader chose by itself
     std::vector<std::string> warnings; ///< such as a matrix that a shader will read left unwritten
 };
 

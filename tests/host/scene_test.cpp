@@ -11,6 +11,7 @@
 #include <cmath>
 #include <cstring>
 #include <ctime>
+#include <fstream>
 #include <gtest/gtest.h>
 #include <limits>
 #include <numeric>
@@ -444,6 +445,70 @@ TEST(Mesh, FilesOfEveryKindGiveTheSameTriangle)
                       1);
         EXPECT_NEAR(mesh.normals[0].z, 1.0f, 1e-5f) << "mirroring keeps the outside";
     }
+}
+
+// Flakes: 0.01 for an object of 2.5, else as much larger or smaller; of several the median.
+TEST_F(SceneFile, LengthsThatAreNotWrittenSuitTheObject)
+{
+    auto const flakes = [&](std::string const& parameters, std::string const& instances) {
+        Scene const scene = load(
+            R"({"meshes": {"m": {"box": {"size": [1, 0.1, 2]}}}, "materials": {"other": {"class":
+            "corvid_Mtl_Metal"}, "p": {"class": "corvid_Mtl_MetallicPaint", "parameters": {)"
+            + parameters + R"(}}}, "instances": {)" + instances + "}}");
+        return *static_cast<float const*>(scene.materials[1].find("u_flakeSize")->field);
+    };
+    auto const instance = [](int i, std::string const& transform, char const* material = "p") {
+        return (i ? ", \"" : "\"") + std::to_string(i) + R"(": {"mesh": "m", "material": ")"
+            + material + R"(", "transform": {)" + transform + "}}";
+    };
+    std::string const turned = instance(0, R"("scale": [10, 10, 5], "rotate": [1, 1, 0, 45])");
+    EXPECT_FLOAT_EQ(flakes("", turned), 0.04f);
+    EXPECT_FLOAT_EQ(flakes(R"("u_flakeSize": 0.02)", turned), 0.02f);
+    EXPECT_FLOAT_EQ(flakes("", instance(0, R"("scale": 5)", "other")), 0.01f) << "not in use";
+    EXPECT_FLOAT_EQ(flakes("",
+                           instance(0, R"("scale": 125)") + instance(1, R"("scale": 0.5)")
+                               + instance(2, R"("scale": 5)") + instance(3, R"("scale": 500)")
+                               + instance(4, R"("scale": 9)", "other")),
+                    0.04f);
+}
+
+// The importer leaves out what it does not find.
+TEST(Mesh, TextFilesThatAreNotWholeAreRefused)
+{
+    test::TemporaryFolder const folder;
+    auto const read = [&](fs::path const& file, std::string const& text) {
+        std::ofstream(folder.path / file, std::ios::binary) << text;
+        return readMeshFile(folder.path / file).triangles.size();
+    };
+    std::string const ply = "ply\nformat ascii 1.0\nelement vertex 4\nproperty float x\n"
+                            "property float y\nproperty float z\nelement face 2\n"
+                            "property list uchar int vertex_indices\nend_header\n"
+                            "0 0 0\n1 0 0\n1 1e-60 0\n+0 1 0\n3 0 1 2\n3 0 2 3\n";
+    std::string const facet = "facet normal 0 0 1\nouter loop\nvertex 0 0 0\nvertex 1 0 0\n"
+                              "vertex 0 1 0\nendloop\nendfacet\n";
+    std::string const stl =
+        "solid a b\n" + facet + "ENDSOLID a b\n\nsolid\n" + facet + "endsolid\n";
+    std::string const obj = "# x\nv 0 0 0 1\nv 1 0 0\nv 1 1 0\nv 0 1 0\nvt 0\n"
+                            "f 1 2// -2 # y\nf 1 \\\n3 4\n";
+    EXPECT_EQ(read("a.ply", ply), 2u);
+    EXPECT_EQ(read("a.stl", stl), 2u);
+    EXPECT_EQ(read("a.obj", obj), 2u);
+    struct Case {
+        char const* file;
+        std::string text, want;
+    };
+    auto const with = [](std::string text, std::string const& from, std::string const& to) {
+        return text.replace(text.find(from), from.size(), to);
+    };
+    for (Case const& c :
+         {Case{"a.ply", ply.substr(0, ply.rfind("3 0")), "a.ply: ends early"},
+          Case{"a.ply", with(ply, "3 0 2 3", "3 0 2 \x01"), "a.ply:15: expected a number"},
+          Case{"a.stl", stl.substr(0, stl.rfind("vertex")), "a.stl: ends early"},
+          Case{"a.stl", stl.substr(0, stl.rfind("endsolid")), "a.stl: ends early"},
+          Case{"a.stl", with(stl, "facet", "fxcet"), "a.stl:2: expected facet or endsolid"},
+          Case{"a.obj", with(obj, "1 1 0", "1 1 o"), "a.obj:4: expected a number, found \"o\""},
+          Case{"a.obj", with(obj, "2//", "2;/"), "a.obj:7: expected a corner"}})
+        expectContains(errorOf([&] { read(c.file, c.text); }), {c.want});
 }
 
 } // namespace
