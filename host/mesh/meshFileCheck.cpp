@@ -202,6 +202,8 @@ void checkObj(std::filesystem::path const& file)
                 break;
             words.number(w[i]);
         }
+        if (w[0] == "f" && w.size() < 4 && w.back() != "\\")
+            words.fail("three corners or more", w.back());
         for (std::size_t i = 1; w[0] == "f" && i < w.size(); ++i) {
             if (w[i].starts_with('#') || w[i] == "\\")
                 break;

@@ -507,7 +507,8 @@ TEST(Mesh, TextFilesThatAreNotWholeAreRefused)
           Case{"a.stl", stl.substr(0, stl.rfind("endsolid")), "a.stl: ends early"},
           Case{"a.stl", with(stl, "facet", "fxcet"), "a.stl:2: expected facet or endsolid"},
           Case{"a.obj", with(obj, "1 1 0", "1 1 o"), "a.obj:4: expected a number, found \"o\""},
-          Case{"a.obj", with(obj, "2//", "2;/"), "a.obj:7: expected a corner"}})
+          Case{"a.obj", with(obj, "2//", "2;/"), "a.obj:7: expected a corner"},
+          Case{"a.obj", obj.substr(0, obj.find(" -2")), "a.obj:7: expected three corners"}})
         expectContains(errorOf([&] { read(c.file, c.text); }), {c.want});
 }
 
