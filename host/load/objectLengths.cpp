@@ -55,7 +55,7 @@ void suitOpenLengths(SceneBuilder& builder)
         std::nth_element(sizes.begin(), middle, sizes.end());
         Shader& shader = scene.materials[open.material];
         float const length = *static_cast<float const*>(shader.find(open.parameter)->field)
-            * static_cast<float>(*middle / open.objectSize);
+            * *middle / static_cast<float>(open.objectSize);
         if (!(length > 0.0f) || !std::isfinite(length))
             continue;
         shader.set(open.parameter, length);
