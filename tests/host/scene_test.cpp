@@ -488,7 +488,7 @@ TEST(Mesh, TextFilesThatAreNotWholeAreRefused)
                               "vertex 0 1 0\nendloop\nendfacet\n";
     std::string const stl =
         "solid a b\n" + facet + "ENDSOLID a b\n\nsolid\n" + facet + "endsolid\n";
-    std::string const obj = "# x\nv 0 0 0 1\nv 1 0 0\nv 1 1 0\nv 0 1 0\nvt 0\n"
+    std::string const obj = "# x\nv 0 0 0 1\nv 1 0 0\nv 1 1 0\nv 0 1 0\nvt 0 0\n"
                             "f 1 2// -2 # y\nf 1 \\\n3 4\n";
     EXPECT_EQ(read("a.ply", ply), 2u);
     EXPECT_EQ(read("a.stl", stl), 2u);
