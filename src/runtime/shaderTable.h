@@ -12,7 +12,7 @@
 ///   when("maskingMode", 2, 4)             the shader reads it only with these values of another
 ///   when("maskingTexture")                ... with this texture bound, or this switch on
 ///   whenAny("diffuseCube", "specularCube")    ... with at least one of up to three
-///   suits(2.5f)                           the default, a length, is for an object of this size;
+///   suits(5.0f)                           the default, a length, is for an object of this size;
 ///                                         hosts may scale it to the object's own
 /// Several conditions must all hold. Facts cost the library nothing; `tools/describe.cpp` reads
 /// them.

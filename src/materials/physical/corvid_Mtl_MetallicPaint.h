@@ -23,8 +23,8 @@ namespace zsi {
       when("u_baseMap"))                                                                           \
     P(float, u_baseAmount, (1.0f), "multiplier of the base colour map", slider(0, 2))              \
     P(float, u_baseRoughValue, (0.3f), "relief of the base, 0 smooth to 1", slider(0, 1))          \
-    P(float, u_flakeSize, (0.01f), "width of a flake, world units", slider(0, 0.1f),               \
-      suits(2.5f), group("flakes"))                                                                \
+    P(float, u_flakeSize, (0.01f), "width of a flake, world units", slider(0, 0.1f), suits(5.0f),  \
+      group("flakes"))                                                                             \
     P(float, u_flakeDensity, (0.6f), "share of the surface that flakes cover, 0..1", slider(0, 1)) \
     P(float, u_flakeSpread, (0.18f), "width of the flakes' slopes, 0 lie flat, to 1",              \
       slider(0, 1))                                                                                \
