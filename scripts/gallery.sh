@@ -2,7 +2,7 @@
 # SPDX-License-Identifier: Apache-2.0
 # Renders every scene of scenes/gallery into docs/gallery, with a contact sheet.
 #   usage: scripts/gallery.sh [NAME...]     only these, such as voSpotLight
-# SAMPLES sets the samples per pixel (default 96).
+# SAMPLES sets the samples per pixel (default 16); the pictures are denoised.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 . scripts/lib/packages.sh
@@ -20,7 +20,7 @@ if [ ${#names[@]} -eq 0 ]; then
 fi
 for name in "${names[@]}"; do
     echo "$name"
-    ./build/zsi render "scenes/gallery/$name.json" -o "$out/$name.jpg" --samples "${SAMPLES:-96}"
+    ./build/zsi render "scenes/gallery/$name.json" -o "$out/$name.jpg" --samples "${SAMPLES:-16}" --denoise
 done
 
 sheet=()

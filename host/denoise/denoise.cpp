@@ -5,6 +5,7 @@
 #include "denoise/denoise.h"
 
 #include "base/error.h"
+#include "base/grid.h"
 #include "base/threads.h"
 #include "denoise/regression.h"
 #include "film/halves.h"
@@ -154,6 +155,7 @@ private:
             weight += w;
         }
         Float4 mean() const { return color * (1.0f / weight); }
+        bool isEmpty() const { return !(weight > 0.0f); }
     };
 
     /// Every `step`-th tile both ways from the `round`-th corner. False when cancelled.
@@ -188,7 +190,7 @@ private:
     static void forEachNeighbour(NoisyRaster const& picture, Window const& tile, int reach,
                                  int patch, Use const& use)
     {
-        std::vector<float> weights(static_cast<std::size_t>(tile.width() * tile.height()));
+        std::vector<float> weights(cellCount(tile.width(), tile.height()));
         for (int dy = -reach; dy <= reach; ++dy)
             for (int dx = -reach; dx <= reach; ++dx) {
                 nlMeansWeights(picture, tile, dx, dy, patch, weights.data());
@@ -202,7 +204,7 @@ private:
         std::size_t first = 1;
         for (Group const& group : groups_) {
             std::array<std::vector<Sum>, 2> sums;
-            sums.fill(std::vector<Sum>(static_cast<std::size_t>(tile.width() * tile.height())));
+            sums.fill(std::vector<Sum>(cellCount(tile.width(), tile.height())));
             float const share = 1.0f / static_cast<float>(group.channels);
             forEachNeighbour(
                 {group.mean, group.variance, {share, share, share, share}}, tile, kFeatureReach,
@@ -290,11 +292,19 @@ private:
                 excess_.pixels[share.first] + light * (share.second / sum);
     }
 
+    /// Whether a plane is made around the pixel in any case.
+    bool isCentre(std::size_t pixel) const
+    {
+        auto const width = static_cast<std::size_t>(width_);
+        return (pixel / width + pixel % width) % 2 == 0;
+    }
+
     /// Either half by planes over the features, with weights from the other half's colours. Each
-    /// plane speaks for all the pixels that it was made from.
+    /// plane speaks for all the pixels that it was made from, so every other pixel has one, and
+    /// those that are like none of these.
     void regress(Window const& tile)
     {
-        auto const pixels = static_cast<std::size_t>(tile.width() * tile.height());
+        auto const pixels = cellCount(tile.width(), tile.height());
         constexpr float kLeastWeight = 1e-3f;
         struct Neighbour {
             std::size_t pixel;
@@ -329,6 +339,12 @@ private:
                     std::size_t const p =
                         features_.index(tile.x0 + static_cast<int>(i) % tile.width(),
                                         tile.y0 + static_cast<int>(i) / tile.width());
+                    auto const near = [&](Neighbour const& n) {
+                        return isCentre(n.pixel) && weightOf(n) > kLeastWeight;
+                    };
+                    auto const& around = neighbours[1 - h][i];
+                    if (!isCentre(p) && std::any_of(around.begin(), around.end(), near))
+                        continue;
                     Regression plane;
                     for (Neighbour const& n : neighbours[1 - h][i])
                         if (weightOf(n) > kLeastWeight)
@@ -344,8 +360,15 @@ private:
 
     /// The bandwidth that is nearer to the half it has not seen, where it is, and the mean of both
     /// halves.
-    Layer result() const
+    Layer result()
     {
+        // Weights are nearly the same both ways: where none came back, the pixel is as it was.
+        for (auto& half : sums_)
+            for (auto& sums : half)
+                for (std::size_t i = 0; i < sums.pixels.size(); ++i)
+                    if (sums.pixels[i].isEmpty())
+                        sums.pixels[i].add((colors_[0].pixels[i] + colors_[1].pixels[i]) * 0.5f,
+                                           1.0f);
         Raster<Float4> errors(width_, height_);
         for (std::size_t i = 0; i < errors.pixels.size(); ++i)
             for (std::size_t k = 0; k < kBandwidths; ++k)

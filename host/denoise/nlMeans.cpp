@@ -39,9 +39,9 @@ void nlMeansWeights(NoisyRaster const& picture, Window const& tile, int dx, int 
         intersection({tile.x0 - patch, tile.y0 - patch, tile.x1 + patch, tile.y1 + patch},
                      intersection(all, {-dx, -dy, value.width - dx, value.height - dy}));
     int const width = reach.width(), height = reach.height();
-    auto const at = [width](int x, int y) { return static_cast<std::size_t>(y * width + x); };
+    auto const at = [width](int x, int y) { return cellIndex(x, y, width); };
     thread_local std::vector<float> distance, rows;
-    distance.resize(static_cast<std::size_t>(width) * static_cast<std::size_t>(height));
+    distance.resize(cellCount(width, height));
     rows.resize(distance.size());
     for (int y = 0; y < height; ++y) {
         Float4 const* const p = &value.pixels[value.index(reach.x0, reach.y0 + y)];

@@ -2,6 +2,7 @@
 /// How alike the surroundings of two pixels are, beyond their noise.
 #pragma once
 
+#include "base/grid.h"
 #include "film/window.h"
 
 #include <array>
@@ -21,16 +22,12 @@ struct Raster {
     Raster(int w, int h)
         : width(w)
         , height(h)
-        , pixels(static_cast<std::size_t>(w) * static_cast<std::size_t>(h))
+        , pixels(cellCount(w, h))
     {
     }
     T& at(int x, int y) { return pixels[index(x, y)]; }
     T const& at(int x, int y) const { return pixels[index(x, y)]; }
-    std::size_t index(int x, int y) const
-    {
-        return static_cast<std::size_t>(y) * static_cast<std::size_t>(width)
-            + static_cast<std::size_t>(x);
-    }
+    std::size_t index(int x, int y) const { return cellIndex(x, y, width); }
 };
 
 /// Mean over the square of 2 `radius` + 1 pixels around each, as far as it lies in the picture.

@@ -108,7 +108,9 @@ OIIO::ColorProcessorHandle processorOf(ScreenView const& view)
     std::vector<std::string> known = toneCurveNames();
     for (std::string const& d : config.getDisplayNames())
         for (std::string const& v : config.getViewNames(d)) {
-            known.push_back(d == config.getDefaultDisplayName() ? v : d + '/' + v);
+            known.push_back(v);
+            if (d != config.getDefaultDisplayName())
+                known.back().insert(0, d + '/');
             if (d != display || v != name)
                 continue;
             auto processor = config.createDisplayTransform(d, v, linear);

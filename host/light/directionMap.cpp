@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "light/directionMap.h"
 
+#include "base/grid.h"
+
 #include <algorithm>
 #include <cmath>
 
@@ -61,7 +63,7 @@ DirectionMap::DirectionMap(std::function<float(Vec3f)> const& radiance)
     std::vector<double> seen(std::size_t(kWidth) * kHeight);
     for (int y = 0; y < kHeight; ++y)
         for (int x = 0; x < kWidth; ++x) {
-            double& cell = seen[static_cast<std::size_t>(y) * kWidth + static_cast<std::size_t>(x)];
+            double& cell = seen[cellIndex(x, y, kWidth)];
             for (int i = 0; i < kFine * kFine; ++i) {
                 float const value =
                     radiance(direction(static_cast<float>(x) + (float(i & 1) + 0.5f) / kFine,
@@ -75,8 +77,7 @@ DirectionMap::DirectionMap(std::function<float(Vec3f)> const& radiance)
             for (int i = 0; i < 9; ++i) {
                 int const row = std::clamp(y + i / 3 - 1, 0, kHeight - 1);
                 int const column = (x + i % 3 - 1 + kWidth) % kWidth;
-                cells[static_cast<std::size_t>(y * kWidth + x)] +=
-                    kBeyond * seen[static_cast<std::size_t>(row * kWidth + column)];
+                cells[cellIndex(x, y, kWidth)] += kBeyond * seen[cellIndex(column, row, kWidth)];
             }
     double sum = 0;
     for (double const cell : cells)
@@ -110,8 +111,7 @@ DirectionMap::DirectionMap(std::function<float(Vec3f)> const& radiance)
 DirectionMap::Drawn DirectionMap::sample(Vec2f u) const
 {
     auto const first = [&](int row, float x) {
-        return int(
-            first_[static_cast<std::size_t>(row * kParts + clampedIndex(x * kParts, kParts))]);
+        return int(first_[cellIndex(clampedIndex(x * kParts, kParts), row, kParts)]);
     };
     float inRow, inColumn;
     int const row = pick(rows_.data(), kHeight, first(kHeight, u.y), u.y, inRow);

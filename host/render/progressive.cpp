@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "render/progressive.h"
 
+#include "base/grid.h"
 #include "film/noise.h"
 
 #include <algorithm>
@@ -42,7 +43,7 @@ public:
         , samples_(static_cast<std::uint32_t>(std::max(0, settings_.samples)))
         , across_((film.window().width() + kTile - 1) / kTile)
         , down_((film.window().height() + kTile - 1) / kTile)
-        , tiles_(static_cast<std::size_t>(across_) * static_cast<std::size_t>(down_))
+        , tiles_(cellCount(across_, down_))
     {
     }
 
@@ -194,7 +195,7 @@ private:
             double around = 0, count = 0;
             for (int ny = std::max(0, y - 1); ny < std::min(down_, y + 2); ++ny)
                 for (int nx = std::max(0, x - 1); nx < std::min(across_, x + 2); ++nx) {
-                    around += noise[static_cast<std::size_t>(ny * across_ + nx)];
+                    around += noise[cellIndex(nx, ny, across_)];
                     ++count;
                 }
             double const limit = static_cast<double>(settings_.noise);
