@@ -94,6 +94,7 @@ TEST(Progressive, AnInterruptedRenderGoesOnToTheSameBits)
         // More samples are added to what is there.
         stage.scene.settings.samples = 100;
         options.progress = {};
+        options.cancel = nullptr; // gone with its run
         Rendered const more = rendered(stage, options);
         host::RenderOptions const fresh{.threads = 1};
         EXPECT_TRUE(more.film.picture() == rendered(stage, fresh).film.picture());
