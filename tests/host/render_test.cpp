@@ -397,7 +397,7 @@ TEST(Render, LampsInTheSkyAreSharedWithDrawnRays)
     float const edge = std::cos(0.012217f);
     Sky const lit([&](Vec3f d) { return dot(d, lamp) > edge ? grey(1e5f) : grey(0.1f); });
     Sky const plain([](Vec3f) { return grey(0.1f); });
-    for (auto const& [name, values] : std::vector<std::pair<std::string, Stage::Values>>{
+    for (auto const& entry : std::vector<std::pair<std::string, Stage::Values>>{
              {"corvid_Mtl_Metal", {{"u_roughValue", 0.5f}}},
              {"corvid_Mtl_MetallicPaint", {{"u_flakeDensity", 0.0f}, {"u_coatRoughValue", 0.3f}}},
              {"MarlowLegacy", {{"transparencyMode", -1}, {"usingHDRbuffer", true}}}})
@@ -408,14 +408,14 @@ TEST(Render, LampsInTheSkyAreSharedWithDrawnRays)
                 stage.scene.settings.samples = 64;
                 stage.scene.settings.maxDepth = 1;
                 stage.sky(sky);
-                stage.card(stage.material(name, values));
+                stage.card(stage.material(entry.first, entry.second));
                 if (sun > 0.0f)
                     stage.scene.lights.push_back(host::SunLight{lamp, grey(sun), 1.4f});
                 stage.watch({0, 0, 0}, {-0.5f, -0.4f, 1});
                 return mean(stage.render()).z;
             };
             float const want = shown(plain, 1e5f * 2 * (1 - edge));
-            EXPECT_NEAR(shown(lit, 0) / want, 1, 0.03f) << name << ' ' << integrator;
+            EXPECT_NEAR(shown(lit, 0) / want, 1, 0.03f) << entry.first << ' ' << integrator;
         }
 }
 
