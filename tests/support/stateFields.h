@@ -11,17 +11,14 @@
 
 namespace zsi::test {
 
-#define ZSI_STATE_FIELDS(X)                                                               \
-    X(E)                                                                                  \
-    X(I)                                                                                  \
-    X(P)                                                                                  \
-    X(N)                                                                                  \
-    X(Ng)                                                                                 \
-    X(Pref) X(Nref) X(rasterX) X(rasterY) X(imageHeight) X(incomingIor) X(beyondIor)      \
-        X(objectToWorld) X(rayType) X(rayDepth) X(maxRayDepth) X(Ci) X(transmissionColor) \
-            X(sampleDirection) X(outBrdf) X(sampleCosine) X(sampleInvPdf) X(sampleType)   \
-                X(allowReflection) X(allowTransmission) X(lightPosition) X(lightAxis)     \
-                    X(lightToPoint) X(lightDistance) X(lightColor) X(lightShadow) X(discardHit)
+// clang-format off
+#define ZSI_STATE_FIELDS(X) \
+    X(E) X(I) X(P) X(N) X(Ng) X(Pref) X(Nref) X(rasterX) X(rasterY) X(imageHeight) \
+    X(incomingIor) X(beyondIor) X(objectToWorld) X(rayType) X(rayDepth) X(maxRayDepth) X(Ci) \
+    X(transmissionColor) X(sampleDirection) X(outBrdf) X(sampleCosine) X(sampleInvPdf) \
+    X(sampleType) X(allowReflection) X(allowTransmission) X(lightPosition) X(lightAxis) \
+    X(lightToPoint) X(lightDistance) X(lightColor) X(lightShadow) X(discardHit)
+// clang-format on
 
 /// Calls `visit` with each number of the field, as what it is; false when the record has no such
 /// field.
