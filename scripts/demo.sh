@@ -9,5 +9,5 @@ install_missing "${packages_build[@]}"
 cmake --preset release -DZSI_BUILD_TESTS=OFF -DZSI_BUILD_BENCH=OFF >/dev/null
 cmake --build --preset release
 mkdir -p out
-./build/zsi render scenes/demo.json -o out/demo.png "$@"
+./build/zsi render scenes/demo.json -o out/demo.png --samples 24 --denoise "$@"
 echo "The picture: $PWD/out/demo.png"
