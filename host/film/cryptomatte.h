@@ -1,7 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 /// Layers that tell by name what a pixel shows, as Friedman and Jones (2015, "Fully automatic ID
-/// mattes with support for motion blur and transparency") and the Cryptomatte specification 1.2
-/// have them: pairs of a name's number and its share of the pixel, the largest share first.
+/// mattes with support for motion blur and transparency") and version 1.2 of the published
+/// Cryptomatte format have them: pairs of a name's number and its share of the pixel, the largest
+/// share first.
 #pragma once
 
 #include "film/picture.h"
