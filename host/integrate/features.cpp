@@ -97,7 +97,7 @@ private:
             return {1, 1, 1};
         next.E = origin;
         next.direction = normalize(direction);
-        next.origin = context_.rayStart(origin, next.direction);
+        next.origin = search_.context.rayStart(origin, next.direction);
         next.ignored = 0;
         if (straight) {
             ++next.passes;

@@ -3,14 +3,14 @@
 #pragma once
 
 #include "sampling/sampler.h"
-#include "shading/noise.h"
+#include "shading/noiseServices.h"
 
 #include <zsi/zsi.h>
 
 namespace zsi::host {
 
 /// Random numbers and noise as in a rendering; no lights, and every ray sees black and is free.
-class BareServices final : public IShaderAPI {
+class BareServices final : public NoiseServices {
 public:
     /// Random numbers come from `sampler`, which must outlive this.
     explicit BareServices(Sampler& sampler)
@@ -31,12 +31,6 @@ public:
     Vec3f indirectDiffuse(V, V, float) override { return {0, 0, 0}; }
     float random() override { return sampler_.next(); }
     Vec2f random2D() override { return sampler_.next2D(); }
-    float cellNoise1D(float x) override { return host::cellNoise1D(x); }
-    float noise2D(Vec2f const* p) override { return host::noise2D(*p); }
-    float noise3DPoint(V p) override { return signedNoise3D(*p); }
-    float noise3D(Vec4f const* p) override { return noise4D(*p); }
-    float noise3DRecord(V p) override { return host::noise3D(*p); }
-    Vec3f cellNoise3D(V p) override { return host::cellNoise3D(*p); }
 
 private:
     Sampler& sampler_;

@@ -1,74 +1,75 @@
 // SPDX-License-Identifier: Apache-2.0
-/// Services that stand before a context's own.
+/// Services that stand before others.
 #pragma once
 
-#include "shading/shadingContext.h"
+#include <zsi/shaderApi.h>
 
 namespace zsi::host {
 
-/// Hands every query on to the context; those that differ are overridden.
+/// Hands every query on; those that differ are overridden.
 class ForwardedServices : public IShaderAPI {
 public:
-    explicit ForwardedServices(ShadingContext& context)
-        : context_(context)
+    explicit ForwardedServices(IShaderAPI& services)
+        : services_(services)
     {
     }
     LightSample* getLightSamples(int category, Vec3f const* P, Vec3f const* normal) override
     {
-        return context_.getLightSamples(category, P, normal);
+        return services_.getLightSamples(category, P, normal);
     }
     Vec3f ambientLight(Vec3f const* P, Vec3f const* N) override
     {
-        return context_.ambientLight(P, N);
+        return services_.ambientLight(P, N);
     }
     Vec3f shadowTransmission(Vec3f const* from, Vec3f const* to) override
     {
-        return context_.shadowTransmission(from, to);
+        return services_.shadowTransmission(from, to);
     }
     Vec3f traceContinue(int rayType, Vec3f const* origin, Vec3f const* direction,
                         float importance) override
     {
-        return context_.traceContinue(rayType, origin, direction, importance);
+        return services_.traceContinue(rayType, origin, direction, importance);
     }
     Vec3f traceReflection(Vec3f const* origin, Vec3f const* direction, float importance) override
     {
-        return context_.traceReflection(origin, direction, importance);
+        return services_.traceReflection(origin, direction, importance);
     }
     Vec4f traceThrough(Vec3f const* P, Vec3f const* I, float importance) override
     {
-        return context_.traceThrough(P, I, importance);
+        return services_.traceThrough(P, I, importance);
     }
     Vec3f traceSpecular(Vec3f const* origin, Vec3f const* direction, float spread,
                         float importance) override
     {
-        return context_.traceSpecular(origin, direction, spread, importance);
+        return services_.traceSpecular(origin, direction, spread, importance);
     }
     Vec3f traceRefraction(Vec3f const* origin, Vec3f const* direction, float spread,
                           float importance) override
     {
-        return context_.traceRefraction(origin, direction, spread, importance);
+        return services_.traceRefraction(origin, direction, spread, importance);
     }
     Vec3f occlusion(Vec3f const* P, Vec3f const* N, float importance) override
     {
-        return context_.occlusion(P, N, importance);
+        return services_.occlusion(P, N, importance);
     }
     Vec3f indirectDiffuse(Vec3f const* P, Vec3f const* N, float importance) override
     {
-        return context_.indirectDiffuse(P, N, importance);
+        return services_.indirectDiffuse(P, N, importance);
     }
-    float random() override { return context_.random(); }
-    Vec2f random2D() override { return context_.random2D(); }
-    float cellNoise1D(float x) override { return context_.cellNoise1D(x); }
-    float noise2D(Vec2f const* p) override { return context_.noise2D(p); }
-    float noise3DPoint(Vec3f const* p) override { return context_.noise3DPoint(p); }
-    float noise3D(Vec4f const* pointAndPhase) override { return context_.noise3D(pointAndPhase); }
-    float noise3DRecord(Vec3f const* p) override { return context_.noise3DRecord(p); }
-    Vec3f cellNoise3D(Vec3f const* p) override { return context_.cellNoise3D(p); }
+    float random() override { return services_.random(); }
+    Vec2f random2D() override { return services_.random2D(); }
+    float cellNoise1D(float x) override { return services_.cellNoise1D(x); }
+    float noise2D(Vec2f const* p) override { return services_.noise2D(p); }
+    float noise3DPoint(Vec3f const* p) override { return services_.noise3DPoint(p); }
+    float noise3D(Vec4f const* pointAndPhase) override { return services_.noise3D(pointAndPhase); }
+    float noise3DRecord(Vec3f const* p) override { return services_.noise3DRecord(p); }
+    Vec3f cellNoise3D(Vec3f const* p) override { return services_.cellNoise3D(p); }
 
 protected:
     ~ForwardedServices() = default;
 
-    ShadingContext& context_;
+private:
+    IShaderAPI& services_;
 };
 
 } // namespace zsi::host

@@ -1,6 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "shading/lobeProbe.h"
 
+#include "shading/forwardedServices.h"
+
 #include <algorithm>
 #include <cmath>
 
@@ -11,12 +13,9 @@ constexpr float kPi = 3.14159265f;
 constexpr int kLights = 48, kFurnaces = 64;
 
 /// One light in the list, and the same radiance along every ray.
-class Surroundings final : public IShaderAPI {
+class Surroundings final : public ForwardedServices {
 public:
-    explicit Surroundings(IShaderAPI& numbers)
-        : numbers_(numbers)
-    {
-    }
+    using ForwardedServices::ForwardedServices;
 
     LightSample light = {};
     bool isLit = false;
@@ -48,17 +47,6 @@ public:
     }
     Vec3f traceSpecular(Vec3f const*, Vec3f const*, float, float) override { return radiance; }
     Vec3f traceRefraction(Vec3f const*, Vec3f const*, float, float) override { return radiance; }
-    float random() override { return numbers_.random(); }
-    Vec2f random2D() override { return numbers_.random2D(); }
-    float cellNoise1D(float x) override { return numbers_.cellNoise1D(x); }
-    float noise2D(Vec2f const* p) override { return numbers_.noise2D(p); }
-    float noise3DPoint(Vec3f const* p) override { return numbers_.noise3DPoint(p); }
-    float noise3D(Vec4f const* p) override { return numbers_.noise3D(p); }
-    float noise3DRecord(Vec3f const* p) override { return numbers_.noise3DRecord(p); }
-    Vec3f cellNoise3D(Vec3f const* p) override { return numbers_.cellNoise3D(p); }
-
-private:
-    IShaderAPI& numbers_;
 };
 
 } // namespace

@@ -26,7 +26,11 @@ Vec3f shareOf(Vec3f part, Vec3f all)
 /// Services that write down what they answer, and answer it again with parts of light left out.
 class RecordedServices final : public ForwardedServices {
 public:
-    using ForwardedServices::ForwardedServices;
+    explicit RecordedServices(ShadingContext& context)
+        : ForwardedServices(context)
+        , context_(context)
+    {
+    }
 
     /// From now on the same answers with these parts alone, from the first on.
     void replay(unsigned parts)
@@ -213,6 +217,7 @@ private:
     std::vector<Answer> answers_;
     bool replays_ = false, hasStraight_ = false, hasIndirect_ = false;
     unsigned parts_ = 0;
+    ShadingContext& context_;
     std::size_t next_ = 0;
 };
 

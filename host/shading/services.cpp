@@ -1,7 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // The services of a shading call. docs/services.md describes them.
 #include "sampling/directions.h"
-#include "shading/noise.h"
 #include "shading/shadingContext.h"
 
 #include <limits>
@@ -500,11 +499,5 @@ Vec3f ShadingContext::shadowStart(Vec3f origin, Vec3f direction) const
 
 float ShadingContext::random() { return sampler_->next(); }
 Vec2f ShadingContext::random2D() { return sampler_->next2D(); }
-float ShadingContext::cellNoise1D(float x) { return host::cellNoise1D(x); }
-float ShadingContext::noise2D(Vec2f const* p) { return host::noise2D(*p); }
-float ShadingContext::noise3DPoint(Vec3f const* p) { return signedNoise3D(*p); }
-float ShadingContext::noise3D(Vec4f const* pointAndPhase) { return noise4D(*pointAndPhase); }
-float ShadingContext::noise3DRecord(Vec3f const* p) { return host::noise3D(*p); }
-Vec3f ShadingContext::cellNoise3D(Vec3f const* p) { return host::cellNoise3D(*p); }
 
 } // namespace zsi::host

@@ -4,6 +4,7 @@
 
 #include "sampling/sampler.h"
 #include "shading/lightParts.h"
+#include "shading/noiseServices.h"
 #include "shading/pathRay.h"
 #include "shading/preparedScene.h"
 #include "texture/textureFootprint.h"
@@ -41,7 +42,7 @@ struct Arrived {
 };
 
 /// See docs/services.md for what the record holds and what each service does.
-class ShadingContext final : public IShaderAPI {
+class ShadingContext final : public NoiseServices {
 public:
     /// Both must outlive this. `source` answers the rays that services send out.
     ShadingContext(PreparedScene const& scene, RadianceSource& source);
@@ -208,12 +209,6 @@ public:
     Vec3f indirectDiffuse(Vec3f const* P, Vec3f const* N, float importance) override;
     float random() override;
     Vec2f random2D() override;
-    float cellNoise1D(float x) override;
-    float noise2D(Vec2f const* p) override;
-    float noise3DPoint(Vec3f const* p) override;
-    float noise3D(Vec4f const* pointAndPhase) override;
-    float noise3DRecord(Vec3f const* p) override;
-    Vec3f cellNoise3D(Vec3f const* p) override;
 
 private:
     /// Whether the running call is told of light that arrives from the side of `normal`.
