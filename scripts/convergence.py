@@ -7,10 +7,12 @@
 Five like scenes at 160 x 90, every process on one core, renderers and seeds taking turns. The variance
 is that between pictures of different seeds, so each renderer is measured against its own mean; bright
 samples are clipped at 4. The time is the CPU's for a picture less that for one of 2 samples: without
-loading and building. Ratios are to Cycles; below 1 is better than it. The last column says how far the means
-of our two integrators lie apart, in standard errors, at the worst of 12 parts of the picture.
+loading and building. Ratios are to Cycles; below 1 is better than it. "Smoothed" is the variance after a
+Gaussian blur of one pixel, as a share of what independent pixels would leave: how far noise of neighbours
+cancels, for path, shade and Cycles. The last column says how far the means of our two integrators lie
+apart, in standard errors, at the worst of 12 parts of the picture.
 
-Needs python3-numpy, python3-openimageio and, for the ratios, blender; without it the numbers stand alone.
+Needs python3-numpy, python3-scipy, python3-openimageio and, for the ratios, blender; without it the numbers stand alone.
 """
 import argparse
 import json
@@ -277,9 +279,21 @@ def measure(renderers, samples, seeds, folder, keep):
     result = {}
     for name in renderers:
         stack = numpy.minimum(numpy.array(pictures[name]), CLIP)
-        cpu = (numpy.median(long[name]) - numpy.median(short[name])) * samples / (samples - FEW)
+        cpu = ((numpy.median(long[name]) - numpy.median(short[name])) * samples / (samples - FEW)
+               if samples > FEW else math.nan)  # too few to tell it from loading
         result[name] = (stack.var(axis=0, ddof=1).mean(), cpu, stack)
     return result
+
+
+def smoothed(stack):
+    """The share of independent pixels' variance that a Gaussian blur of one pixel leaves."""
+    import numpy
+    from scipy.ndimage import gaussian_filter
+    noise = stack - stack.mean(axis=0)
+    point = numpy.zeros((15, 15))
+    point[7, 7] = 1
+    independent = (noise ** 2).mean() * (gaussian_filter(point, 1) ** 2).sum()
+    return (gaussian_filter(noise, (0, 1, 1, 0))[:, 4:-4, 4:-4] ** 2).mean() / independent
 
 
 def apart(a, b):
@@ -304,8 +318,9 @@ def main():
     parser.add_argument("--pictures", help="folder for the first picture of each")
     a = parser.parse_args()
     pin = ["taskset", "-c", str(a.core)]
-    print(f"{'':9} {'variance x time':>17} {'variance':>15} {'time':>13}  apart")
-    print(f"{'':9} {'path':>8} {'shade':>8} {'path':>7} {'shade':>7} {'path':>6} {'shade':>6}")
+    print(f"{'':9} {'variance x time':>17} {'variance':>15} {'time':>13}  {'smoothed':>20}  apart")
+    print(f"{'':9} {'path':>8} {'shade':>8} {'path':>7} {'shade':>7} {'path':>6} {'shade':>6}"
+          f"  {'path':>6} {'shade':>6} {'Cycles':>6}")
     with tempfile.TemporaryDirectory() as folder:
         known = scenes(folder)
         for name in a.scenes or known:
@@ -321,8 +336,9 @@ def main():
                 renderer.close()
             (pv, pt, ps), (sv, st, ss) = r["path"], r["shade"]
             cv, ct = r["cycles"][:2] if "cycles" in r else (1, 1)
+            even = [f"{smoothed(r[i][2]):6.2f}" if i in r else f"{'-':>6}" for i in ("path", "shade", "cycles")]
             print(f"{name:9} {pv * pt / cv / ct:8.3g} {sv * st / cv / ct:8.3g} {pv / cv:7.3g} {sv / cv:7.3g}"
-                  f" {pt / ct:6.3g} {st / ct:6.3g}  {apart(ps, ss):.1f}", flush=True)
+                  f" {pt / ct:6.3g} {st / ct:6.3g}  {' '.join(even)}  {apart(ps, ss):.1f}", flush=True)
 
 
 if "bpy" in sys.modules:

@@ -589,7 +589,7 @@ TEST(Render, PicturesRepeatBitForBitOverThreadsSeedsAndCrops)
         stage.scene.settings.seed = 2;
         host::Picture const other = stage.render();
         EXPECT_NE(other.rgba(), picture.rgba());
-        expectNear(mean(other), mean(picture), 0.02f, "another seed is other noise alone");
+        expectNear(mean(other), mean(picture), 0.05f, "another seed is other noise alone");
     }
 }
 

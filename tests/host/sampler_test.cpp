@@ -13,25 +13,35 @@ using host::Sampler;
 
 namespace {
 
-// Of 2^k points of a pair of dimensions, each box of any shape of area 2^-k holds exactly one.
-TEST(Sampler, PairsAreNets)
+// Of the first 2^k samples of each pixel in an aligned block of 2^m x 2^m, each box of any shape of
+// area 2^-(k + 2m) holds exactly one point of a pair of dimensions.
+TEST(Sampler, PairsAreNetsOverSamplesAndPixels)
 {
-    int const k = 8, n = 1 << k;
-    Sampler sampler(3, 17, 5);
-    for (int dimension = 0; dimension < 5; ++dimension) {
-        std::vector<Vec2f> points;
-        for (int i = 0; i < n; ++i) {
-            sampler.start(static_cast<std::uint32_t>(i));
-            for (int d = 0; d < dimension; ++d)
-                sampler.next2D();
-            points.push_back(sampler.next2D());
-        }
-        for (int split = 0; split <= k; ++split) {
-            std::set<std::pair<int, int>> boxes;
-            for (Vec2f const p : points)
-                boxes.emplace(static_cast<int>(p.x * static_cast<float>(1 << split)),
-                              static_cast<int>(p.y * static_cast<float>(1 << (k - split))));
-            EXPECT_EQ(boxes.size(), static_cast<std::size_t>(n)) << dimension << ' ' << split;
+    struct Block {
+        int x, y, m, k;
+    };
+    for (Block const block : {Block{17, 5, 0, 8}, Block{6, 2, 1, 0}, Block{6, 2, 1, 5},
+                              Block{8, 12, 2, 0}, Block{8, 12, 2, 3}, Block{64, 32, 4, 2}}) {
+        int const size = 1 << block.m, bits = block.k + 2 * block.m, n = 1 << bits;
+        for (int dimension = 0; dimension < 5; ++dimension) {
+            std::vector<Vec2f> points;
+            for (int pixel = 0; pixel < size * size; ++pixel) {
+                Sampler sampler(3, block.x + pixel % size, block.y + pixel / size);
+                for (int i = 0; i < 1 << block.k; ++i) {
+                    sampler.start(static_cast<std::uint32_t>(i));
+                    for (int d = 0; d < dimension; ++d)
+                        sampler.next2D();
+                    points.push_back(sampler.next2D());
+                }
+            }
+            for (int split = 0; split <= bits; ++split) {
+                std::set<std::pair<int, int>> boxes;
+                for (Vec2f const p : points)
+                    boxes.emplace(static_cast<int>(p.x * static_cast<float>(1 << split)),
+                                  static_cast<int>(p.y * static_cast<float>(1 << (bits - split))));
+                EXPECT_EQ(boxes.size(), static_cast<std::size_t>(n))
+                    << block.m << ' ' << block.k << ' ' << dimension << ' ' << split;
+            }
         }
     }
 }
@@ -54,13 +64,15 @@ TEST(Sampler, PointsOfAQueryAreStratifiedOverSamples)
     EXPECT_EQ(lines.size(), static_cast<std::size_t>(samples));
 }
 
-// Dimensions, pixels and seeds are unrelated: products of centred numbers average to 0.
+// Dimensions and seeds are unrelated, and so are pixels where they do not share points: products of
+// centred numbers average to 0.
 TEST(Sampler, DimensionsPixelsAndSeedsAreUnrelated)
 {
     struct Case {
         char const* why;
         std::function<double(int)> product;
     };
+    constexpr int kLate = Sampler::kShared;
     auto const draw = [](std::uint32_t seed, int x, int y, int skip) {
         Sampler sampler(seed, x, y);
         sampler.start(0);
@@ -70,7 +82,8 @@ TEST(Sampler, DimensionsPixelsAndSeedsAreUnrelated)
     };
     Case const cases[] = {
         {"dimensions", [&](int i) { return draw(1, i, 0, 0) * draw(1, i, 0, 1); }},
-        {"neighbours", [&](int i) { return draw(1, i, 7, 0) * draw(1, i + 1, 7, 0); }},
+        {"late dimensions", [&](int i) { return draw(1, i, 0, 7) * draw(1, i, 0, kLate); }},
+        {"neighbours", [&](int i) { return draw(1, i, 7, kLate) * draw(1, i + 1, 7, kLate); }},
         {"transposed", [&](int i) { return draw(1, i, 9999, 2) * draw(1, 9999, i, 2); }},
         {"seeds", [&](int i) { return draw(1, i, 3, 0) * draw(2, i, 3, 0); }},
     };
