@@ -32,6 +32,8 @@ Subcommand addInfo(CLI::App& app, std::string const& shaderPath);
 Subcommand addRender(CLI::App& app, std::string const& shaderPath);
 Subcommand addSchema(CLI::App& app, std::string const& shaderPath);
 Subcommand addDenoise(CLI::App& app);
+Subcommand addRenderUnit(CLI::App& app, std::string const& shaderPath);
+Subcommand addMerge(CLI::App& app);
 
 /// The options of how 8-bit pictures show light.
 struct ViewOptions {

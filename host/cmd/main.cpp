@@ -69,8 +69,9 @@ int run(int argc, char** argv)
                    "ZSI_SHADER_PATH, else the folder `shaders` beside this program, else the "
                    "installed one")
         ->type_name("FOLDER[:FOLDER]");
-    Subcommand const subcommands[] = {addInfo(app, shaderPath), addRender(app, shaderPath),
-                                      addSchema(app, shaderPath), addDenoise(app)};
+    Subcommand const subcommands[] = {addInfo(app, shaderPath),       addRender(app, shaderPath),
+                                      addSchema(app, shaderPath),     addDenoise(app),
+                                      addRenderUnit(app, shaderPath), addMerge(app)};
     app.footer("Exit status: 0 done, 1 bad input, 2 bad command line, 130 interrupted.");
 
     try {
@@ -83,7 +84,8 @@ int run(int argc, char** argv)
     for (Subcommand const& subcommand : subcommands)
         if (subcommand.app->parsed())
             return subcommand.run();
-    throw UsageError("a subcommand is missing: info, render, denoise or schema (zsi --help)");
+    throw UsageError("a subcommand is missing: info, render, denoise, schema, render-unit or merge "
+                     "(zsi --help)");
 }
 
 } // namespace

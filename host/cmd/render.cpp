@@ -7,22 +7,16 @@
 #include "cmd/command.h"
 #include "cmd/interruption.h"
 #include "cmd/progressBar.h"
+#include "cmd/sceneOptions.h"
 #include "denoise/denoise.h"
 #include "film/imageFile.h"
-#include "integrate/integrators.h"
-#include "integrate/layers.h"
-#include "load/loadScene.h"
-#include "scene/resize.h"
 
 #include <CLI/CLI.hpp>
 #include <algorithm>
-#include <charconv>
 #include <chrono>
 #include <cmath>
 #include <cstdio>
 #include <fmt/format.h>
-#include <fmt/ranges.h>
-#include <limits>
 #include <memory>
 #include <optional>
 #include <sys/resource.h>
@@ -31,15 +25,11 @@
 namespace zsi::cmd {
 namespace {
 
-constexpr int kMaxThreads = 1024;
 constexpr int kMaxSamples = 1 << 20;
-constexpr int kMaxCache = 1 << 20; ///< megabytes
-constexpr int kMaxSide = 32768; ///< pixels
-constexpr std::int64_t kMaxSeed = std::numeric_limits<std::uint32_t>::max();
 
 struct Arguments {
-    std::string scene, output;
-    std::string size, crop;
+    SceneOptions scene;
+    std::string output;
     int threads = 0;
     std::optional<int> samples;
     std::optional<float> noise;
@@ -47,54 +37,10 @@ struct Arguments {
     std::string checkpoint;
     double checkpointSeconds = 30;
     bool resume = false, stats = false;
-    std::optional<std::int64_t> seed;
-    std::optional<int> textureCache; ///< megabytes
-    std::string integrator;
     ViewOptions view;
     bool denoise = false;
-    std::vector<std::string> layers, assignments;
     bool quiet = false, verbose = false;
 };
-
-/// Exactly N decimal integers with `separator` between them.
-template <std::size_t N>
-std::optional<std::array<int, N>> integers(std::string_view text, char separator)
-{
-    std::array<int, N> values{};
-    char const* at = text.data();
-    char const* const end = at + text.size();
-    for (std::size_t i = 0; i < N; ++i) {
-        if (i > 0 && (at == end || *at++ != separator))
-            return {};
-        auto const [next, error] = std::from_chars(at, end, values[i]);
-        if (error != std::errc())
-            return {};
-        at = next;
-    }
-    return at == end ? std::optional(values) : std::nullopt;
-}
-
-std::array<int, 2> parseSize(std::string const& text)
-{
-    auto const size = integers<2>(text, 'x');
-    auto const valid = [](int side) { return side >= 1 && side <= kMaxSide; };
-    if (!size || !valid((*size)[0]) || !valid((*size)[1]))
-        throw UsageError(fmt::format("--size {}: expected WIDTHxHEIGHT in pixels, such as 640x360, "
-                                     "each from 1 to {}",
-                                     host::printable(text), kMaxSide));
-    return *size;
-}
-
-std::array<int, 4> parseCrop(std::string const& text)
-{
-    auto const crop = integers<4>(text, ',');
-    if (!crop || (*crop)[0] < 0 || (*crop)[1] < 0 || (*crop)[2] <= (*crop)[0]
-        || (*crop)[3] <= (*crop)[1])
-        throw UsageError(fmt::format("--crop {}: expected X0,Y0,X1,Y1 in pixels from the top left, "
-                                     "0 <= X0 < X1 and 0 <= Y0 < Y1",
-                                     host::printable(text)));
-    return *crop;
-}
 
 /// What differs from one line of the command to the next is where it goes: warnings and what
 /// --verbose tells to stderr, the closing line to stdout.
@@ -203,59 +149,6 @@ std::string statsText(host::Scene const& scene, host::RenderReport const& report
                       nonFinite(scene, report));
 }
 
-/// The scene as the command line wants it.
-host::Scene load(Arguments const& arguments, host::ShaderLibraries const& libraries)
-{
-    std::optional<std::array<int, 2>> size;
-    if (!arguments.size.empty())
-        size = parseSize(arguments.size);
-    std::optional<std::array<int, 4>> crop;
-    if (!arguments.crop.empty())
-        crop = parseCrop(arguments.crop);
-
-    ProgressBar bar(!arguments.quiet);
-    host::LoadOptions options;
-    options.assignments = arguments.assignments;
-    if (arguments.textureCache)
-        options.textures.cacheBytes = static_cast<std::size_t>(*arguments.textureCache) << 20;
-    options.progress = [&](std::string const& path) { bar.show("loading " + path); };
-    host::Scene scene = host::loadScene(arguments.scene, libraries, options);
-    if (size)
-        host::resize(scene, (*size)[0], (*size)[1]);
-    if (crop)
-        scene.film.crop = crop;
-    if (crop && ((*crop)[2] > scene.film.width || (*crop)[3] > scene.film.height))
-        throw UsageError(fmt::format("--crop {}: reaches out of the picture, which is {}x{}",
-                                     arguments.crop, scene.film.width, scene.film.height));
-    if (arguments.samples)
-        scene.settings.samples = *arguments.samples;
-    else if (arguments.noise || arguments.seconds > 0)
-        scene.settings.samples = kMaxSamples; // what the scene says was meant for no other limit
-    if (arguments.noise)
-        scene.settings.noise = *arguments.noise;
-    if (arguments.seed)
-        scene.settings.seed = static_cast<std::uint32_t>(*arguments.seed);
-    if (!arguments.integrator.empty())
-        scene.settings.integrator = arguments.integrator;
-    if (!arguments.layers.empty())
-        scene.film.layers = arguments.layers;
-    if (arguments.denoise
-        && std::find(scene.film.layers.begin(), scene.film.layers.end(), "halves")
-            == scene.film.layers.end())
-        scene.film.layers.push_back("halves");
-    if (arguments.view.view)
-        scene.film.view = *arguments.view.view;
-    return scene;
-}
-
-/// A word of a list, or a usage error that names the option.
-void checkWord(char const* option, std::string const& word, std::vector<std::string> const& known)
-{
-    if (std::find(known.begin(), known.end(), word) == known.end())
-        throw UsageError(fmt::format("{} {}: unknown{}", option, host::printable(word),
-                                     host::suggestion(word, known)));
-}
-
 bool keepsState(Arguments const& arguments)
 {
     return arguments.resume || !arguments.checkpoint.empty();
@@ -266,20 +159,33 @@ std::string checkpointFile(Arguments const& arguments)
     return arguments.checkpoint.empty() ? arguments.output + ".checkpoint" : arguments.checkpoint;
 }
 
+/// The scene as the command line wants it.
+host::Scene load(Arguments const& arguments, host::ShaderLibraries const& libraries)
+{
+    ProgressBar bar(!arguments.quiet);
+    host::Scene scene = loadScene(arguments.scene, libraries, bar);
+    if (arguments.samples)
+        scene.settings.samples = *arguments.samples;
+    else if (arguments.noise || arguments.seconds > 0)
+        scene.settings.samples = kMaxSamples; // what the scene says was meant for no other limit
+    if (arguments.noise)
+        scene.settings.noise = *arguments.noise;
+    if (arguments.denoise
+        && std::find(scene.film.layers.begin(), scene.film.layers.end(), "halves")
+            == scene.film.layers.end())
+        scene.film.layers.push_back("halves");
+    if (arguments.view.view)
+        scene.film.view = *arguments.view.view;
+    return scene;
+}
+
 void check(Arguments const& arguments)
 {
-    if (!arguments.size.empty())
-        parseSize(arguments.size);
-    if (!arguments.crop.empty())
-        parseCrop(arguments.crop);
-    if (!arguments.integrator.empty())
-        checkWord("--integrator", arguments.integrator, host::integratorNames());
-    for (std::string const& layer : arguments.layers)
-        checkWord("--layers", layer, host::layerNames());
+    checkOptions(arguments.scene);
     host::checkPictureFile(arguments.output);
     if (keepsState(arguments))
         host::ReplacedFile::check(checkpointFile(arguments));
-    if (!arguments.layers.empty() && !host::keepsLayers(arguments.output))
+    if (!arguments.scene.layers.empty() && !host::keepsLayers(arguments.output))
         throw UsageError(fmt::format("--layers: {} has no layers; expected an .exr file",
                                      host::printable(arguments.output)));
 }
@@ -384,15 +290,13 @@ Subcommand addRender(CLI::App& app, std::string const& shaderPath)
     auto const arguments = std::make_shared<Arguments>();
     CLI::App* const command =
         app.add_subcommand("render", "Render a scene file into a picture file");
-    command->add_option("SCENE", arguments->scene, "The scene, a JSON file; - is standard input")
-        ->required();
     command
         ->add_option("-o,--output", arguments->output,
                      "The picture: .exr or .hdr linear, .png or .jpg for the screen")
         ->required()
         ->type_name("FILE");
-    command->add_option("--threads", arguments->threads, "Threads; 0 is one per processor")
-        ->check(CLI::Range(0, kMaxThreads));
+    addSceneOptions(*command, arguments->scene);
+    addThreadsOption(*command, arguments->threads);
     command->add_option("--samples", arguments->samples, "Samples a pixel, instead of the scene's")
         ->check(CLI::Range(1, kMaxSamples));
     command
@@ -419,42 +323,9 @@ Subcommand addRender(CLI::App& app, std::string const& shaderPath)
                      "fortieth of the time")
         ->check(CLI::NonNegativeNumber)
         ->type_name("SECONDS");
-    command->add_option("--size", arguments->size, "Size in pixels, instead of the scene's")
-        ->type_name("WxH");
-    command
-        ->add_option(
-            "--crop", arguments->crop,
-            "Render only this part of the picture: pixels from the top left, end exclusive")
-        ->type_name("X0,Y0,X1,Y1");
-    command
-        ->add_option("--seed", arguments->seed,
-                     "Seed of the random numbers: another one gives other noise")
-        ->check(CLI::Range(std::int64_t(0), kMaxSeed));
-    command->add_option("--integrator", arguments->integrator, "How light is gathered")
-        ->type_name(fmt::format("{}", fmt::join(host::integratorNames(), "|")));
     addViewOptions(*command, arguments->view);
     command->add_flag("--denoise", arguments->denoise,
                       "Take the noise out of the picture; keeps both of its halves apart");
-    command
-        ->add_option("--layers", arguments->layers,
-                     "Layers of an .exr beside the beauty: "
-                         + fmt::format("{}", fmt::join(host::layerNames(), ", ")))
-        ->delimiter(',')
-        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll)
-        ->allow_extra_args(false)
-        ->type_name("NAME[,NAME]");
-    command
-        ->add_option("--set", arguments->assignments,
-                     "Put a value in the place of the scene's, as often as wanted: "
-                     "materials.glass.parameters.u_ior=1.4, camera.position[2]=3")
-        ->multi_option_policy(CLI::MultiOptionPolicy::TakeAll)
-        ->allow_extra_args(false)
-        ->type_name("PATH=VALUE");
-    command
-        ->add_option("--texture-cache", arguments->textureCache,
-                     "Megabytes of pictures in memory; more than that lies in scratch files")
-        ->check(CLI::Range(1, kMaxCache))
-        ->type_name("MB");
     command->add_flag("--stats", arguments->stats,
                       "Tell of rays by kind, where the time went, memory and samples");
     command->add_flag("-q,--quiet", arguments->quiet, "Tell of nothing but errors");

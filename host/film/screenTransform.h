@@ -17,6 +17,8 @@ struct ScreenView {
     /// "DISPLAY/VIEW". Empty: the config's default view; without a config, the first tone curve.
     std::string view = {};
     std::string ocioConfig = {}; ///< an OpenColorIO config file; empty: none
+
+    bool operator==(ScreenView const&) const = default;
 };
 
 /// The default first (docs/scene-format.md tells what they do).

@@ -16,14 +16,6 @@ constexpr char const* kScene = "zsi:scene";
 constexpr char const* kVersion = "zsi:version";
 constexpr char const* kTiles = "zsi:tiles";
 
-std::string find(std::vector<Attachment> const& label, std::string const& name)
-{
-    for (Attachment const& line : label)
-        if (line.name == name)
-            return line.text;
-    return {};
-}
-
 } // namespace
 
 Checkpoint::Checkpoint(std::filesystem::path file, Scene const& scene)
@@ -54,19 +46,19 @@ bool Checkpoint::read(Film& film, std::vector<TileState>& tiles) const
                           + "; remove it to begin anew");
     };
     StoredFilm stored = readFilm(file_);
-    std::string const version = find(stored.label, kVersion);
+    std::string const version = labelText(stored.label, kVersion);
     if (version != ZSI_HOST_VERSION)
         throw refuse("it is of version " + version + ", this is " ZSI_HOST_VERSION);
     if (stored.film.frameWidth() != film.frameWidth()
         || stored.film.frameHeight() != film.frameHeight() || stored.film.window() != film.window())
         throw refuse("it is of a picture of another size or crop");
-    if (find(stored.label, kScene) != scene_)
+    if (labelText(stored.label, kScene) != scene_)
         throw refuse("it is of another scene, seed or settings");
     if (stored.film.layers() != film.layers())
         throw refuse("it has other layers, or --noise was given in one of the two runs only");
     std::vector<TileState> read;
     try {
-        for (Json const& t : Json::parse(find(stored.label, kTiles))) {
+        for (Json const& t : Json::parse(labelText(stored.label, kTiles))) {
             TileState& tile =
                 read.emplace_back(TileState{t.at(0).get<std::uint32_t>(), t.at(1).get<bool>()});
             for (std::size_t i = 2; i < t.size(); i += 2)

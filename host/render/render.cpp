@@ -3,6 +3,9 @@
 
 #include "film/cryptomatte.h"
 #include "film/halves.h"
+#include "integrate/layers.h"
+
+#include <algorithm>
 
 namespace zsi::host {
 
@@ -16,24 +19,39 @@ Picture render(Scene const& scene, RenderOptions const& options, RenderReport* r
     return developed(film, scene);
 }
 
-Picture developed(Film const& film, Scene const& scene)
+Development developmentOf(Scene const& scene)
 {
-    Picture picture = film.picture();
+    Development development;
     auto const& asked = scene.film.layers;
-    if (std::find(asked.begin(), asked.end(), "halves") != asked.end())
-        appendHalves(picture, {film.half(0), film.half(1)});
+    development.halves = std::find(asked.begin(), asked.end(), "halves") != asked.end();
+    development.opaque = scene.film.alpha == false;
+    development.view = screenView(scene.film);
     ObjectNames const names = objectNames(scene);
-    for (LayerFormat const& layer : film.layers())
+    for (LayerFormat const& layer : chooseLayers(asked, false))
         if (layer.value == LayerFormat::Value::Ids)
             for (Attachment& line : cryptomatteHeader(
                      layer.name, layer.name == "shaderId" ? names.shaders : names.objects))
-                picture.attachments.push_back(std::move(line));
-    if (scene.film.alpha == false) {
+                development.attachments.push_back(std::move(line));
+    return development;
+}
+
+Picture developed(Film const& film, Development const& development)
+{
+    Picture picture = film.picture();
+    if (development.halves)
+        appendHalves(picture, {film.half(0), film.half(1)});
+    picture.attachments = development.attachments;
+    if (development.opaque) {
         std::vector<float>& rgba = picture.layers.front().values;
         for (std::size_t i = 3; i < rgba.size(); i += 4)
             rgba[i] = 1.0f;
     }
     return picture;
+}
+
+Picture developed(Film const& film, Scene const& scene)
+{
+    return developed(film, developmentOf(scene));
 }
 
 ScreenView screenView(FilmSettings const& settings, std::string const& ocioConfig)

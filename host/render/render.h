@@ -13,7 +13,18 @@ namespace zsi::host {
 Picture render(Scene const& scene, RenderOptions const& options = {},
                RenderReport* report = nullptr);
 
+/// All of a scene that its film's sums need to become the picture.
+struct Development {
+    bool halves = false; ///< appended to the layers
+    bool opaque = false;
+    std::vector<Attachment> attachments; ///< such as manifests of names
+    ScreenView view;
+
+    bool operator==(Development const&) const = default;
+};
+Development developmentOf(Scene const& scene);
 /// The film's picture as the scene's film settings want it.
+Picture developed(Film const& film, Development const& development);
 Picture developed(Film const& film, Scene const& scene);
 /// How such a picture is shown; `ocioConfig` as in ScreenView.
 ScreenView screenView(FilmSettings const& settings, std::string const& ocioConfig = {});

@@ -210,10 +210,12 @@ std::vector<std::string> Session::omissions()
     return host::omissions(scene().settings.integrator, prepared_);
 }
 
-Film Session::newFilm() const
+Film Session::newFilm() const { return newFilm(windowOf(scene().film)); }
+
+Film Session::newFilm(Window const& window) const
 {
     FilmSettings const& film = scene().film;
-    return Film(film.width, film.height, windowOf(film),
+    return Film(film.width, film.height, window,
                 chooseLayers(film.layers, scene().settings.noise > 0.0f));
 }
 

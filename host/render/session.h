@@ -15,12 +15,16 @@ namespace zsi::host {
 /// Samples `begin` to before `end` of every pixel.
 struct SampleRange {
     std::uint32_t begin = 0, end = 0;
+
+    bool operator==(SampleRange const&) const = default;
 };
 
 /// Samples of some pixels.
 struct RenderUnit {
     Window pixels;
     SampleRange samples;
+
+    bool operator==(RenderUnit const&) const = default;
 };
 
 /// What to render, and who wants to know of it.
@@ -78,6 +82,8 @@ public:
     std::vector<std::string> omissions();
     /// An empty film with the scene's layers over its crop. Throws InputError for an unknown layer.
     Film newFilm() const;
+    /// The same over a part of the frame.
+    Film newFilm(Window const& window) const;
     /// Adds the samples of the job to `film`, one of `newFilm` or of another session of the same
     /// scene. Throws InputError for an unknown integrator.
     RenderReport render(Film& film, RenderJob const& job);

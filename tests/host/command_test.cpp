@@ -158,6 +158,41 @@ TEST_F(Command, DenoisesAfterRenderingOrLater)
     EXPECT_FALSE(fs::exists(folder_.path / "nothing.png"));
 }
 
+TEST_F(Command, UnitsOfFoldersAndListsMergeToTheBytesOfOneRender)
+{
+    std::string const options = "scene.json --set film.exposure=1 --layers halves ";
+    zsi("render " + options + "-o want.exr");
+    zsi("render scene.json --set film.exposure=1 -o want.png --denoise --view plain");
+    fs::create_directory(folder_.path / "units");
+    char const* const places[] = {"--window 0,0,32,9 ", "--window 0,9,32,32 --samples 0:1 ",
+                                  "--window 0,9,32,32 --samples 1:4 "};
+    std::string list;
+    for (char const* place : places) {
+        std::string const name = "units/" + std::to_string(list.size() / 12) + ".exr";
+        EXPECT_EQ(zsi("render-unit -q " + options + place + "-o " + name).err, "");
+        list += name + '\n';
+    }
+    std::ofstream(folder_.path / "list") << list;
+    Result const merged = zsi("merge units -o got.exr");
+    expectContains(merged.out, {"got.exr: 32x32, 4 samples a pixel, 3 units, ", " rays"});
+    EXPECT_TRUE(content(folder_.path / "got.exr") == content(folder_.path / "want.exr"));
+    zsi("merge --list - -q -o got.png --denoise --view plain --threads 1 <list");
+    EXPECT_TRUE(content(folder_.path / "got.png") == content(folder_.path / "want.png"));
+
+    fs::remove(folder_.path / "units" / "0.exr");
+    Result const lacking = zsi("merge units -o part.exr");
+    EXPECT_EQ(lacking.status, 1);
+    EXPECT_EQ(lacking.err,
+              "zsi: missing: samples 0 to 4 of 0,0,32,9 (--partial takes what there is)\n");
+    fs::resize_file(folder_.path / "units" / "1.exr", 3000);
+    EXPECT_EQ(zsi("merge units --partial -o /proc/a.exr").status, 1);
+    EXPECT_FALSE(fs::exists(folder_.path / "part.exr"));
+    Result const partial = zsi("merge units --partial -o part.exr");
+    EXPECT_EQ(partial.status, 0);
+    expectContains(partial.err, {"warning: units/1.exr: ", "left out"});
+    expectContains(partial.out, {"1 units", "missing: samples 0 to 4 of 0,0,32,9; samples 0 to 1"});
+}
+
 TEST_F(Command, ProgressFitsTheTerminal)
 {
     for (unsigned short const columns : std::array<unsigned short, 2>{30, 100}) {
@@ -193,7 +228,7 @@ TEST_F(Command, BadCallsEndInOneLineAndLeaveNothing)
     };
     std::string const render = "render scene.json -o a.png ";
     Call const calls[] = {
-        {"", 2, {"info, render, denoise or schema"}},
+        {"", 2, {"info, render, denoise, schema"}},
         {"rendr scene.json", 2, {"rendr", "did you mean render?"}},
         {"info a b", 2, {"unexpected argument"}},
         {"--threads 2 render scene.json -o a.png", 2, {"behind the subcommand"}},
@@ -209,6 +244,12 @@ TEST_F(Command, BadCallsEndInOneLineAndLeaveNothing)
         {render + "--ocio none.ocio", 1, {"none.ocio"}},
         {render + "--layers depth", 2, {"--layers", "expected an .exr"}},
         {render + "--set film.width=0", 1, {"--set: film.width: expected"}},
+        {"render-unit scene.json -o a.exr --samples 4:4", 2, {"--samples 4:4", "A:B"}},
+        {"render-unit scene.json -o a.exr --samples 0:9", 1, {"0 to 9", "has 4"}},
+        {"render-unit scene.json -o a.png", 2, {".exr"}},
+        {"merge -o a.exr", 2, {"no units"}},
+        {"merge . -o a.exr", 1, {".: has no .exr files"}},
+        {"merge scene.json -o a.exr", 1, {"scene.json"}},
         {"info --shader-path " ZSI_FIXTURE_DIR "/oldShaders", 1, {"version 2700", "version 2722"}},
         // Before the scene is looked at, since that may take long.
         {"render missing.json -o /proc/a.png", 1, {"/proc/a.png: cannot be written"}},
