@@ -185,7 +185,7 @@ int merge(Arguments const& arguments)
         options.threads = arguments.threads;
         options.cancel = &interrupted;
         options.progress = [&](double done) { bar.show("denoising", done); };
-        if (auto result = host::denoised(std::move(picture), options))
+        if (auto result = host::denoised(picture, options))
             picture = std::move(*result);
     }
     if (int const status = interruption.resume()) {
