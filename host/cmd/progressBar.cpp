@@ -30,8 +30,8 @@ std::string clockText(double seconds)
 
 } // namespace
 
-ProgressBar::ProgressBar(bool wanted)
-    : terminal_(wanted && isatty(STDERR_FILENO) == 1)
+ProgressBar::ProgressBar(Style style)
+    : style_(style == Style::Terminal && isatty(STDERR_FILENO) != 1 ? Style::None : style)
     , begin_(Clock::now())
     , next_(begin_)
 {
@@ -45,8 +45,10 @@ ProgressBar::~ProgressBar()
 
 void ProgressBar::show(std::string const& what)
 {
-    if (terminal_)
+    if (style_ == Style::Terminal)
         draw(what);
+    else if (style_ == Style::Lines)
+        write(0.0, what);
 }
 
 void ProgressBar::show(std::string const& what, double done, std::string const& detail)
@@ -56,9 +58,13 @@ void ProgressBar::show(std::string const& what, double done, std::string const& 
         what_ = what;
         begin_ = next_ = now;
     }
-    if (!terminal_ || now < next_ || !(done > 0.0))
+    if (style_ == Style::None || now < next_ || !(done > 0.0))
         return;
     next_ = now + std::chrono::milliseconds(200);
+    if (style_ == Style::Lines) {
+        write(done, detail.empty() ? what : what + ", " + detail);
+        return;
+    }
     double const elapsed = std::chrono::duration<double>(now - begin_).count();
     std::string const percent = fmt::format("{:3.0f}%", std::floor(done * 100.0));
     std::string const head = what + ' ';
@@ -75,6 +81,11 @@ void ProgressBar::show(std::string const& what, double done, std::string const& 
     std::size_t const marks = std::min(room - text, kMostMarks);
     auto const filled = static_cast<std::size_t>(done * static_cast<double>(marks));
     draw(head + '[' + std::string(filled, '#') + std::string(marks - filled, '.') + ']' + tail);
+}
+
+void ProgressBar::write(double done, std::string const& what)
+{
+    std::fputs(fmt::format("zsi: progress {:.4f} {}\n", done, what).c_str(), stderr);
 }
 
 void ProgressBar::draw(std::string const& line)

@@ -39,7 +39,8 @@ struct Arguments {
     bool resume = false, stats = false;
     ViewOptions view;
     bool denoise = false;
-    bool quiet = false, verbose = false;
+    double previewSeconds = 0;
+    bool quiet = false, verbose = false, progress = false;
 };
 
 /// What differs from one line of the command to the next is where it goes: warnings and what
@@ -149,6 +150,13 @@ std::string statsText(host::Scene const& scene, host::RenderReport const& report
                       nonFinite(scene, report));
 }
 
+ProgressBar::Style progressStyle(Arguments const& arguments)
+{
+    return arguments.progress ? ProgressBar::Style::Lines
+        : arguments.quiet     ? ProgressBar::Style::None
+                              : ProgressBar::Style::Terminal;
+}
+
 bool keepsState(Arguments const& arguments)
 {
     return arguments.resume || !arguments.checkpoint.empty();
@@ -162,7 +170,7 @@ std::string checkpointFile(Arguments const& arguments)
 /// The scene as the command line wants it.
 host::Scene load(Arguments const& arguments, host::ShaderLibraries const& libraries)
 {
-    ProgressBar bar(!arguments.quiet);
+    ProgressBar bar(progressStyle(arguments));
     host::Scene scene = loadScene(arguments.scene, libraries, bar);
     if (arguments.samples)
         scene.settings.samples = *arguments.samples;
@@ -212,7 +220,7 @@ int render(Arguments const& arguments, std::string const& shaderPath)
     std::string samples;
     std::array<std::uint64_t, host::kActivities> seen{};
     try {
-        ProgressBar bar(!arguments.quiet);
+        ProgressBar bar(progressStyle(arguments));
         std::atomic<bool> const& interrupted = interruption.defer();
         host::Session session(scene, [&](double done) {
             bar.show("building", done);
@@ -232,6 +240,11 @@ int render(Arguments const& arguments, std::string const& shaderPath)
         if (keepsState(arguments))
             options.checkpoint = checkpointFile(arguments);
         options.checkpointSeconds = arguments.checkpointSeconds;
+        if (arguments.previewSeconds > 0)
+            options.preview = [&](host::Film const& soFar) {
+                host::writePicture(arguments.output, host::developed(soFar, scene), view);
+            };
+        options.previewSeconds = arguments.previewSeconds;
         std::optional<host::ActivitySampler> activity;
         if (arguments.stats)
             activity.emplace();
@@ -323,11 +336,20 @@ Subcommand addRender(CLI::App& app, std::string const& shaderPath)
                      "fortieth of the time")
         ->check(CLI::NonNegativeNumber)
         ->type_name("SECONDS");
+    command
+        ->add_option("--preview-every", arguments->previewSeconds,
+                     "Write the picture so far to FILE every so many seconds, so that it can be "
+                     "watched")
+        ->check(CLI::PositiveNumber)
+        ->type_name("SECONDS");
     addViewOptions(*command, arguments->view);
     command->add_flag("--denoise", arguments->denoise,
                       "Take the noise out of the picture; keeps both of its halves apart");
     command->add_flag("--stats", arguments->stats,
                       "Tell of rays by kind, where the time went, memory and samples");
+    command->add_flag("--progress", arguments->progress,
+                      "Tell on stderr how far it is, in lines \"zsi: progress SHARE WHAT\", SHARE "
+                      "from 0 to 1");
     command->add_flag("-q,--quiet", arguments->quiet, "Tell of nothing but errors");
     command
         ->add_flag("-v,--verbose", arguments->verbose, "Tell what is loaded and how long it takes")

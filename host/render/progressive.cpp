@@ -17,8 +17,8 @@ constexpr std::uint32_t kBlock = 16;
 constexpr int kTile = 16;
 /// Units of work in a pass where nothing has to be decided between blocks.
 constexpr std::size_t kUnits = 4096;
-/// Checkpoints take at most this share of the time.
-constexpr double kCheckpointShare = 1.0 / 40;
+/// Checkpoints and previews take at most these shares of the time.
+constexpr double kCheckpointShare = 1.0 / 40, kPreviewShare = 1.0 / 10;
 
 double now()
 {
@@ -55,6 +55,7 @@ public:
             checkpointDue_ = now() + options_.checkpointSeconds;
         }
         double const begin = now();
+        previewDue_ = begin + options_.previewSeconds;
         end_ = options_.seconds > 0 ? begin + options_.seconds : 0;
         while (!stopped() && pass()) { }
         if (checkpoint_)
@@ -68,6 +69,7 @@ public:
 private:
     bool isAdaptive() const { return settings_.noise > 0.0f; }
     bool isCancelled() const { return options_.cancel && options_.cancel->load(); }
+    bool isPreviewDue() const { return options_.preview && now() >= previewDue_; }
     bool timeIsOver() const { return end_ > 0 && now() >= end_; }
     bool stopped() const { return isCancelled() || timeIsOver(); }
     bool isDone(TileState const& tile) const { return tile.isGood || tile.next >= samples_; }
@@ -132,13 +134,16 @@ private:
             judge();
         if (checkpoint_ && now() >= checkpointDue_)
             keep();
+        if (isPreviewDue() && !stopped() && remaining().second > 0)
+            show();
         return true;
     }
 
     /// Called while a pass runs.
     void tell(std::uint32_t begin, std::uint32_t end, double share)
     {
-        if (timeIsOver() || (checkpoint_ && now() >= checkpointDue_))
+        if (timeIsOver() || (checkpoint_ && now() >= checkpointDue_)
+            || (begin > 0 && isPreviewDue())) // not before every pixel has a sample
             pause_ = true;
         if (!options_.progress)
             return;
@@ -215,6 +220,14 @@ private:
         checkpointDue_ = now() + std::max(options_.checkpointSeconds, took / kCheckpointShare);
     }
 
+    void show()
+    {
+        double const begin = now();
+        options_.preview(film_);
+        double const took = now() - begin;
+        previewDue_ = now() + std::max(options_.previewSeconds, took / kPreviewShare);
+    }
+
     Session& session_;
     Film& film_;
     RenderOptions const& options_;
@@ -226,7 +239,7 @@ private:
     std::vector<std::size_t> tileOf_; ///< each unit's
     std::atomic<bool> pause_ = false;
     std::optional<Checkpoint> checkpoint_;
-    double checkpointDue_ = 0, end_ = 0; ///< clock time
+    double checkpointDue_ = 0, previewDue_ = 0, end_ = 0; ///< clock time
     double noise_ = -1, judgedAt_ = 1;
     RenderReport report_;
 };

@@ -24,6 +24,10 @@ struct RenderOptions {
     std::filesystem::path checkpoint = {};
     /// Between two of them, and more where they take more than a fortieth of the time.
     double checkpointSeconds = 30;
+    /// Gets the film as it is, between two passes, at least `previewSeconds` after the last time,
+    /// and later where it takes long itself.
+    std::function<void(Film const&)> preview = {};
+    double previewSeconds = 1;
 };
 
 /// Adds samples of the scene's film: up to `settings.samples` of each pixel; with `settings.noise`

@@ -219,6 +219,35 @@ TEST_F(Command, ProgressFitsTheTerminal)
     }
 }
 
+TEST_F(Command, ProgramsFollowTheRenderByLinesAndPreviews)
+{
+    zsi("render scene.json -o want.exr --samples 200 --size 200x200");
+    Result const r = zsi("render scene.json -q -o a.exr --samples 200 --size 200x200 --progress "
+                         "--preview-every 0.001",
+                         "{ timeout 60 sh -c 'until [ -s seen.exr ]; do cp a.exr seen.exr; done' "
+                         "2>/dev/null & } ;");
+    ASSERT_EQ(r.status, 0) << r.err;
+    EXPECT_TRUE(content(folder_.path / "a.exr") == content(folder_.path / "want.exr"));
+    EXPECT_EQ(host::readPicture(folder_.path / "seen.exr").width(), 200);
+    EXPECT_FALSE(content(folder_.path / "seen.exr") == content(folder_.path / "want.exr"));
+    std::istringstream lines(r.err);
+    double last = 0;
+    int rendering = 0;
+    for (std::string line, name, word, what; std::getline(lines, line);) {
+        std::istringstream words(line);
+        double share = -1;
+        words >> name >> word >> share >> what;
+        EXPECT_EQ(name + word, "zsi:progress") << line;
+        if (what != "rendering,")
+            continue;
+        ++rendering;
+        EXPECT_GE(share, last) << line;
+        EXPECT_LE(share, 1.0) << line;
+        last = share;
+    }
+    EXPECT_GT(rendering, 0) << r.err;
+}
+
 TEST_F(Command, BadCallsEndInOneLineAndLeaveNothing)
 {
     struct Call {
