@@ -94,6 +94,24 @@ bool LightSet::isSpread(std::size_t light) const
     return true;
 }
 
+namespace {
+
+/// What of the light goes in a unit direction.
+float inCone(PointLight const& light, Vec3f direction)
+{
+    constexpr float kHalf = 3.14159265f / 360.0f; // of an angle in degrees, radians
+    if (light.angle >= 360.0f)
+        return 1.0f;
+    float const cosine = dot(direction, light.axis);
+    float const outer = std::cos(light.angle * kHalf), inner = std::cos(light.innerAngle * kHalf);
+    if (cosine >= inner || cosine <= outer)
+        return cosine >= inner ? 1.0f : 0.0f;
+    float const t = (cosine - outer) / (inner - outer);
+    return t * t * (3.0f - 2.0f * t);
+}
+
+} // namespace
+
 std::optional<Arrival> LightSet::arrival(std::size_t light, Vec3f P, Vec3f normal, Vec2f u) const
 {
     constexpr float kPi = 3.14159265f;
@@ -117,7 +135,7 @@ std::optional<Arrival> LightSet::arrival(std::size_t light, Vec3f P, Vec3f norma
         if (!(squared > 0.0f))
             return {};
         a.L = normalize(way);
-        a.color = point->color / squared;
+        a.color = point->color * (inCone(*point, middle / -std::sqrt(squared)) / squared);
     } else {
         EmittingSurface const& surface = *surfaces_[light];
         EmittingPoint const from = surface.sample(u);

@@ -33,6 +33,23 @@ PointLight readPointLight(JsonReader const& reader)
     return light;
 }
 
+PointLight readSpotLight(JsonReader const& reader)
+{
+    reader.expectKeys(
+        {"kind", "position", "target", "axis", "color", "radius", "angle", "innerAngle"});
+    PointLight light{readPosition(reader.at("position"))};
+    if (reader.find("target") || reader.find("axis"))
+        light.axis = readAxis(reader, light.position);
+    if (auto const v = reader.find("color"))
+        light.color = v->toVec3f();
+    if (auto const v = reader.find("radius"))
+        light.radius = v->toFloat(0, kFarthest);
+    auto const angle = reader.find("angle"), inner = reader.find("innerAngle");
+    light.angle = angle ? angle->toFloat(0, 360) : 45.0f;
+    light.innerAngle = inner ? inner->toFloat(0, light.angle) : light.angle;
+    return light;
+}
+
 SunLight readSunLight(JsonReader const& reader)
 {
     reader.expectKeys({"kind", "direction", "angle", "color"});
@@ -63,18 +80,20 @@ Light placedLight(JsonReader const& reader, SceneBuilder& builder)
     auto const kind = reader.find("kind");
     if (!kind)
         return readShaderLight(reader, builder);
-    switch (kind->toChoice({"point", "sun", "rectangle", "disc", "mesh"})) {
+    switch (kind->toChoice({"point", "spot", "sun", "rectangle", "disc", "mesh"})) {
     case 0:
         return readPointLight(reader);
     case 1:
+        return readSpotLight(reader);
+    case 2:
         return readSunLight(reader);
-    case 2: {
+    case 3: {
         reader.expectKeys({"kind", "position", "target", "axis", "up", "size", "emission"});
         std::vector<float> const s = readSize(reader, 2);
         return readSurfaceLight(reader, builder.addMesh(planeMesh({s[0], s[1]})), readPose(reader),
                                 builder);
     }
-    case 3: {
+    case 4: {
         reader.expectKeys({"kind", "position", "target", "axis", "radius", "emission"});
         auto const radius = reader.find("radius");
         return readSurfaceLight(reader,

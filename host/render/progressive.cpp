@@ -155,7 +155,8 @@ private:
                                 * std::pow(static_cast<double>(settings_.noise) / noise_, 2.0));
         if (end_ > 0)
             done = std::max(done, 1 - (end_ - now()) / options_.seconds);
-        options_.progress({std::min(done, 1.0), at, noise_});
+        told_ = std::max(told_, std::min(done, 1.0)); // a pass that was cut short begins lower
+        options_.progress({told_, at, noise_});
     }
 
     void add(RenderReport const& part)
@@ -240,7 +241,7 @@ private:
     std::atomic<bool> pause_ = false;
     std::optional<Checkpoint> checkpoint_;
     double checkpointDue_ = 0, previewDue_ = 0, end_ = 0; ///< clock time
-    double noise_ = -1, judgedAt_ = 1;
+    double noise_ = -1, judgedAt_ = 1, told_ = 0;
     RenderReport report_;
 };
 

@@ -59,11 +59,16 @@ struct ShaderLight {
     float radius = 0.0f; ///< > 0: a ball that shadows sample, for soft edges
 };
 
-/// A ball that shines alike in all directions and falls off with the square of the distance.
+/// A ball that shines alike in all directions of its cone and falls off with the square of the
+/// distance.
 struct PointLight {
     Vec3f position;
     Vec3f color{1, 1, 1}; ///< that arrives at distance 1
     float radius = 0.0f;
+    Vec3f axis{0, 0, -1}; ///< unit, of the cone
+    /// Across, degrees: full within the inner one, dark outside, a smoothstep of the cosine between;
+    /// 360 is all around.
+    float innerAngle = 360.0f, angle = 360.0f;
 };
 
 /// A light so far away that its rays are parallel but for its angle.

@@ -47,7 +47,11 @@ public:
         add(l.shader);
         add(l.position, l.axis, l.radius);
     }
-    void operator()(PointLight const& l) { add(l.position, l.color, l.radius); }
+    void operator()(PointLight const& l)
+    {
+        add(l.position, l.color, l.radius);
+        add(l.axis, l.innerAngle, l.angle);
+    }
     void operator()(SunLight const& l) { add(l.direction, l.color, l.angle); }
     void operator()(SurfaceLight const& l) { add(l.instance, l.emission); }
 

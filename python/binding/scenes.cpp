@@ -344,6 +344,7 @@ std::vector<std::pair<std::string, LightField>> fieldsOf(SceneData& data, std::s
         return host::toDirection(r, r.toVec3f(), "expected a direction that is not 0");
     };
     auto const radius = [](JsonReader const& r) { return r.toFloat(0, host::kFarthest); };
+    auto const cone = [](JsonReader const& r) { return r.toFloat(0, 360); };
     auto const angle = [](JsonReader const& r) { return r.toFloat(0, 180); };
     // Whoever writes has asked for the right to edit.
     host::Light& light = const_cast<host::Light&>(data.scene().lights.at(index));
@@ -355,6 +356,9 @@ std::vector<std::pair<std::string, LightField>> fieldsOf(SceneData& data, std::s
         add("position", p->position, position);
         add("color", p->color, color);
         add("radius", p->radius, radius);
+        add("axis", p->axis, direction);
+        add("angle", p->angle, cone);
+        add("innerAngle", p->innerAngle, cone);
     } else if (auto* const s = std::get_if<host::SunLight>(&light)) {
         add("direction", s->direction, direction);
         add("color", s->color, color);

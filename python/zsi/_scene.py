@@ -56,8 +56,9 @@ class Section:
 class Light(Shader):
     """A light of a scene: its place and the parameters of its shader, if it has one.
 
-    point: position, color, radius. sun: direction (towards it), color, angle (degrees). rectangle,
-    disc, mesh: emission. A shader's: position, axis, radius, and its parameters.
+    point, spot: position, color, radius, axis, angle, innerAngle (degrees; 360: all around). sun:
+    direction (towards it), color, angle (degrees). rectangle, disc, mesh: emission. A shader's:
+    position, axis, radius, and its parameters.
     """
 
     _scene: _core.Scene
@@ -265,7 +266,7 @@ class Scene:
         return self.instances[name]
 
     def add_light(self, name: str, kind: str, **keys: Any) -> Light:
-        """A light: kind "point", "sun", "rectangle", "disc" or "mesh", or a shader class, with the
+        """A light: kind "point", "spot", "sun", "rectangle", "disc" or "mesh", or a shader class, with the
         keys that scene files have for it, such as position, color, emission."""
         what = "class" if kind in _core.class_names() else "kind"
         self._core.add_light(name, {what: kind, **keys})

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "light/lights.h"
 #include "load/loadScene.h"
 #include "mesh/meshCompletion.h"
 #include "mesh/meshFile.h"
@@ -191,6 +192,26 @@ TEST_F(SceneFile, AnEnvironmentCanBeAPicture)
     EXPECT_FALSE(full.environmentVisible);
     expectContains(errorOf([&] { load(R"({"environment": {"file": "no.exr"}})"); }),
                    {"environment.file", "no.exr"});
+}
+
+TEST_F(SceneFile, SpotsFadeFromTheInnerConeToTheOuter)
+{
+    Scene const scene = load(R"({"lights": {"l": {
+        "kind": "spot", "position": [0, 0, 2], "target": [5, 0, 2], "color": [8, 4, 0],
+        "angle": 120, "innerAngle": 60}}})");
+    LightSet const lights(scene);
+    auto const at = [&](float degrees) {
+        float const angle = degrees * 0.0174532925f;
+        auto const seen =
+            lights.arrival(0, {2 * std::cos(angle), 2 * std::sin(angle), 2}, {-1, 0, 0}, {});
+        return seen ? numbers(seen->color) : numbers(Vec3f(0, 0, 0));
+    };
+    expectNear(at(0), {2, 1, 0});
+    expectNear(at(29.9f), {2, 1, 0});
+    float const middle = std::acos((std::cos(0.5235988f) + 0.5f) / 2) / 0.0174532925f;
+    expectNear(at(middle), {1, 0.5f, 0});
+    expectNear(at(-middle), {1, 0.5f, 0});
+    expectNear(at(60.1f), {0, 0, 0});
 }
 
 TEST_F(SceneFile, AssignmentsStandInThePlaceOfTheFile)
