@@ -53,6 +53,10 @@ if(ZSI_BUILD_HOST)
         DEPENDS zsi description zephyrShaders64 VERBATIM)
     add_custom_target(schema ALL DEPENDS ${schema})
     install(FILES ${schema} DESTINATION ${CMAKE_INSTALL_DATADIR}/zsi COMPONENT runtime)
+    if(TARGET blender_addon)
+        install(FILES ${PROJECT_BINARY_DIR}/zsi-blender.zip
+            DESTINATION ${CMAKE_INSTALL_DATADIR}/zsi COMPONENT runtime)
+    endif()
     install(DIRECTORY scenes assets DESTINATION ${CMAKE_INSTALL_DATADIR}/zsi COMPONENT runtime)
 endif()
 

@@ -14,7 +14,7 @@ complain() {
     failed=1
 }
 
-dirs=(include src host tests tools bench examples python)
+dirs=(include src host tests tools bench examples python blender)
 find "${dirs[@]}" -name '*.h' -o -name '*.cpp' | xargs clang-format-14 --dry-run -Werror || failed=1
 
 # Every source says its licence near its top; the note beside the assets that of every asset.

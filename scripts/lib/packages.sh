@@ -8,6 +8,7 @@ packages_build=(g++ cmake ninja-build libembree-dev libopenimageio-dev openimage
     libelf-dev pybind11-dev python3-dev python3-numpy)
 packages_test=(libgtest-dev libbenchmark-dev binutils valgrind pkg-config dpkg-dev file groff-base
     python3-jsonschema python3-pil python3-scipy python3-matplotlib mypy)
+packages_blender=(blender)
 packages_lint=(clang-14 clang-format-14 clang-tidy-14 cppcheck)
 
 # install_missing PACKAGE...: installs those that are not there; sudo only if not root.
