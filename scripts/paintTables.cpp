@@ -24,7 +24,7 @@ constexpr int kWidths = 14, kLossCosines = 17, kCosines = 25;
 constexpr double kLeastWidth = 0.001, kMostWidth = 0.5;
 constexpr double kLift =
     0.0015; // of the coat's share, above the tables' error: paint must not glow
-constexpr int kSpreads = 15, kFlakeCosines = 33;
+constexpr int kSpreads = 29, kFlakeCosines = 33;
 constexpr double kMostSpread = 1.5;
 
 using Table = std::vector<std::vector<double>>;

@@ -46,6 +46,9 @@ TEST(Metal, LobeTurnsWithItsRotation)
         Vec3f const L(0.6f * std::cos(angle), 0.6f * std::sin(angle), 0.8f);
         EXPECT_NEAR(turned.transfer(L).x, plain.transfer({0.6f, 0, 0.8f}).x, 1e-5f);
     }
+    Metal lost("anisoRotationValue=nan"), far("anisoRotationValue=inf"), level;
+    EXPECT_EQ(lost.transfer({0.6f, 0, 0.8f}), level.transfer({0.6f, 0, 0.8f}));
+    EXPECT_EQ(far.transfer({0.6f, 0, 0.8f}), level.transfer({0.6f, 0, 0.8f}));
 }
 
 TEST(Metal, BothFacesReflectAndNothingComesFromBelow)

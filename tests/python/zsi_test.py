@@ -180,6 +180,11 @@ class Scenes(unittest.TestCase):
                 (np.zeros((3, 3)), [[0, 1, 2]], None, "no triangles that can be seen")):
             with self.assertRaisesRegex(zsi.Error, "meshes.x.*" + message):
                 zsi.Scene().add_mesh("x", positions, triangles, normals=normals)
+        with tempfile.TemporaryDirectory() as folder:
+            file = pathlib.Path(folder) / "x.obj"
+            file.write_bytes(b"v 0 0 \xb1\n")  # no UTF-8
+            with self.assertRaisesRegex(zsi.Error, r'x.obj:1: expected a number, found "\\xb1"'):
+                zsi.Scene().add_mesh("x", file=str(file))
 
     def test_values_are_checked_as_in_a_file(self):
         scene = ball()

@@ -198,7 +198,7 @@ public:
         float const seen = alone ? 1.0f : place.underneath / (cut * cut);
         float const resolved = minOf(seen, static_cast<float>(kMost));
         // Contrast under this is not worth a look-up, and flakes as dull as this are no sparkles.
-        constexpr float kFaint = 0.02f, kDull = 0.45f, kDulling = 0.1f;
+        constexpr float kFaint = 0.02f, kDull = 0.35f, kDulling = 0.15f;
         float const contrast = (std::sqrt(resolved / seen) - kFaint) / (1.0f - kFaint)
             * saturate((kDull - recipe.gloss) / kDulling);
         if (!(contrast > 0.0f))
@@ -216,9 +216,12 @@ public:
                 if (!(fract(api->noise3DRecord(&other) * 64.0f) < recipe.density))
                     continue;
             }
+            // The last digits give the lean, which has a tail to fill, those before them the
+            // azimuth, turned further with the lean so that flakes of one azimuth are not in a row.
             float const n = api->noise3DRecord(&at) * 64.0f;
-            float const r = recipe.spread * std::sqrt(-std::log(1.0f - fract(n)));
-            float const phi = kPi * fract(n * 64.0f); // half a turn: the pair has the other half
+            float const lean = fract(n * 128.0f);
+            float const r = recipe.spread * std::sqrt(-std::log(1.0f - lean));
+            float const phi = kPi * fract(n + 61.8f * lean); // half a turn: the pair has the other
             float const share =
                 contrast * (minOf(1.0f, resolved - static_cast<float>(i)) / resolved);
             flake_[count_++] = {{r * std::cos(phi), r * std::sin(phi)}, share};
@@ -265,17 +268,30 @@ public:
 
     /// Of the light along w, what the flakes lose after one bounce, and what they send out lower,
     /// times what Schlick's weight is more there. crowd: as `crowd()` gives it.
+    ///
+    /// A single flake's share is the crowd's, plus what its own exceeds that by as far as the mean
+    /// of its formula over all flakes is the crowd's: not where next to nothing is lost, and the
+    /// less so the wider its own lobe is against that of the crowd.
     struct Shares {
         float lost, lowered;
     };
     Shares shares(Vec3f w, grooves::LevelShares const& crowd) const
     {
-        Shares sum{0.0f, 0.0f};
-        if (crowd_ > 0.0f)
-            sum = {crowd_ * crowd.loss(w.z), crowd_ * crowd.lowered(w.z)};
+        Shares const mean{crowd.loss(w.z), crowd.lowered(w.z)};
+        Shares sum{coverage_ * mean.lost, coverage_ * mean.lowered};
+        float const wide = gloss_ / std::sqrt(crowd2_), least = 0.003f + 0.02f * wide;
+        auto const told = [&](float share) {
+            float const t = saturate(0.5f * share / least - 0.5f);
+            return t * t * (3.0f - 2.0f * t) * (1.0f - wide * wide);
+        };
+        float const lost = told(mean.lost), lowered = told(1.5f * mean.lowered);
         for (int i = 0; i < count_; ++i) {
-            sum.lost += flake_[i].share * grooves::loss(w, flake_[i].slope, gloss_);
-            sum.lowered += flake_[i].share * grooves::lowered(w, flake_[i].slope, gloss_);
+            Flake const& f = flake_[i];
+            if (lost > 0.0f)
+                sum.lost += f.share * lost * (grooves::loss(w, f.slope, gloss_) - mean.lost);
+            if (lowered > 0.0f)
+                sum.lowered +=
+                    f.share * lowered * (grooves::lowered(w, f.slope, gloss_) - mean.lowered);
         }
         return sum;
     }

@@ -27,6 +27,7 @@ inline SLArray<Vec3f> rotatedAboutNormal(SLArray<Vec3f> frame, float angle)
 template <class Shader>
 struct AnisoRotationFunctions {
     /// angle: radians; below 0.0001, so for every negative angle too, the channel counts instead.
+    /// An angle that is not a number does not turn.
     void f_anisoRotateFrame(IShaderAPI*, ShadeState const& state, SLArray<Vec3f>& frame,
                             float angle) const
     {
@@ -41,7 +42,7 @@ struct AnisoRotationFunctions {
                     angle *= s.u_anisoRotationAmount;
             }
         }
-        if (angle != 0.0f)
+        if (angle != 0.0f && std::isfinite(angle))
             frame = rotatedAboutNormal(frame, angle);
     }
 };
