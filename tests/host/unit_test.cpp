@@ -40,8 +40,7 @@ void divide(host::RenderUnit const& box, std::mt19937& random, std::vector<host:
     auto const cut = [&](auto& end, auto& begin, auto from, auto to) {
         if (to - from < 2)
             return false;
-        end = begin = static_cast<std::remove_reference_t<decltype(end)>>(
-            from + 1 + random() % static_cast<unsigned>(to - from - 1));
+        end = begin = std::uniform_int_distribution(from + 1, to - 1)(random);
         return true;
     };
     unsigned const axis = random() % 4;
