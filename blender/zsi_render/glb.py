@@ -19,8 +19,8 @@ def part_name(slot):
 
 def write(path, corners, triangles, slots):
     """`corners`: arrays of one row for each corner, by glTF's attribute names ("POSITION", "NORMAL",
-    "TEXCOORD_0" with v upwards, ...). `triangles`: (N, 3) indices of corners. `slots`: of N. Returns
-    the slots that have triangles. Axes are left as they are."""
+    "TEXCOORD_0" with v upwards, ...). `triangles`: (N, 3) indices of corners. `slots`: of N.
+    Returns the slots that have triangles. Axes are left as they are."""
     blob, views, accessors, primitives = [], [], [], []
     used = [int(slot) for slot in np.unique(slots)]
 
@@ -28,7 +28,8 @@ def write(path, corners, triangles, slots):
         values = np.ascontiguousarray(values)
         offset = sum(map(len, blob))
         blob.append(values.tobytes())
-        views.append({"buffer": 0, "byteOffset": offset, "byteLength": values.nbytes, "target": target})
+        place = {"byteOffset": offset, "byteLength": values.nbytes}
+        views.append({"buffer": 0, **place, "target": target})
         accessors.append({"bufferView": len(views) - 1, "count": len(values), **more})
         return len(accessors) - 1
 
@@ -38,7 +39,8 @@ def write(path, corners, triangles, slots):
         for name, values in corners.items():
             values = np.asarray(values, np.float32)[corner]
             if name.startswith("TEXCOORD"):
-                values = values * np.float32([1, -1]) + np.float32([0, 1])  # glTF's v runs downwards
+                # glTF's v runs downwards.
+                values = values * np.float32([1, -1]) + np.float32([0, 1])
             bounds = {}
             if name == "POSITION":
                 bounds = {"min": values.min(axis=0).tolist(), "max": values.max(axis=0).tolist()}

@@ -107,7 +107,7 @@ class Reader:
         if node is None:
             return None
         if node.type != "BUMP":
-            self._note(f'"{node.name}" at Normal is left out: no shader reads normals from a picture')
+            self._note(f'"{node.name}" at Normal is left out: no shader reads pictures of normals')
             return None
         texture_node, output = source(node.inputs["Height"])
         if texture_node is None:

@@ -38,7 +38,7 @@ _OWN = (
     Pass("albedo", "Albedo", "RGB", "COLOR", about="The first rough surface under light of 1"),
     Pass("denoiseNormal", "Denoise Normal", "XYZ", "VECTOR", about="Normal of that surface"),
     Pass("denoiseDepth", "Denoise Depth", "Z", "VALUE", about="Length of the way to that surface"),
-    Pass("variance", "Variance", "RGB", "COLOR", about="Of the picture, as if samples were independent"),
+    Pass("variance", "Variance", "RGB", "COLOR", about="As if samples were independent"),
     Pass("samples", "Samples", "N", "VALUE", about="How many a pixel got", values=("count",)),
 )
 _BLENDERS = (

@@ -1,7 +1,7 @@
 # SPDX-License-Identifier: Apache-2.0
-"""Blender's surface nodes as shader classes, by the rules that hold for glTF's metallic-roughness
-materials: what is metal becomes corvid_Mtl_Metal, what light passes through corvid_Mtl_Dielectric, the
-rest corvid_Mtl_MetallicPaint without flakes. A material is one of them: what is half metal is what is
+"""Blender's surface nodes as shader classes, by the rules of glTF's metallic-roughness materials: what
+is metal becomes corvid_Mtl_Metal, what light passes through corvid_Mtl_Dielectric, the rest
+corvid_Mtl_MetallicPaint without flakes. A material is one of them: what is half metal is what it is
 more. Widths of lobes are roughness squared, once, as in Blender's own GGX lobes."""
 
 from .nodes import Reader
@@ -71,7 +71,8 @@ def _rough_map(parameters, prefix, texture, images, factor=1.0):
 def _number(value, images):
     """Of an input that decides between classes: a picture counts by its mean."""
     if value.texture:
-        return images.mean(value.texture.image, 3 if value.texture.is_alpha else value.texture.channel)
+        texture = value.texture
+        return images.mean(texture.image, 3 if texture.is_alpha else texture.channel)
     return value.value
 
 

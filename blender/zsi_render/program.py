@@ -109,8 +109,8 @@ class Render:
     def check(self):
         """After its end: raises what went wrong."""
         if self._process.returncode != 0:
-            told = self._errors[-1] if self._errors else f"zsi ended with {self._process.returncode}"
-            raise ProgramError(told)
+            ended = f"zsi ended with {self._process.returncode}"
+            raise ProgramError(self._errors[-1] if self._errors else ended)
 
     def cancel(self):
         """Ends it: the command stops within a sample, and by force if it does not."""

@@ -36,7 +36,8 @@ def entry(world, is_visible, classes, images, folder, note):
     if source is None:
         gain = [strength * c for c in color.default_value[:3]]
         return _picture(_white(folder), gain, Matrix.Identity(3), is_visible) if any(gain) else None
-    if source.type != "TEX_ENVIRONMENT" or not source.image or source.projection != "EQUIRECTANGULAR":
+    is_picture = source.type == "TEX_ENVIRONMENT" and source.image
+    if not is_picture or source.projection != "EQUIRECTANGULAR":
         note(
             f'world "{world.name}": node "{source.name}" is left out; an equirectangular picture '
             "is what is read"
