@@ -74,21 +74,22 @@ Vec3f PathIntegrator::directLight(ShadingContext::Call& call)
         material.shader->transfer(&context_, state);
         return positive(state.outBrdf * maxOf(state.sampleCosine, 0.0f));
     };
+    auto const random = [this] { return context_.sampler().next(); };
     for (int side = 0; side < count; ++side)
-        for (std::size_t i = 0; i < lights.size(); ++i) {
+        lights.forEach(state.P, sides[side], random, [&](std::size_t i, float scale) {
             Arrival picked;
             LightSample light;
             if (!context_.pickLight(i, state.P, sides[side], picked))
-                continue;
+                return;
             Vec3f const value = sent(picked.L);
             if (!(maxComponent(value) > 0.0f)
                 || !context_.arriving(i, state.P, sides[side], picked, light))
-                continue;
+                return;
             float const share = picked.density > 0.0f
                 ? picked.density / (picked.density + maxComponent(value))
                 : 1.0f;
-            sum += value * light.color * light.shadow * (share * kPi);
-        }
+            sum += value * light.color * light.shadow * (share * scale * kPi);
+        });
     sum += context_.fromSky(kRayReflection, sent, [&](Vec3f) {
         return maxComponent(state.outBrdf) * state.sampleCosine;
     });

@@ -52,6 +52,34 @@ EmittingSurface::EmittingSurface(Scene const& scene, SurfaceLight const& light)
         s /= area_;
 }
 
+TreeLight EmittingSurface::bounds(std::uint32_t light, Vec3f emission) const
+{
+    constexpr float kPi = 3.14159265f, kMost = std::numeric_limits<float>::max();
+    Vec3f low{kMost, kMost, kMost}, high = -low, normals{0, 0, 0};
+    for (Triangle const& t : triangles_) {
+        for (Vec3f const p : {t.corner, t.corner + t.edge1, t.corner + t.edge2}) {
+            low = {minOf(low.x, p.x), minOf(low.y, p.y), minOf(low.z, p.z)};
+            high = {maxOf(high.x, p.x), maxOf(high.y, p.y), maxOf(high.z, p.z)};
+        }
+        normals +=
+            cross(t.edge1, t.edge2) * (dot(cross(t.edge1, t.edge2), t.Ng) < 0 ? -1.0f : 1.0f);
+    }
+    TreeLight bounds{light,
+                     (low + high) * 0.5f,
+                     length(high - low) / 2.0f,
+                     {0, 0, 1},
+                     kPi,
+                     maxComponent(emission) * area_ / kPi};
+    if (float const l = length(normals); l > 1e-3f * area_) {
+        bounds.axis = normals / l;
+        float least = 1.0f;
+        for (Triangle const& t : triangles_)
+            least = minOf(least, dot(t.Ng, bounds.axis));
+        bounds.spread = std::acos(clamp(least, -1.0f, 1.0f));
+    }
+    return bounds;
+}
+
 EmittingPoint EmittingSurface::sample(Vec2f u) const
 {
     if (triangles_.empty())
@@ -77,11 +105,28 @@ float EmittingSurface::density(Vec3f from, Vec3f to, Vec3f Ng) const
 LightSet::LightSet(Scene const& scene)
     : scene_(&scene)
 {
-    for (Light const& light : scene.lights) {
+    std::vector<TreeLight> bounded;
+    for (std::uint32_t i = 0; i < scene.lights.size(); ++i) {
+        Light const& light = scene.lights[i];
         auto const* const surface = std::get_if<SurfaceLight>(&light);
         surfaces_.push_back(surface ? std::make_unique<EmittingSurface>(scene, *surface) : nullptr);
         hasSurfaces_ = hasSurfaces_ || surface;
+        if (auto const* const point = std::get_if<PointLight>(&light))
+            bounded.push_back({i, point->position, point->radius, point->axis,
+                               minOf(point->angle * (3.14159265f / 360.0f), 3.14159265f),
+                               maxComponent(point->color)});
+        else if (surface)
+            bounded.push_back(surfaces_.back()->bounds(i, surface->emission));
+        else
+            always_.push_back(i); // only asking tells what it brings
     }
+    std::erase_if(bounded, [](TreeLight const& l) { return !(l.power > 0.0f); });
+    if (bounded.size() > LightTree::kMost)
+        tree_.emplace(std::move(bounded));
+    else
+        for (TreeLight const& light : bounded)
+            always_.push_back(light.light);
+    std::ranges::sort(always_); // in the order of the scene
 }
 
 bool LightSet::isSpread(std::size_t light) const

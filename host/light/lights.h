@@ -2,6 +2,7 @@
 /// What the scene's lights bring to a point.
 #pragma once
 
+#include "light/lightTree.h"
 #include "scene/scene.h"
 
 #include <memory>
@@ -44,6 +45,8 @@ class EmittingSurface {
 public:
     EmittingSurface(Scene const& scene, SurfaceLight const& light);
     float area() const { return area_; } ///< world units squared
+    /// What it is for a tree of lights.
+    TreeLight bounds(std::uint32_t light, Vec3f emission) const;
     /// Uniform over the surface; `u` in [0, 1)^2.
     EmittingPoint sample(Vec2f u) const;
     /// Per steradian at `from`, with which `sample` picks the point at `to`; infinite edge-on.
@@ -63,11 +66,25 @@ class LightSet {
 public:
     explicit LightSet(Scene const& scene);
 
-    std::size_t size() const { return scene_->lights.size(); }
     Light const& operator[](std::size_t i) const { return scene_->lights[i]; }
     /// Of a SurfaceLight.
     EmittingSurface const& surface(std::size_t light) const { return *surfaces_[light]; }
     bool hasSurfaces() const { return hasSurfaces_; }
+    /// Calls `ask` with each light to ask at `P`, lit from the side of `normal`, and the factor by
+    /// which it counts. That is every light, but of point and surface lights, where there are more
+    /// than LightTree::kMost, so many that stand for all. `random`: gives numbers in [0, 1).
+    template <class Random, class Ask>
+    void forEach(Vec3f P, Vec3f normal, Random const& random, Ask const& ask) const
+    {
+        for (std::uint32_t const light : always_)
+            ask(light, 1.0f);
+        if (!tree_)
+            return;
+        LightTree::Picks picks;
+        std::size_t const count = tree_->pick(P, normal, picks, random);
+        for (std::size_t i = 0; i < count; ++i)
+            ask(picks[i].light, picks[i].scale);
+    }
     /// Whether a light has an extent, so that `arrival` makes use of its random numbers.
     bool isSpread(std::size_t light) const;
 
@@ -79,6 +96,8 @@ private:
     Scene const* scene_;
     std::vector<std::unique_ptr<EmittingSurface>> surfaces_; ///< null for other kinds
     bool hasSurfaces_ = false;
+    std::vector<std::uint32_t> always_; ///< lights to ask everywhere
+    std::optional<LightTree> tree_; ///< of the others
 };
 
 /// A point on the disc of the ball around `position` that faces `P`: what `P` sees of the ball.

@@ -47,19 +47,21 @@ LightSample* ShadingContext::getLightSamples(int, Vec3f const* P, Vec3f const* n
             end = &head->next;
         }
     }
-    for (std::size_t i = 0; i < scene_.lights().size(); ++i) {
+    auto const random = [this] { return sampler_->next(); };
+    scene_.lights().forEach(*P, *normal, random, [&](std::size_t light, float scale) {
         Arrival picked;
         LightSample sample;
-        if (!pickLight(i, *P, *normal, picked) || !arriving(i, *P, *normal, picked, sample))
-            continue;
+        if (!pickLight(light, *P, *normal, picked) || !arriving(light, *P, *normal, picked, sample))
+            return;
         if (picked.density > 0.0f && call_->material.scatters())
             if (float const lobe = lobeDensity(picked.L); !std::isinf(lobe))
-                sample.color = sample.color * (picked.density / (picked.density + lobe));
+                scale *= picked.density / (picked.density + lobe);
+        sample.color = sample.color * scale;
         LightSample& kept = lightRecords_.add();
         kept = sample;
         *end = &kept;
         end = &kept.next;
-    }
+    });
     return head;
 }
 
