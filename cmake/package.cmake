@@ -18,6 +18,7 @@ set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS ON) # of the programs and libraries, as dpkg-
 set(CPACK_DEBIAN_PACKAGE_GENERATE_SHLIBS OFF) # the shaders are loaded, nothing links to them
 set(CPACK_DEBIAN_RUNTIME_PACKAGE_NAME zsi)
 set(CPACK_DEBIAN_RUNTIME_PACKAGE_SECTION graphics)
+set(CPACK_DEBIAN_RUNTIME_PACKAGE_SUGGESTS "python3-zsi")
 set(CPACK_COMPONENT_RUNTIME_DESCRIPTION 
 "27 surface materials, lights and environments in one shared object, which a ray
 tracer loads through a fixed contract, and the command zsi, which lists them and
@@ -35,8 +36,8 @@ endif()
 set(CPACK_DEBIAN_PYTHON_PACKAGE_NAME python3-zsi)
 set(CPACK_DEBIAN_PYTHON_PACKAGE_SECTION python)
 set(CPACK_DEBIAN_PYTHON_PACKAGE_DEPENDS "zsi (= ${PROJECT_VERSION}), python3 (>= ${Python_VERSION_MAJOR}.${Python_VERSION_MINOR}), python3 (<< ${Python_VERSION_MAJOR}.${python_next}), python3-numpy")
-set(CPACK_DEBIAN_PYTHON_PACKAGE_RECOMMENDS "python3-pil")
+set(CPACK_DEBIAN_PYTHON_PACKAGE_RECOMMENDS "python3-pil, python3-distributed")
 set(CPACK_COMPONENT_PYTHON_DESCRIPTION 
 "The library in Python: materials measured and fitted over numpy arrays, scenes
-loaded, made, edited and rendered.")
+loaded, made, edited, rendered, and rendered on many machines (zsi farm).")
 include(CPack)

@@ -20,6 +20,8 @@ Requires-Python: >=3.{minor},<3.{next}
 Requires-Dist: numpy
 Requires-Dist: pillow; extra == "sweep"
 Provides-Extra: sweep
+Requires-Dist: distributed; extra == "farm"
+Provides-Extra: farm
 """
 WHEEL = """Wheel-Version: 1.0
 Generator: zsi
@@ -33,8 +35,9 @@ def main(version: str, package: Path, shaders: Path, output: Path) -> None:
     platform = sysconfig.get_platform().replace("-", "_").replace(".", "_")
     tag = f"cp3{minor}-cp3{minor}-{platform}"
     info = f"zsi-{version}.dist-info"
-    files = {f"zsi/{file.name}": file.read_bytes() for file in sorted(package.iterdir())
-             if file.is_file()}
+    files = {f"zsi/{file.relative_to(package)}": file.read_bytes()
+             for file in sorted(package.rglob("*"))
+             if file.is_file() and file.suffix != ".pyc"}
     files |= {f"zsi/shaders/{file.name}": file.read_bytes() for file in sorted(shaders.iterdir())
               if file.suffix in (".so", ".json")}
     files[f"{info}/METADATA"] = METADATA.format(version=version, minor=minor,

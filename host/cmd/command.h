@@ -34,6 +34,7 @@ Subcommand addSchema(CLI::App& app, std::string const& shaderPath);
 Subcommand addDenoise(CLI::App& app);
 Subcommand addRenderUnit(CLI::App& app, std::string const& shaderPath);
 Subcommand addMerge(CLI::App& app);
+Subcommand addFarm(CLI::App& app, std::string const& shaderPath);
 
 /// The options of how 8-bit pictures show light.
 struct ViewOptions {

@@ -71,7 +71,8 @@ int run(int argc, char** argv)
         ->type_name("FOLDER[:FOLDER]");
     Subcommand const subcommands[] = {addInfo(app, shaderPath),       addRender(app, shaderPath),
                                       addSchema(app, shaderPath),     addDenoise(app),
-                                      addRenderUnit(app, shaderPath), addMerge(app)};
+                                      addRenderUnit(app, shaderPath), addMerge(app),
+                                      addFarm(app, shaderPath)};
     app.footer("Exit status: 0 done, 1 bad input, 2 bad command line, 130 interrupted.");
 
     try {
@@ -84,8 +85,8 @@ int run(int argc, char** argv)
     for (Subcommand const& subcommand : subcommands)
         if (subcommand.app->parsed())
             return subcommand.run();
-    throw UsageError("a subcommand is missing: info, render, denoise, schema, render-unit or merge "
-                     "(zsi --help)");
+    throw UsageError("a subcommand is missing: info, render, denoise, schema, render-unit, "
+                     "merge or farm (zsi --help)");
 }
 
 } // namespace

@@ -150,6 +150,7 @@ std::filesystem::path JsonReader::toFile() const
     std::string const& name = toString();
     if (name.empty() || name.find('\0') != std::string::npos)
         failExpected("a file name");
+    value_->namesFile = true;
     return (value_->file->parent_path() / name).lexically_normal();
 }
 

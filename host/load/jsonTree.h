@@ -24,6 +24,8 @@ struct JsonValue {
     std::vector<JsonMember> members;
     std::shared_ptr<std::filesystem::path const> file;
     int line = 0; ///< from 1; 0: of no file that has lines
+    /// A reader has taken it for the name of a file.
+    mutable bool namesFile = false;
 
     JsonValue const* find(std::string_view name) const; ///< null when there is none
 };

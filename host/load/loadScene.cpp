@@ -30,7 +30,7 @@ void read(JsonReader const& root, SceneBuilder& builder)
     if (auto const v = root.find("meshes"))
         for (auto const& [name, mesh] : v->members()) {
             builder.begin(mesh);
-            builder.addMesh(readMesh(mesh, builder.scene.warnings));
+            builder.addMesh(readMesh(mesh, builder.scene));
             builder.scene.meshes.back().name = name;
             builder.meshes.add(name);
         }
@@ -60,7 +60,12 @@ void read(JsonReader const& root, SceneBuilder& builder)
 Scene loadScene(std::filesystem::path const& file, ShaderSource const& shaders,
                 LoadOptions const& options)
 {
-    JsonValue const tree = readSceneFile(file, options.assignments);
+    return loadScene(readSceneFile(file, options.assignments), file, shaders, options);
+}
+
+Scene loadScene(JsonValue const& tree, std::filesystem::path const& file,
+                ShaderSource const& shaders, LoadOptions const& options)
+{
     Scene scene;
     scene.file = file.string();
     scene.textures = std::make_shared<TextureStore>(options.textures);

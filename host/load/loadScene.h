@@ -2,6 +2,7 @@
 /// Reads a JSON scene file.
 #pragma once
 
+#include "load/jsonTree.h"
 #include "plugin/shaderSource.h"
 #include "scene/scene.h"
 #include "texture/textureStore.h"
@@ -24,5 +25,8 @@ struct LoadOptions {
 /// expected, and near names.
 Scene loadScene(std::filesystem::path const& file, ShaderSource const& shaders,
                 LoadOptions const& options = {});
+/// The same from what `readSceneFile` made of the file.
+Scene loadScene(JsonValue const& tree, std::filesystem::path const& file,
+                ShaderSource const& shaders, LoadOptions const& options = {});
 
 } // namespace zsi::host

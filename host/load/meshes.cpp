@@ -14,14 +14,14 @@ namespace {
 
 constexpr int kMostSegments = 4096;
 
-Mesh readMeshFromFile(JsonReader const& reader, std::vector<std::string>& warnings)
+Mesh readMeshFromFile(JsonReader const& reader, Scene& scene)
 {
     reader.expectKeys({"file", "up", "normals"});
     JsonReader const name = reader.at("file");
     std::filesystem::path const file = name.toFile();
     Mesh mesh;
     try {
-        mesh = readMeshFile(file);
+        mesh = readMeshFile(file, &scene.furtherFiles);
     } catch (InputError const& error) {
         name.fail(error.what());
     }
@@ -37,7 +37,7 @@ Mesh readMeshFromFile(JsonReader const& reader, std::vector<std::string>& warnin
     std::vector<std::string> repairs;
     completeMesh(mesh, source, repairs);
     for (std::string const& repair : repairs)
-        warnings.push_back(fmt::format("{}: {}: {}", name.place(), file.string(), repair));
+        scene.warnings.push_back(fmt::format("{}: {}: {}", name.place(), file.string(), repair));
     if (mesh.triangles.empty())
         name.fail(file.string() + ": has no triangles that can be seen");
     return mesh;
@@ -45,14 +45,14 @@ Mesh readMeshFromFile(JsonReader const& reader, std::vector<std::string>& warnin
 
 } // namespace
 
-Mesh readMesh(JsonReader const& reader, std::vector<std::string>& warnings)
+Mesh readMesh(JsonReader const& reader, Scene& scene)
 {
     std::vector<std::string> const kinds{"file", "sphere", "box", "plane"};
     if (!reader.isObject())
         reader.failExpected("an object");
     if (reader.find("file") && !reader.find("sphere") && !reader.find("box")
         && !reader.find("plane"))
-        return readMeshFromFile(reader, warnings);
+        return readMeshFromFile(reader, scene);
     reader.expectKeys({"sphere", "box", "plane", "file"});
     JsonReader const shape = reader.onlyOf(kinds);
     if (reader.find("sphere")) {

@@ -7,8 +7,8 @@
 
 namespace zsi::host {
 
-/// A mesh of a file or a shape, complete. Appends to `warnings` what was mended. Throws InputError
-/// with the place.
-Mesh readMesh(JsonReader const& reader, std::vector<std::string>& warnings);
+/// A mesh of a file or a shape, complete. Appends to the scene's warnings what was mended, and to
+/// its further files. Throws InputError with the place.
+Mesh readMesh(JsonReader const& reader, Scene& scene);
 
 } // namespace zsi::host

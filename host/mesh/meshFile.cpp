@@ -6,6 +6,7 @@
 #include "mesh/meshFileCheck.h"
 
 #include <algorithm>
+#include <assimp/DefaultIOSystem.h>
 #include <assimp/Importer.hpp>
 #include <assimp/config.h>
 #include <assimp/material.h>
@@ -163,9 +164,30 @@ Mesh joined(std::vector<Mesh>& parts)
     return mesh;
 }
 
+/// Tells which files the importer opens beside the first.
+class ToldFiles final : public Assimp::DefaultIOSystem {
+public:
+    ToldFiles(std::string first, std::vector<std::string>* further)
+        : first_(std::move(first))
+        , further_(further)
+    {
+    }
+    Assimp::IOStream* Open(char const* file, char const* mode) override
+    {
+        Assimp::IOStream* const stream = DefaultIOSystem::Open(file, mode);
+        if (stream && further_ && first_ != file)
+            further_->push_back(file);
+        return stream;
+    }
+
+private:
+    std::string first_;
+    std::vector<std::string>* further_;
+};
+
 } // namespace
 
-Mesh readMeshFile(std::filesystem::path const& file)
+Mesh readMeshFile(std::filesystem::path const& file, std::vector<std::string>* furtherFiles)
 {
     static std::set<std::string> const kKnown{".obj", ".ply", ".stl", ".gltf", ".glb"};
     std::error_code failed;
@@ -181,6 +203,7 @@ Mesh readMeshFile(std::filesystem::path const& file)
     if (extensionOf(file) == ".obj")
         checkObj(file);
     Assimp::Importer importer;
+    importer.SetIOHandler(new ToldFiles(file.string(), furtherFiles)); // is the importer's now
     importer.SetPropertyInteger(AI_CONFIG_PP_SBP_REMOVE,
                                 aiPrimitiveType_POINT | aiPrimitiveType_LINE);
     aiScene const* scene = importer.ReadFile(file.string(), aiProcess_ValidateDataStructure);

@@ -13,7 +13,9 @@ namespace zsi::host {
 /// are filled for the others; what it does not have at all stays empty. v runs upwards.
 /// `parts` are the nodes, each as often as it has materials, in the file's order.
 /// Throws InputError that names the file when it is missing, of another kind, or broken.
-Mesh readMeshFile(std::filesystem::path const& file);
+/// `furtherFiles`: gets the names of others that it led to.
+Mesh readMeshFile(std::filesystem::path const& file,
+                  std::vector<std::string>* furtherFiles = nullptr);
 
 /// Files of this name have y up by their format's rules.
 bool isYUp(std::filesystem::path const& file);

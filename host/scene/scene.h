@@ -137,6 +137,8 @@ struct Scene {
     /// shaders is the picture that is reflected.
     bool environmentVisible = false;
     std::shared_ptr<TextureStore> textures; ///< owns what the shaders' handles point to
+    /// Read beside those that the scene file names, such as buffers of a mesh file.
+    std::vector<std::string> furtherFiles;
     std::vector<std::string> notes; ///< what the loader chose by itself
     std::vector<std::string> warnings; ///< such as a matrix that a shader will read left unwritten
 };

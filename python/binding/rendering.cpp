@@ -3,6 +3,7 @@
 #include "base/error.h"
 #include "denoise/denoise.h"
 #include "film/imageFile.h"
+#include "render/merging.h"
 #include "render/render.h"
 #include "render/session.h"
 #include "sceneData.h"
@@ -97,7 +98,30 @@ public:
         return py::make_tuple(picture, told, host::screenView(scene.film));
     }
 
+    /// A share of the scene's picture as the bytes of a unit's file.
+    py::bytes renderUnit(host::UnitOrigin const& origin, std::array<int, 6> const& place,
+                         int threads, py::object const& tell)
+    {
+        Rendering const here(*data_, data_->edit().settings);
+        auto const bytes = interruptibly(tell, [&](Progress& progress) {
+            prepare(progress);
+            host::RenderJob job;
+            job.threads = threads;
+            job.cancel = &progress.cancel;
+            job.progress = [&](double done) { progress.done = done; };
+            auto const unit = host::renderUnit(*session_, origin, unitOf(place), job);
+            return unit ? host::unitBytes(*unit) : std::vector<unsigned char>();
+        });
+        return py::bytes(reinterpret_cast<char const*>(bytes.data()), bytes.size());
+    }
+
 private:
+    static host::RenderUnit unitOf(std::array<int, 6> const& p)
+    {
+        return {{p[0], p[1], p[2], p[3]},
+                {static_cast<std::uint32_t>(p[4]), static_cast<std::uint32_t>(p[5])}};
+    }
+
     /// Keeps edits away, and the scene's own settings for afterwards.
     struct Rendering {
         Rendering(SceneData& d, host::Settings& s)
@@ -202,6 +226,31 @@ Picture pictureOf(std::vector<std::tuple<std::string, std::vector<std::string>, 
     return picture;
 }
 
+std::vector<std::array<int, 6>> missingOf(host::Merging const& merging)
+{
+    std::vector<std::array<int, 6>> boxes;
+    for (host::RenderUnit const& u : merging.missing())
+        boxes.push_back({u.pixels.x0, u.pixels.y0, u.pixels.x1, u.pixels.y1,
+                         static_cast<int>(u.samples.begin), static_cast<int>(u.samples.end)});
+    return boxes;
+}
+
+/// `read`: gives the unit.
+template <class Read>
+void add(host::Merging& merging, std::string const& name, Read const& read)
+{
+    py::gil_scoped_release unlocked;
+    merging.add(name, read());
+}
+
+Picture pictureSoFar(host::Merging const& merging)
+{
+    if (merging.units() == 0)
+        throw InputError("there is no unit yet");
+    py::gil_scoped_release unlocked;
+    return std::make_shared<host::Picture>(merging.picture());
+}
+
 /// Signals of the screen, (height, width, 3), 0..1.
 py::array_t<float> toScreen(Picture const& picture, host::ScreenView const& view)
 {
@@ -220,7 +269,44 @@ void bindRendering(py::module_& m)
 {
     py::class_<Session>(m, "Session")
         .def(py::init<std::shared_ptr<SceneData>>())
-        .def("render", &Session::render);
+        .def("render", &Session::render)
+        .def("render_unit", &Session::renderUnit);
+    py::class_<host::UnitOrigin>(m, "UnitOrigin")
+        .def_readonly("scene", &host::UnitOrigin::scene)
+        .def_readonly("samples", &host::UnitOrigin::samples)
+        .def_property_readonly("window",
+                               [](host::UnitOrigin const& o) {
+                                   return py::make_tuple(o.window.x0, o.window.y0, o.window.x1,
+                                                         o.window.y1);
+                               })
+        .def_property_readonly("view",
+                               [](host::UnitOrigin const& o) { return o.development.view; });
+    m.def("unit_origin", [](SceneData const& data) {
+        py::gil_scoped_release unlocked;
+        return host::unitOriginOf(data.scene());
+    });
+    py::class_<host::Merging>(m, "Merging")
+        .def(py::init<host::UnitOrigin>())
+        .def("add",
+             [](host::Merging& merging, std::string const& name, std::string_view bytes) {
+                 add(merging, name, [&] {
+                     return host::readUnit(
+                         name,
+                         {reinterpret_cast<unsigned char const*>(bytes.data()), bytes.size()});
+                 });
+             })
+        .def("add_file",
+             [](host::Merging& merging, std::string const& file) {
+                 add(merging, file, [&] { return host::readUnit(file); });
+             })
+        .def("missing", missingOf)
+        .def("missing_text", &host::Merging::missingText)
+        .def("picture", pictureSoFar)
+        .def_property_readonly("units", &host::Merging::units)
+        .def_property_readonly("rays", &host::Merging::rays)
+        .def_property_readonly("non_finite", &host::Merging::nonFinite)
+        .def_property_readonly(
+            "samples", [](host::Merging const& merging) { return merging.film().meanSamples(); });
     py::class_<host::Picture, Picture>(m, "Picture")
         .def(py::init(&pictureOf))
         .def_property_readonly("layers",

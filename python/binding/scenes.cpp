@@ -6,6 +6,7 @@
 #include "load/lights.h"
 #include "load/loadScene.h"
 #include "load/meshes.h"
+#include "load/packScene.h"
 #include "load/pictureSettings.h"
 #include "load/placing.h"
 #include "load/shaders.h"
@@ -138,7 +139,7 @@ PictureSettings<Settings> const& settings()
     return all;
 }
 
-Data load(std::string const& file, std::vector<std::string> const& assignments, int cacheMegabytes)
+host::LoadOptions loadOptions(std::vector<std::string> const& assignments, int cacheMegabytes)
 {
     host::LoadOptions options;
     options.assignments = assignments;
@@ -149,8 +150,26 @@ Data load(std::string const& file, std::vector<std::string> const& assignments, 
         if (PyErr_CheckSignals() != 0)
             throw py::error_already_set();
     };
+    return options;
+}
+
+Data load(std::string const& file, std::vector<std::string> const& assignments, int cacheMegabytes)
+{
+    host::LoadOptions const options = loadOptions(assignments, cacheMegabytes);
     py::gil_scoped_release unlocked;
     return std::make_shared<SceneData>(host::loadScene(file, libraries(), options));
+}
+
+/// The scene, and what another machine needs to load it: a text, and files by the names that they
+/// have in it.
+std::tuple<Data, std::string, std::vector<std::pair<std::string, std::string>>>
+pack(std::string const& file, std::vector<std::string> const& assignments)
+{
+    host::LoadOptions const options = loadOptions(assignments, 0);
+    py::gil_scoped_release unlocked;
+    host::PackedScene packed = host::packScene(file, libraries(), options);
+    return {std::make_shared<SceneData>(std::move(packed.scene)), std::move(packed.text),
+            std::move(packed.files)};
 }
 
 void refuseTwice(std::string const& section, std::string const& name,
@@ -181,7 +200,7 @@ void addMesh(SceneData& data, std::string const& name, py::dict const& keys)
 {
     refuseTwice("meshes", name, meshNames(data));
     JsonValue const json = toJson(keys, kOrigin);
-    addMesh(data, name, host::readMesh(JsonReader(json, "meshes." + name), data.edit().warnings));
+    addMesh(data, name, host::readMesh(JsonReader(json, "meshes." + name), data.edit()));
 }
 
 template <class Vector>
@@ -396,6 +415,7 @@ bool setLight(SceneData& data, std::size_t index, std::string const& name, py::o
 void bindScenes(py::module_& m)
 {
     m.def("load", load);
+    m.def("pack", pack);
     py::class_<SceneData, Data>(m, "Scene")
         .def(py::init<>())
         .def_property_readonly("file", [](SceneData const& d) { return d.scene().file; })

@@ -7,7 +7,8 @@ packages_build=(g++ cmake ninja-build libembree-dev libopenimageio-dev openimage
     libimath-dev libtbb-dev libassimp-dev zlib1g-dev nlohmann-json3-dev libcli11-dev libfmt-dev
     libelf-dev pybind11-dev python3-dev python3-numpy)
 packages_test=(libgtest-dev libbenchmark-dev binutils valgrind pkg-config dpkg-dev file groff-base
-    python3-jsonschema python3-pil python3-scipy python3-matplotlib mypy)
+    python3-jsonschema python3-pil python3-scipy python3-matplotlib python3-distributed
+    mypy)
 packages_blender=(blender)
 packages_lint=(clang-14 clang-format-14 clang-tidy-14 cppcheck)
 
