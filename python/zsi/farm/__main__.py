@@ -5,6 +5,7 @@ from __future__ import annotations
 
 import argparse
 import asyncio
+import importlib
 import logging
 import os
 import signal
@@ -115,39 +116,41 @@ class Bar:
             sys.stderr.write("\r\033[K")
 
 
-def security(a: argparse.Namespace) -> Any:
-    from distributed import Security  # type: ignore[import]
+def engine() -> Any:
+    """Dask distributed, which is not there with every installation of this package."""
+    return importlib.import_module("distributed")
 
+
+def security(a: argparse.Namespace) -> Any:
     if not (a.tls_ca or a.tls_cert or a.tls_key):
         return None
-    return Security(tls_ca_file=a.tls_ca, tls_client_cert=a.tls_cert, tls_client_key=a.tls_key,
-                    tls_worker_cert=a.tls_cert, tls_worker_key=a.tls_key,
-                    tls_scheduler_cert=a.tls_cert, tls_scheduler_key=a.tls_key,
-                    require_encryption=True)
+    return engine().Security(tls_ca_file=a.tls_ca, tls_client_cert=a.tls_cert, tls_client_key=a.tls_key,
+                             tls_worker_cert=a.tls_cert, tls_worker_key=a.tls_key,
+                             tls_scheduler_cert=a.tls_cert, tls_scheduler_key=a.tls_key,
+                             require_encryption=True)
 
 
 @asynccontextmanager
 async def connected(a: argparse.Namespace) -> AsyncIterator[Any]:
     """A client of the scheduler, or of one that is started here with its workers."""
-    import dask  # type: ignore[import]
-    from distributed import Client, LocalCluster  # type: ignore[import]
-
-    with dask.config.set(LONG_RENDERS):
+    with importlib.import_module("dask").config.set(LONG_RENDERS):
         if a.local is None:
             try:
-                client = await Client(a.scheduler, asynchronous=True, security=security(a),
-                                      direct_to_workers=a.direct or None, timeout="20s")
+                client = await engine().Client(a.scheduler, asynchronous=True, security=security(a),
+                                               direct_to_workers=a.direct or None,
+                                               timeout="20s")
             except (OSError, ValueError) as error:
                 raise zsi.Error(f"{a.scheduler}: no scheduler answers: {error}") from None
             async with client:
                 yield client
             return
         threads = max(1, len(os.sched_getaffinity(0)) // a.local)
-        async with LocalCluster(n_workers=a.local, threads_per_worker=threads, processes=True,
-                                asynchronous=True, dashboard_address=None, host="127.0.0.1",
-                                security=security(a), protocol="tls" if a.tls_ca else None,
-                                silence_logs=not a.verbose and logging.CRITICAL) as cluster, \
-                Client(cluster, asynchronous=True, direct_to_workers=True) as client:
+        async with engine().LocalCluster(
+                n_workers=a.local, threads_per_worker=threads, processes=True, asynchronous=True,
+                dashboard_address=None, host="127.0.0.1", security=security(a),
+                protocol="tls" if a.tls_ca else None,
+                silence_logs=not a.verbose and logging.CRITICAL) as cluster, \
+                engine().Client(cluster, asynchronous=True, direct_to_workers=True) as client:
             yield client
 
 
@@ -201,7 +204,7 @@ def main() -> int:
     if a.quiet:
         warnings.simplefilter("ignore")
     try:
-        import distributed  # type: ignore[import]  # noqa: F401
+        engine()
     except ImportError:
         sys.stderr.write(MISSING + "\n")
         return 1

@@ -52,8 +52,8 @@ def turntable(scene: str, assignments: Sequence[str], count: int) -> list[tuple[
     for i in range(count):
         angle = 2 * math.pi * i / count
         here = target + along + math.cos(angle) * out + math.sin(angle) * side
-        place = (camera.position if i == 0 else here.tolist())
-        frames.append((*assignments, "camera.position=" + json.dumps(list(map(float, place)))))
+        place = [float(f"{v:.7g}") for v in here]  # as exact as scenes are, and fit to be typed
+        frames.append((*assignments, "camera.position=" + json.dumps(place)))
     return frames
 
 

@@ -22,7 +22,7 @@ from dataclasses import dataclass, field
 from pathlib import Path
 from typing import Any
 
-from distributed import Client, Future, KilledWorker  # type: ignore[import]
+from distributed import KilledWorker
 
 import zsi
 
@@ -33,6 +33,8 @@ from .frames import Frame
 from .pack import Changes, Pack, Packer
 from .plan import Box, unit_size, units
 
+Future = Any
+"""The engine's, of a client that runs in this loop."""
 LATE = 3.0
 """Where nothing else is left to do, a unit that takes so many times the usual goes to a second
 worker, too (the backup tasks of Dean and Ghemawat 2004, "MapReduce")."""
@@ -42,6 +44,8 @@ WORKERS = 3
 """On how many workers a unit must have failed to be given up."""
 RETRY = 30.0
 """Seconds until a worker that could not take the scene is asked again."""
+PATIENCE = 30.0
+"""Seconds to wait for others where no worker can be used."""
 
 
 @dataclass
@@ -149,7 +153,7 @@ class Failed(zsi.Error):
 class Farm:
     """Renders frames on the workers of a client."""
 
-    def __init__(self, client: Client, frames: list[Frame], options: Options,
+    def __init__(self, client: Any, frames: list[Frame], options: Options,
                  tell: Callable[[str], object] = lambda _: None,
                  show: Callable[[Status], object] = lambda _: None) -> None:
         self.client, self.frames, self.options = client, frames, options
@@ -161,6 +165,7 @@ class Farm:
         self.workers: dict[str, dict[str, Any]] = {}
         self.running: set[Unit] = set()
         self.lengths: deque[float] = deque(maxlen=200)  # seconds of the last units
+        self.failures: list[tuple[str, str]] = []  # since the last unit that was rendered
         self._packer = Packer()
         self._preparing: dict[str, asyncio.Task[None]] = {}
         self._pieces: dict[tuple[str, int], Future] = {}
@@ -334,16 +339,18 @@ class Farm:
         if unit.done:
             self.running.discard(unit)
             self.lengths.append(seconds)
+            self.failures.clear()
             self._wake.set()
             if not unit.job.open:
                 await self._finish(unit.job)
             return
         if error:
             unit.errors.append((address, error))
+            self.failures.append((address, error))
             self.tell(f"worker {address}: {_place(unit.box)}: {error}")
             if self._is_hopeless(unit):
                 self._fail(Failed(f"{_place(unit.box)} of {unit.job.frame.output} cannot be "
-                                  f"rendered: {error} (on {_addresses(unit)})"))
+                                  f"rendered: {error} (on {self._addresses(unit)})"))
                 return
         if not unit.attempts:
             self.running.discard(unit)
@@ -352,10 +359,14 @@ class Farm:
             self._wake.set()
 
     def _is_hopeless(self, unit: Unit) -> bool:
-        places = {address for address, _ in unit.errors}
-        return len(unit.errors) >= TURNS * WORKERS or (
-            len(unit.errors) >= WORKERS
-            and len(places) >= min(WORKERS, max(1, len(unit.job.ready))))
+        """It has failed on several workers, or all units have of late."""
+        enough = min(WORKERS, max(1, len(unit.job.ready)))
+        return len(unit.errors) >= TURNS * WORKERS or any(
+            len(errors) >= WORKERS and len({address for address, _ in errors}) >= enough
+            for errors in (unit.errors, self.failures))
+
+    def _addresses(self, unit: Unit) -> str:
+        return ", ".join(sorted({address or "?" for address, _ in unit.errors + self.failures}))
 
     def _help_late_ones(self) -> None:
         if self._next_job() or not self.lengths:
@@ -388,7 +399,12 @@ class Farm:
                         self._preparing[address] = asyncio.create_task(
                             self._prepare(address, job))
             self._help_late_ones()
-            if not now and not told and time.monotonic() - begun > 5:
+            if any(address not in self.unfit for address in now):
+                begun = time.monotonic()
+            elif now and time.monotonic() - begun > PATIENCE:
+                raise Failed(f"no worker can be used: {next(iter(now))} "
+                             f"{self.unfit[next(iter(now))]}")
+            elif not now and not told and time.monotonic() - begun > 5:
                 told = True
                 self.tell("no workers yet")
             self._report()
@@ -423,8 +439,8 @@ class Farm:
         except (CancelledError, OSError):
             pass  # a piece was lost with the worker that had it: the next round tries again
         except Exception as error:  # such as a machine without this package
-            self.unfit[address] = f"{type(error).__name__}: {error}"
-            self.tell(f"worker {address} cannot be used: {self.unfit[address]}")
+            self.unfit[address] = f"cannot be used: {type(error).__name__}: {error}"
+            self.tell(f"worker {address} {self.unfit[address]}")
         finally:
             self._preparing.pop(address, None)
             if not self._preparing:
@@ -482,7 +498,3 @@ class Farm:
 
 def _place(box: Box) -> str:
     return "samples {4} to {5} of {0},{1},{2},{3}".format(*box)
-
-
-def _addresses(unit: Unit) -> str:
-    return ", ".join(sorted({address or "?" for address, _ in unit.errors}))

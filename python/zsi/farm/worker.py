@@ -16,7 +16,7 @@ import warnings
 from pathlib import Path
 from typing import Any
 
-from distributed import get_worker  # type: ignore[import]
+from distributed import get_worker
 
 import zsi
 
@@ -25,7 +25,7 @@ from .._picture import Session
 from .._scene import Scene, load
 from .pack import File, Pack, digest_of
 
-REST = 5.0
+REST = 2.0
 """Seconds before the next unit after one that failed; doubled each time. A worker that fails at once
 would otherwise draw all units to itself."""
 LONGEST_REST = 300.0
