@@ -110,6 +110,16 @@ std::vector<RenderUnit> Merging::missing() const
                    : std::vector<RenderUnit>();
 }
 
+std::uint64_t Merging::missingSamples() const
+{
+    if (!missing_)
+        return origin_ ? volume({origin_->window, {0, origin_->samples}}) : 0;
+    std::uint64_t sum = 0;
+    for (RenderUnit const& box : missing_->boxes())
+        sum += volume(box);
+    return sum;
+}
+
 std::string Merging::missingText() const
 {
     constexpr std::size_t kTold = 4;

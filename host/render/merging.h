@@ -39,6 +39,7 @@ public:
     std::uint64_t rays() const { return rays_; }
     std::uint64_t nonFinite() const { return nonFinite_; }
     std::vector<RenderUnit> missing() const; ///< nothing before the first one
+    std::uint64_t missingSamples() const; ///< of all pixels
     /// The first of what is missing, and how much more there is; empty: nothing.
     std::string missingText() const;
     Film const& film() const { return film_; }

@@ -7,8 +7,10 @@ import math
 from collections.abc import Iterable, Iterator
 from typing import NamedTuple
 
-UNITS_PER_WORKER = 12
-"""Fewer leave workers idle at the end, more cost messages and merging (scripts/farm-model.py)."""
+UNITS_PER_WORKER = 32
+"""Fewer leave workers idle at the end."""
+MOST_UNITS = 160000
+"""More take the scheduler longer than five minutes; but every worker gets two. Both numbers are from scripts/farm-model.py; docs/farm.md has its tables."""
 TILES = (256, 128, 64, 32)
 """Sides in pixels, the largest first. Below 32 a unit's header and its message outweigh its sums."""
 
@@ -31,11 +33,12 @@ class Box(NamedTuple):
 def unit_size(width: int, height: int, samples: int, workers: int) -> tuple[int, int]:
     """Side of a tile in pixels and samples of a block, for a picture of this size.
 
-    The largest tiles of which every worker gets its number, with all samples in one block: each
+    The largest tiles of which there are enough, with all samples in one block: each
     further block brings all sums over the network once more. Where tiles alone are too few, the
     samples are divided as well.
     """
-    wanted = UNITS_PER_WORKER * max(1, workers)
+    workers = max(1, workers)
+    wanted = min(UNITS_PER_WORKER * workers, max(MOST_UNITS, 2 * workers))
     for tile in TILES:
         tiles = math.ceil(width / tile) * math.ceil(height / tile)
         if tiles >= wanted:

@@ -108,7 +108,7 @@ class Job:
 
     def _count(self) -> None:
         """For others than the thread that merges."""
-        self.open = sum(Box(*box).size() for box in self.merging.missing())
+        self.open = self.merging.missing_samples
         self.rays = self.merging.rays
 
     def add(self, box: Box, data: bytes) -> None:
