@@ -70,15 +70,12 @@ def simulate(work: float, workers: int, size: tuple[int, int, int], farm: Farm,
     costs = [mean * math.exp(chance.gauss(shift, farm.spread)) for _ in boxes]
     bytes_of = farm.pixel_bytes * tile * tile
     merge = max(farm.unit + farm.pixel * tile * tile, bytes_of / farm.line)
-    waves = math.ceil(math.log2(workers + 1))
-    pieces = max(1, farm.scene / (32 << 20))
-    # Pieces follow each other through the waves.
-    spread_time = farm.scene / farm.line * (1 + (waves - 1) / pieces)
+    wave = farm.scene / farm.line
+    spread_time = wave * math.ceil(math.log2(workers + 1))
     ready = []
     for i in range(workers):
         speed = math.exp(chance.gauss(0, farm.speeds)) / (3 if chance.random() < farm.slow else 1)
-        ready.append((spread_time * (1 + math.floor(math.log2(i + 1))) / waves + farm.load, i,
-                      speed))
+        ready.append((wave * (1 + math.floor(math.log2(i + 1))) + farm.load, i, speed))
     heapq.heapify(ready)
     scheduler = merged = 0.0
     queue = list(reversed(costs))

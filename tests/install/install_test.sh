@@ -42,6 +42,8 @@ if [ -d "$build/python" ]; then
     /usr/bin/python3 -m zipfile -e "$build"/zsi-*.whl wheel
     PYTHONPATH=wheel /usr/bin/python3 -c "$count" >wheel.txt
     [ "$(cat wheel.txt)" = "$(wc -l <classes) $work/wheel/zsi/__init__.py" ] || fail "$(cat wheel.txt)"
+    PYTHONPATH=wheel /usr/bin/python3 -m zsi.farm --help >farm.txt || fail "the wheel has no farm"
+    farm=farm # finds its package below the prefix
 fi
 "$zsi" info voSpotLight >spot
 has "linear RGB" spot
@@ -51,7 +53,7 @@ grep -q corvid_Mtl_Glazing "$prefix/share/zsi/scene.schema.json" || fail "no sch
 
 # The manual has every option that the command has, and is well-formed.
 page=$prefix/share/man/man1/zsi.1
-for subcommand in "" info render schema denoise render-unit merge; do
+for subcommand in "" info render schema denoise render-unit merge ${farm:-}; do
     "$zsi" $subcommand --help | grep -oE -- '--[a-z][a-z-]*' | sort -u | while read -r option; do
         grep -qF -- "${option//-/\\-}" "$page" || fail "zsi.1: $option is missing"
     done
@@ -151,9 +153,14 @@ has zephyrShaders64.so content
 has /man1/zsi.1 content
 dpkg-deb -x deb/zsi_*.deb unpacked
 unpacked/usr/bin/zsi info | cmp - classes || fail "the packaged command lists other classes"
+! unpacked/usr/bin/zsi farm 2>farm.txt || fail "a farm without its package"
+has "python3-zsi" farm.txt
 if [ -d "$build/python" ]; then
     dpkg-deb -x deb/python3-zsi_*.deb unpacked
     package=$(dirname "$(dirname "$(find unpacked -name '_core*.so')")")
     PYTHONPATH=$package /usr/bin/python3 -c "$count" >packaged.txt
     has "$(wc -l <classes) " packaged.txt
+    unpacked/usr/bin/zsi farm --help >farm.txt
+    dpkg-deb -f deb/python3-zsi_*.deb Recommends >python
+    has python3-distributed python
 fi

@@ -147,7 +147,7 @@ async def connected(a: argparse.Namespace) -> AsyncIterator[Any]:
         threads = max(1, len(os.sched_getaffinity(0)) // a.local)
         async with engine().LocalCluster(
                 n_workers=a.local, threads_per_worker=threads, processes=True, asynchronous=True,
-                dashboard_address=None, host="127.0.0.1", security=security(a),
+                dashboard_address="127.0.0.1:0", host="127.0.0.1", security=security(a),
                 protocol="tls" if a.tls_ca else None,
                 silence_logs=not a.verbose and logging.CRITICAL) as cluster, \
                 engine().Client(cluster, asynchronous=True, direct_to_workers=True) as client:

@@ -411,8 +411,8 @@ class Farm:
             await asyncio.sleep(0.2 if len(now) < 100 else 1.0)
 
     def _may_prepare(self, job: Job) -> bool:
-        """Files go from worker to worker; twice as many can give them each time."""
-        return len(self._preparing) < max(4, 2 * len(job.ready))
+        """Files go from worker to worker: as many get them at a time as have them."""
+        return len(self._preparing) < max(4, len(job.ready))
 
     def _lost(self, address: str) -> None:
         info = self.workers[address]
