@@ -127,9 +127,13 @@ Json describe(fs::path const& sources, char const* name)
     Class::visit(*shader, describer);
     check(describer.parameters, name);
     std::string const text = prose(sources, name);
-    return {{"summary", firstSentence(text)},
-            {"description", text},
-            {"parameters", std::move(describer.parameters)}};
+    Json entry{{"summary", firstSentence(text)},
+               {"description", text},
+               {"parameters", std::move(describer.parameters)}};
+    if constexpr (requires { Class::kDepartures; })
+        for (zsi::Departure const& departure : Class::kDepartures)
+            entry["departures"][departure.check] = departure.why;
+    return entry;
 }
 
 } // namespace

@@ -35,6 +35,7 @@ Subcommand addDenoise(CLI::App& app);
 Subcommand addRenderUnit(CLI::App& app, std::string const& shaderPath);
 Subcommand addMerge(CLI::App& app);
 Subcommand addFarm(CLI::App& app, std::string const& shaderPath);
+Subcommand addLab(CLI::App& app, std::string const& shaderPath);
 
 /// The options of how 8-bit pictures show light.
 struct ViewOptions {

@@ -72,7 +72,7 @@ int run(int argc, char** argv)
     Subcommand const subcommands[] = {addInfo(app, shaderPath),       addRender(app, shaderPath),
                                       addSchema(app, shaderPath),     addDenoise(app),
                                       addRenderUnit(app, shaderPath), addMerge(app),
-                                      addFarm(app, shaderPath)};
+                                      addFarm(app, shaderPath),       addLab(app, shaderPath)};
     app.footer("Exit status: 0 done, 1 bad input, 2 bad command line, 130 interrupted.");
 
     try {
@@ -86,7 +86,7 @@ int run(int argc, char** argv)
         if (subcommand.app->parsed())
             return subcommand.run();
     throw UsageError("a subcommand is missing: info, render, denoise, schema, render-unit, "
-                     "merge or farm (zsi --help)");
+                     "merge, farm or lab (zsi --help)");
 }
 
 } // namespace

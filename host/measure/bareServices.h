@@ -5,13 +5,18 @@
 #include "sampling/sampler.h"
 #include "shading/noiseServices.h"
 
+#include <zsi/vecmath.h>
 #include <zsi/zsi.h>
 
 namespace zsi::host {
 
-/// Random numbers and noise as in a rendering; no lights, and every ray sees black and is free.
+/// Random numbers and noise as in a rendering; no lights but one that is switched on, and every ray
+/// sees black and is free.
 class BareServices final : public NoiseServices {
 public:
+    /// A light that is on every list, while not null; its `weight` is written.
+    LightSample* light = nullptr;
+
     /// Random numbers come from `sampler`, which must outlive this.
     explicit BareServices(Sampler& sampler)
         : sampler_(sampler)
@@ -19,7 +24,13 @@ public:
     }
 
     using V = Vec3f const*;
-    LightSample* getLightSamples(int, V, V) override { return nullptr; }
+    LightSample* getLightSamples(int, V, V normal) override
+    {
+        if (!light)
+            return nullptr;
+        light->weight = dot(light->L, *normal);
+        return light->weight > 0.0f ? light : nullptr;
+    }
     Vec3f ambientLight(V, V) override { return {0, 0, 0}; }
     Vec3f shadowTransmission(V, V) override { return {1, 1, 1}; }
     Vec3f traceContinue(int, V, V, float) override { return {0, 0, 0}; }

@@ -2,11 +2,13 @@
 #include "measure/materialProbe.h"
 
 #include "base/error.h"
+#include "base/hash.h"
 #include "measure/bareServices.h"
 
 #include <algorithm>
 #include <cmath>
 #include <cstring>
+#include <limits>
 #include <tbb/blocked_range.h>
 #include <tbb/parallel_for.h>
 #include <tbb/parallel_reduce.h>
@@ -114,7 +116,27 @@ public:
         material_.sample(&services_, state_);
         return state_.sampleType != kSampleNone;
     }
+    /// From now on numbers that have nothing to do with those of other seeds.
+    void reseed(std::uint32_t seed) { sampler_ = Sampler(seed, 0, 0); }
+    Vec3f show(std::uint32_t index, LightSample* light)
+    {
+        sampler_.start(index);
+        services_.light = light;
+        state_.Ci = {0, 0, 0, 1};
+        state_.discardHit = 0;
+        material_.shade(&services_, state_);
+        services_.light = nullptr;
+        constexpr float kNone = std::numeric_limits<float>::quiet_NaN();
+        return state_.discardHit ? Vec3f(kNone, kNone, kNone) : rgb(state_.Ci);
+    }
     ShadeState const& drawn() const { return state_; }
+    void writeTo(DrawnDirections const& out, std::size_t i, bool taken) const
+    {
+        out.direction[i] = taken ? state_.sampleDirection : Vec3f(0, 0, 0);
+        out.weight[i] = taken ? weight() : Vec3f(0, 0, 0);
+        out.density[i] = taken ? 1.0f / state_.sampleInvPdf : 0.0f;
+        out.type[i] = state_.sampleType;
+    }
     Vec3f weight() const { return state_.outBrdf * (state_.sampleCosine * state_.sampleInvPdf); }
 
 private:
@@ -165,12 +187,41 @@ void MaterialProbe::sample(std::span<Vec3f const> wi, std::uint32_t seed,
             Call call(*this, seed, direction);
             for (; i < std::min(end, (direction + 1) * draws); ++i) {
                 bool const taken = call.draw(wi[direction], static_cast<std::uint32_t>(i % draws));
-                ShadeState const& drawn = call.drawn();
-                out.direction[i] = taken ? drawn.sampleDirection : Vec3f(0, 0, 0);
-                out.weight[i] = taken ? call.weight() : Vec3f(0, 0, 0);
-                out.density[i] = taken ? 1.0f / drawn.sampleInvPdf : 0.0f;
-                out.type[i] = drawn.sampleType;
+                call.writeTo(out, i, taken);
             }
+        }
+    });
+}
+
+void MaterialProbe::sampleApart(Vec3f wi, std::uint32_t seed, DrawnDirections const& out,
+                                int threads) const
+{
+    need(kSample, "sample");
+    inParallel(out.direction.size(), kGrain, threads, [&](std::size_t begin, std::size_t end) {
+        Call call(*this, seed);
+        for (std::size_t i = begin; i < end; ++i) {
+            call.reseed(hashCombine(seed, static_cast<std::uint32_t>(i)));
+            call.writeTo(out, i, call.draw(wi, 0));
+        }
+    });
+}
+
+void MaterialProbe::lit(std::span<Vec3f const> wi, std::span<Vec3f const> wo,
+                        std::span<Vec3f> values, int threads) const
+{
+    need(kShade, "shade");
+    inParallel(values.size(), kGrain, threads, [&](std::size_t begin, std::size_t end) {
+        Call call(*this, 0);
+        LightSample light = {};
+        constexpr float kDim = 1.0f / 128.0f;
+        light.color = {kDim, kDim, kDim};
+        light.shadow = {1, 1, 1};
+        for (std::size_t i = begin; i < end; ++i) {
+            call.see(wi[wi.size() == 1 ? 0 : i]);
+            light.L = wo[wo.size() == 1 ? 0 : i];
+            auto const index = static_cast<std::uint32_t>(i);
+            Vec3f const dark = call.show(index, nullptr);
+            values[i] = (call.show(index, &light) - dark) * (1.0f / kDim);
         }
     });
 }

@@ -51,6 +51,16 @@ public:
     /// InputError for a material without `sample`.
     void sample(std::span<Vec3f const> wi, std::uint32_t seed, DrawnDirections const& out,
                 int threads = 0) const;
+    /// Draws for one `wi` that depend on each other in nothing, as statistics take them; else as
+    /// above.
+    void sampleApart(Vec3f wi, std::uint32_t seed, DrawnDirections const& out,
+                     int threads = 0) const;
+    /// What one light of colour 1 towards each of `wo` adds to what `shade` shows, where there is
+    /// nothing else, found with one of 1/128, since some classes clip what they show: pi times the
+    /// value times the cosine for a material that lights itself as `transfer` says. NaN where it
+    /// discards the hit.
+    void lit(std::span<Vec3f const> wi, std::span<Vec3f const> wo, std::span<Vec3f> values,
+             int threads = 0) const;
     /// The share of light that a white furnace gets back, for `wi` at `theta` radians from z
     /// towards x: the mean weight of `draws` draws.
     void albedo(std::span<float const> theta, std::uint32_t draws, std::uint32_t seed,

@@ -45,6 +45,8 @@ ClassDescription readClass(Json const& json)
     if (json.contains("parameters"))
         for (auto const& [name, parameter] : json.at("parameters").items())
             description.parameters[name] = readParameter(parameter);
+    if (json.contains("departures"))
+        json.at("departures").get_to(description.departures);
     return description;
 }
 

@@ -36,6 +36,8 @@ struct ClassDescription {
     std::string summary; ///< a line
     std::string text; ///< paragraphs, the summary among them
     std::map<std::string, ParameterDescription> parameters;
+    /// What `zsi lab --check` need not find, by the name of the check: why.
+    std::map<std::string, std::string> departures;
 };
 
 /// By class name.
@@ -46,7 +48,8 @@ using LibraryDescription = std::map<std::string, ClassDescription>;
 ///       "meaning": "...", "default": true, "group": "...",
 ///       "minimum": 0, "maximum": 1, "step": 0.1,
 ///       "objectSize": 2.5,
-///       "when": [{"parameters": ["other"], "from": 1, "to": 3}]}}}}
+///       "when": [{"parameters": ["other"], "from": 1, "to": 3}]}},
+///       "departures": {"reciprocity": "..."}}}
 /// Other keys are for other readers. Empty when there is no such file; throws InputError when it
 /// cannot be understood.
 LibraryDescription readDescription(std::filesystem::path const& sharedObject);

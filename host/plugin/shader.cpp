@@ -119,6 +119,7 @@ void Shader::describe(LibraryDescription const& description)
         return;
     summary_ = found->second.summary;
     text_ = found->second.text;
+    departures_ = found->second.departures;
     auto const& rows = found->second.parameters;
     for (Parameter& p : parameters_)
         if (auto const row = rows.find(p.name); row != rows.end())

@@ -5,6 +5,7 @@
 #include "base/names.h"
 #include "plugin/description.h"
 
+#include <map>
 #include <memory>
 #include <string>
 #include <string_view>
@@ -72,6 +73,8 @@ public:
     std::vector<std::string> parameterNames() const; ///< registered order
     std::string const& summary() const { return summary_; } ///< a line, empty if not described
     std::string const& text() const { return text_; } ///< what the class models, likewise
+    /// Properties that its formulas leave out on purpose (`ClassDescription`).
+    std::map<std::string, std::string> const& departures() const { return departures_; }
     void describe(LibraryDescription const& description);
 
     /// Writes the field. Throws InputError for an unknown name (with the nearest ones) or a type
@@ -91,6 +94,7 @@ private:
     std::vector<Parameter> parameters_;
     std::vector<Attribute> attributes_;
     std::string summary_, text_;
+    std::map<std::string, std::string> departures_;
 };
 
 } // namespace zsi::host

@@ -5,7 +5,7 @@
 # zlib1g-dev: assimp's CMake package links to it without depending on it.
 packages_build=(g++ cmake ninja-build libembree-dev libopenimageio-dev openimageio-tools
     libimath-dev libtbb-dev libassimp-dev zlib1g-dev nlohmann-json3-dev libcli11-dev libfmt-dev
-    libelf-dev pybind11-dev python3-dev python3-numpy)
+    libelf-dev libboost-dev pybind11-dev python3-dev python3-numpy)
 packages_test=(libgtest-dev libbenchmark-dev binutils valgrind pkg-config dpkg-dev file groff-base
     python3-jsonschema python3-pil python3-scipy python3-matplotlib python3-distributed
     mypy)

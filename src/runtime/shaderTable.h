@@ -113,6 +113,12 @@ inline T readAttribute(ShadeState const& state, std::size_t offset)
     return std::bit_cast<T>(value);
 }
 
+/// A property that scattering is measured for and that a class's formulas leave out on purpose: the
+/// name of the check of `zsi lab --check`, and why. A class lists its own in `kDepartures`.
+struct Departure {
+    char const *check, *why;
+};
+
 } // namespace zsi
 
 #define ZSI_ROW_NONE(...)

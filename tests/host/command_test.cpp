@@ -193,6 +193,31 @@ TEST_F(Command, UnitsOfFoldersAndListsMergeToTheBytesOfOneRender)
     expectContains(partial.out, {"1 units", "missing: samples 0 to 4 of 0,0,32,9; samples 0 to 1"});
 }
 
+TEST_F(Command, LabWritesFiguresAndChecksFailByExitStatus)
+{
+    std::string const library = " --shader-path " ZSI_FIXTURE_DIR "/labShaders";
+    Result const r =
+        zsi("lab Lambert color=1,0.5,0.25 -o a/b --draws 2048 --angles 0,40" + library);
+    EXPECT_EQ(r.status, 0) << r.err;
+    EXPECT_EQ(r.err, "");
+    Json const summary = Json::parse(content(folder_.path / "a/b/lab.json"));
+    for (Json const& name : summary.at("files"))
+        EXPECT_FALSE(content(folder_.path / "a/b" / name.get<std::string>()).empty()) << name;
+    EXPECT_EQ(summary.at("density").size(), 2u);
+    EXPECT_EQ(content(folder_.path / "a/b/slice.png").substr(1, 3), "PNG");
+    EXPECT_TRUE(content(folder_.path / "a/b/lobe.csv").starts_with("material,incident_deg,"));
+    fs::remove_all(folder_.path / "a");
+
+    Result const right = zsi("lab --check" + library);
+    EXPECT_EQ(right.status, 0) << right.out;
+    expectContains(right.out, {"ok     Lambert  density: chi-square "});
+    Result const wrong = zsi("lab --check -q Lambert Lambert defect=2" + library);
+    EXPECT_EQ(wrong.status, 1);
+    EXPECT_TRUE(wrong.out.starts_with("FAIL   Lambert defect=2  density: ")) << wrong.out;
+    EXPECT_EQ(wrong.out.find('\n'), wrong.out.size() - 1) << wrong.out;
+    EXPECT_EQ(files(), before_);
+}
+
 TEST_F(Command, ProgressFitsTheTerminal)
 {
     for (unsigned short const columns : std::array<unsigned short, 2>{30, 100}) {
@@ -279,6 +304,13 @@ TEST_F(Command, BadCallsEndInOneLineAndLeaveNothing)
         {"merge -o a.exr", 2, {"no units"}},
         {"merge . -o a.exr", 1, {".: has no .exr files"}},
         {"merge scene.json -o a.exr", 1, {"scene.json"}},
+        {"lab -o a", 2, {"--merl FILE"}},
+        {"lab corvid_Mtl_Metal", 2, {"--output"}},
+        {"lab corvid_Mtl_Metl -o a", 1, {"did you mean corvid_Mtl_Metal"}},
+        {"lab corvid_Mtl_Metal --angles 90 -o a", 2, {"--angles"}},
+        {"lab corvid_Mtl_Metal --merl scene.json -o a", 1, {"scene.json: expected a MERL table"}},
+        {"lab corvid_Mtl_Metal -o scene.json", 1, {"scene.json: no folder"}},
+        {"lab corvid_Mtl_Metal -o /proc", 1, {"/proc/lab.json: cannot be written"}},
         {"info --shader-path " ZSI_FIXTURE_DIR "/oldShaders", 1, {"version 2700", "version 2722"}},
         // Before the scene is looked at, since that may take long.
         {"render missing.json -o /proc/a.png", 1, {"/proc/a.png: cannot be written"}},

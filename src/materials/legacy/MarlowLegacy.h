@@ -167,6 +167,9 @@ class MarlowLegacy final : public MaterialShader,
                            public TriplanarMappingFunctions,
                            public AmbientOcclusionFunctions<MarlowLegacy> {
 public:
+    static constexpr Departure kDepartures[] = {
+        {"reciprocity", "highlights and the base under them follow the viewer's direction"}};
+
     SHADER(MarlowLegacy, kShade | kTransmission | kTransfer | kSample, MARLOW_LEGACY)
     void shade(IShaderAPI* api, ShadeState& state) const override;
     void transmission(IShaderAPI* api, ShadeState& state) const override;

@@ -57,6 +57,8 @@ class corvid_Mtl_MetallicPaint final : public MaterialShader,
                                        public SafeReflectFunctions {
 public:
     static constexpr bool kMaskSaturates = true;
+    static constexpr Departure kDepartures[] = {
+        {"reciprocity", "single flakes and an orange peel; the crowd of flakes holds it"}};
 
     SHADER(corvid_Mtl_MetallicPaint, kShade | kTransfer | kSample, METALLIC_PAINT)
     void shade(IShaderAPI* api, ShadeState& state) const override;

@@ -38,6 +38,9 @@ class WardMaterial : public Fields,
                      public SafeReflectFunctions,
                      public IndirectDiffuseFunctions {
 public:
+    static constexpr Departure kDepartures[] = {
+        {"light", "lights bring no pi to the glossy lobe, and fade out towards the horizon"}};
+
 #define WARD_USING(T, name, ...) using Fields::name;
     WARD_CHANNELS(WARD_USING, WARD_USING, ZSI_ROW_NONE)
 #undef WARD_USING
