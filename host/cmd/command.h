@@ -30,6 +30,7 @@ struct Subcommand {
 /// `shaderPath`: the global option, which outlives the subcommand and is filled by the parse.
 Subcommand addInfo(CLI::App& app, std::string const& shaderPath);
 Subcommand addRender(CLI::App& app, std::string const& shaderPath);
+Subcommand addView(CLI::App& app, std::string const& shaderPath);
 Subcommand addSchema(CLI::App& app, std::string const& shaderPath);
 Subcommand addDenoise(CLI::App& app);
 Subcommand addRenderUnit(CLI::App& app, std::string const& shaderPath);

@@ -154,13 +154,20 @@ void checkPictureFile(std::filesystem::path const& file)
     ReplacedFile::check(file);
 }
 
-void writePicture(std::filesystem::path const& file, Picture const& picture, ScreenView const& view)
+std::vector<unsigned char> encodePicture(std::filesystem::path const& file, Picture const& picture,
+                                         ScreenView const& view)
 {
     Kind const kind = kindOf(file);
     if (picture.width() <= 0 || picture.height() <= 0)
         throw InputError(file.string() + ": the picture is empty");
+    return encode(file, picture, view, kind);
+}
+
+void writePicture(std::filesystem::path const& file, Picture const& picture, ScreenView const& view)
+{
+    kindOf(file);
     ReplacedFile goal(file);
-    goal.write(encode(file, picture, view, kind));
+    goal.write(encodePicture(file, picture, view));
     goal.commit();
 }
 

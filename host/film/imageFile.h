@@ -24,6 +24,10 @@ void checkPictureFile(std::filesystem::path const& file);
 void writePicture(std::filesystem::path const& file, Picture const& picture,
                   ScreenView const& view);
 
+/// The bytes of such a file; of `file` only the extension counts.
+std::vector<unsigned char> encodePicture(std::filesystem::path const& file, Picture const& picture,
+                                         ScreenView const& view);
+
 /// What `writePicture` has written to an .exr file, or another renderer: channels without a layer
 /// are "beauty", which comes first. Throws InputError, also where the file has no R, G, B and A.
 Picture readPicture(std::filesystem::path const& file);

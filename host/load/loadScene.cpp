@@ -15,7 +15,7 @@ namespace zsi::host {
 namespace {
 
 /// Parts in order; later ones refer to earlier ones by name.
-void read(JsonReader const& root, SceneBuilder& builder)
+void read(JsonReader const& root, SceneBuilder& builder, LoadOptions const& options)
 {
     root.expectKeys({"$schema", "include", "camera", "film", "settings", "meshes", "materials",
                      "instances", "lights", "environment"});
@@ -30,7 +30,10 @@ void read(JsonReader const& root, SceneBuilder& builder)
     if (auto const v = root.find("meshes"))
         for (auto const& [name, mesh] : v->members()) {
             builder.begin(mesh);
-            builder.addMesh(readMesh(mesh, builder.scene));
+            std::optional<Mesh> known;
+            if (options.knownMesh)
+                known = options.knownMesh(name);
+            builder.addMesh(known ? std::move(*known) : readMesh(mesh, builder.scene));
             builder.scene.meshes.back().name = name;
             builder.meshes.add(name);
         }
@@ -63,14 +66,15 @@ Scene loadScene(std::filesystem::path const& file, ShaderSource const& shaders,
     return loadScene(readSceneFile(file, options.assignments), file, shaders, options);
 }
 
-Scene loadScene(JsonValue const& tree, std::filesystem::path const& file,
+Scene loadScene(JsonValue const& document, std::filesystem::path const& file,
                 ShaderSource const& shaders, LoadOptions const& options)
 {
     Scene scene;
     scene.file = file.string();
-    scene.textures = std::make_shared<TextureStore>(options.textures);
+    scene.textures = options.textureStore ? options.textureStore
+                                          : std::make_shared<TextureStore>(options.textures);
     SceneBuilder builder(scene, shaders, options);
-    read(JsonReader(tree), builder);
+    read(JsonReader(document), builder, options);
     for (std::string const& warning : scene.textures->warnings())
         scene.warnings.push_back(scene.file + ": " + warning);
     return scene;

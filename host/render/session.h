@@ -68,6 +68,7 @@ public:
     explicit Session(Scene const& scene, BuildProgress const& progress = {});
 
     Scene const& scene() const { return prepared_.scene(); }
+    PreparedScene const& prepared() const { return prepared_; }
     void materialChanged(std::size_t index) { prepared_.materialChanged(index); }
     void environmentChanged() { prepared_.environmentChanged(); }
     void lightsChanged() { prepared_.lightsChanged(); }

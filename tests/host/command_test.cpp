@@ -282,7 +282,9 @@ TEST_F(Command, BadCallsEndInOneLineAndLeaveNothing)
     };
     std::string const render = "render scene.json -o a.png ";
     Call const calls[] = {
-        {"", 2, {"info, render, denoise, schema"}},
+        {"", 2, {"info, render, view, denoise, schema"}},
+        {"view absent.json", 1, {"absent.json"}},
+        {"view scene.json --bind nowhere", 1, {"cannot listen on nowhere"}},
         {"rendr scene.json", 2, {"rendr", "did you mean render?"}},
         {"info a b", 2, {"unexpected argument"}},
         {"--threads 2 render scene.json -o a.png", 2, {"behind the subcommand"}},

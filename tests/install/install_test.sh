@@ -53,7 +53,7 @@ grep -q corvid_Mtl_Glazing "$prefix/share/zsi/scene.schema.json" || fail "no sch
 
 # The manual has every option that the command has, and is well-formed.
 page=$prefix/share/man/man1/zsi.1
-for subcommand in "" info render schema denoise render-unit merge lab ${farm:-}; do
+for subcommand in "" info render view schema denoise render-unit merge lab ${farm:-}; do
     "$zsi" $subcommand --help | grep -oE -- '--[a-z][a-z-]*' | sort -u | while read -r option; do
         grep -qF -- "${option//-/\\-}" "$page" || fail "zsi.1: $option is missing"
     done

@@ -1,0 +1,235 @@
+// SPDX-License-Identifier: Apache-2.0
+// What a session answers without changing.
+#include "base/error.h"
+#include "base/names.h"
+#include "film/imageFile.h"
+#include "render/cameraRays.h"
+#include "render/render.h"
+#include "view/difference.h"
+#include "view/sceneText.h"
+#include "view/studio.h"
+#include "view/thumbnail.h"
+
+#include <algorithm>
+#include <charconv>
+#include <cmath>
+#include <fmt/format.h>
+
+namespace zsi::view {
+namespace {
+
+Json toJson(Vec3f const& v) { return {v.x, v.y, v.z}; }
+
+/// JSON has no NaN and no infinity.
+Json number(float v) { return std::isfinite(v) ? Json(v) : Json(fmt::format("{}", v)); }
+
+/// White where the eye sees most, over yellow and red from black.
+ShownPicture heatPicture(std::vector<float> const& values, int width, int height)
+{
+    ShownPicture picture{width, height, {}};
+    auto const byte = [](float v) {
+        return static_cast<std::uint8_t>(std::lround(255.0f * std::clamp(v, 0.0f, 1.0f)));
+    };
+    for (float const v : values)
+        for (std::uint8_t const b :
+             {byte(3 * v), byte(3 * v - 1), byte(3 * v - 2), std::uint8_t(255)})
+            picture.rgba.push_back(b);
+    return picture;
+}
+
+/// Every file that a document names.
+void filesOf(Json const& value, std::set<std::string>& files)
+{
+    for (auto const& [key, member] : value.items()) {
+        if (member.is_structured())
+            filesOf(member, files);
+        else if (member.is_string())
+            files.insert(member.get<std::string>());
+    }
+}
+
+bool isBelow(std::filesystem::path const& file, std::filesystem::path const& folder)
+{
+    auto const [end, at] = std::mismatch(folder.begin(), folder.end(), file.begin(), file.end());
+    return end == folder.end() && at != file.end();
+}
+
+} // namespace
+
+void Studio::pick(PageId page, Json const& message)
+{
+    host::Scene const& scene = live_.scene();
+    float const x = message.at("x"), y = message.at("y");
+    Vec3f origin, direction;
+    host::CameraRays(scene.camera, scene.film).ray(x + 0.5f, y + 0.5f, {0, 0}, origin, direction);
+    Json told = {{"type", "picked"}, {"id", message.value("id", Json())}, {"material", nullptr}};
+    host::RayScene const& rays = live_.session().prepared().rays();
+    host::Hit hit;
+    if (rays.intersect({origin, direction}, host::Visibility::All, hit)) {
+        host::SurfacePoint const s = rays.surface(hit);
+        host::Instance const& instance = scene.instances[s.instance];
+        std::string const& name = scene.instanceNames[s.instance];
+        if (instance.light >= 0)
+            told["light"] = scene.lightNames[static_cast<std::size_t>(instance.light)];
+        else
+            told["material"] = scene.materialNames[static_cast<std::size_t>(instance.material)];
+        told["object"] = name;
+        told["instance"] = name.substr(0, name.find('/'));
+        told["position"] = toJson(s.P);
+        told["normal"] = toJson(s.N);
+        told["distance"] = hit.t;
+    }
+    audience_->tell(page, told);
+}
+
+void Studio::inspect(PageId page, Json const& message)
+{
+    int const x = message.at("x"), y = message.at("y");
+    host::Film const& film = preview_.film();
+    if (x < 0 || y < 0 || x >= film.frameWidth() || y >= film.frameHeight())
+        throw host::InputError("inspect: the pixel lies outside of the picture");
+    host::Film pixel(film.frameWidth(), film.frameHeight(), {x, y, x + 1, y + 1}, film.layers());
+    pixel.add(film);
+    host::Picture const picture = pixel.picture();
+    Json layers = Json::object();
+    for (host::Layer const& layer : picture.layers) {
+        Json values = Json::array();
+        for (float const v : layer.values)
+            values.push_back(number(v));
+        layers[layer.name] = values;
+    }
+    std::vector<float> rgb(picture.rgba().begin(), picture.rgba().begin() + 3);
+    host::screenTransform(host::screenView(live_.scene().film))(rgb);
+    Json shown = Json::array();
+    for (float const v : rgb)
+        shown.push_back(std::lround(255.0f * std::clamp(v, 0.0f, 1.0f)));
+    audience_->tell(page,
+                    {{"type", "values"},
+                     {"id", message.value("id", Json())},
+                     {"x", x},
+                     {"y", y},
+                     {"layers", layers},
+                     {"shown", shown},
+                     {"samples", film.count(x, y, 0)}});
+}
+
+Studio::Slot Studio::now() const
+{
+    return {document_.json(), preview_.picture().rgba(), preview_.shown("beauty")};
+}
+
+void Studio::keep(std::string const& slot)
+{
+    slots_[slot] = now();
+    audience_->tell(kAllPages, {{"type", "kept"}, {"slot", slot}, {"samples", preview_.samples()}});
+}
+
+void Studio::compare(PageId page, Json const& message)
+{
+    if (slots_.empty())
+        throw host::InputError("compare: nothing was kept");
+    bool const both = slots_.size() == 2;
+    Slot const& a = slots_.begin()->second;
+    Slot const b = both ? slots_.rbegin()->second : now();
+    if (a.shown.width != b.shown.width || a.shown.height != b.shown.height)
+        throw host::InputError(fmt::format("compare: the pictures have different sizes, {}x{} and "
+                                           "{}x{}",
+                                           a.shown.width, a.shown.height, b.shown.width,
+                                           b.shown.height));
+    LinearDifference const linear = linearDifference(a.rgba, b.rgba);
+    std::vector<float> const flip = flipDifference(a.shown, b.shown);
+    double sum = 0;
+    for (float const v : flip)
+        sum += static_cast<double>(v);
+    audience_->tell(page,
+                    {{"type", "comparison"},
+                     {"id", message.value("id", Json())},
+                     {"rmse", linear.rmse},
+                     {"flip", sum / static_cast<double>(flip.size())},
+                     {"max", linear.largest}});
+    ShownPicture const difference = heatPicture(flip, a.shown.width, a.shown.height);
+    int kind = 2;
+    for (ShownPicture const* picture : {&a.shown, &b.shown, &difference})
+        audience_->send(page, makePngBand(*picture, preview_.generation(), kind++));
+}
+
+void Studio::ask(std::string name, Query query, std::function<void(Reply)> answer)
+{
+    post(
+        [this, name = std::move(name), query = std::move(query), answer = std::move(answer)] {
+            try {
+                if (name == "thumbnail") {
+                    // Pictures can be large: not on the thread that renders.
+                    std::erase_if(thumbnails_, [](std::future<void> const& f) {
+                        return f.wait_for(std::chrono::seconds(0)) == std::future_status::ready;
+                    });
+                    thumbnails_.push_back(std::async(
+                        std::launch::async, [make = thumbnail(query), answer] { answer(make()); }));
+                } else {
+                    answer(this->answer(name, query));
+                }
+            } catch (std::exception const& error) {
+                answer({404, "text/plain", error.what() + std::string("\n")});
+            }
+        },
+        false);
+}
+
+Reply Studio::answer(std::string const& name, Query const& query)
+{
+    auto const value = [&](char const* key) {
+        auto const found = query.find(key);
+        return found == query.end() ? std::string() : found->second;
+    };
+    std::string const stem = file_.stem().string();
+    if (name == "scene.json")
+        return {200, "application/json", sceneText(document_.json()), stem + ".json"};
+    if (name == "class")
+        return {200, "application/json", classJson(value("name")).dump(2) + '\n'};
+    std::string const layer = value("layer").empty() ? "beauty" : value("layer");
+    if (name == "picture.png")
+        return {200, "image/png", pngOf(preview_.shown(layer)), stem + ".png"};
+    if (name == "picture.exr") {
+        host::Picture picture = preview_.picture();
+        if (layer != "beauty")
+            std::erase_if(picture.layers,
+                          [&](host::Layer const& l) { return !l.name.starts_with(layer); });
+        if (picture.layers.empty())
+            throw host::InputError(host::printable(layer) + ": the picture has no such layer");
+        std::vector<unsigned char> const bytes =
+            host::encodePicture(name, picture, host::screenView(live_.scene().film));
+        return {200, "image/x-exr", {bytes.begin(), bytes.end()}, stem + ".exr"};
+    }
+    std::size_t frame = 0;
+    if (name.starts_with("turntable/")
+        && std::from_chars(name.data() + 10, name.data() + name.size(), frame).ec == std::errc()
+        && frame < turntablePictures_.size())
+        return {200, "image/png", turntablePictures_[frame],
+                fmt::format("{}-{:03}.png", stem, frame)};
+    throw host::InputError(host::printable(name) + ": there is no such file");
+}
+
+std::function<Reply()> Studio::thumbnail(Query const& query) const
+{
+    auto const file = query.find("file"), side = query.find("size");
+    if (file == query.end())
+        throw host::InputError("thumbnail: which file?");
+    int size = 96;
+    if (side != query.end())
+        std::from_chars(side->second.data(), side->second.data() + side->second.size(), size);
+    std::set<std::string> named;
+    filesOf(document_.json(), named);
+    std::filesystem::path const folder = std::filesystem::absolute(file_).parent_path();
+    std::filesystem::path const path = std::filesystem::weakly_canonical(folder / file->second);
+    if (!named.contains(file->second) && !isBelow(path, std::filesystem::weakly_canonical(folder)))
+        throw host::InputError("thumbnail: the scene does not name this file");
+    return [path, size = std::clamp(size, 16, 512)]() -> Reply {
+        try {
+            return {200, "image/png", pngOf(thumbnailOf(path, size))};
+        } catch (std::exception const& error) {
+            return {404, "text/plain", error.what() + std::string("\n")};
+        }
+    };
+}
+
+} // namespace zsi::view
