@@ -17,6 +17,7 @@ std::vector<Vec3f> albedoOf(Specimen const& specimen, std::vector<double> const&
     std::vector<Vec3f> values(angles.size());
     if (specimen.has(kSample)) {
         std::vector<float> radians;
+        radians.reserve(angles.size());
         for (double const angle : angles)
             radians.push_back(static_cast<float>(angle * kRadians));
         host::MaterialProbe(*specimen.shader())
@@ -36,6 +37,7 @@ std::vector<Vec3f> albedoOf(Specimen const& specimen, std::vector<double> const&
 void measureAlbedo(Report& report)
 {
     std::vector<double> angles;
+    angles.reserve(31);
     for (int i = 0; i < 30; ++i)
         angles.push_back(i * 3);
     angles.push_back(89);

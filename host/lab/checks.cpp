@@ -121,10 +121,11 @@ public:
             judged += test.judged / std::size(kAngles);
             if (test.applies() && (worst.empty() || test.pValue < least)) {
                 least = test.pValue;
-                worst = test.broken > 0
-                    ? fmt::format("{:.2g} % of the draws at {:g} degrees are no directions with a "
-                                  "density above 0",
-                                  100 * test.broken, angle)
+                worst = test.isBroken()
+                    ? fmt::format(
+                        "at {:g} degrees {:.2g} % of the draws are no unit vectors, {:.2g} "
+                        "% tell a density that is not above 0",
+                        angle, 100 * test.notUnit, 100 * test.noDensity)
                     : fmt::format("chi-square {:.0f} of {} cells, drawn over told {:.4f} +- {:.4f} "
                                   "at {:g} degrees",
                                   test.chiSquare, test.degrees, test.scale, test.scaleError, angle);
@@ -221,6 +222,7 @@ public:
         if (!specimen_.has(kSample))
             return {"energy", Verdict::NotApplicable, "no entry point sample"};
         std::vector<float> angles;
+        angles.reserve(18);
         for (int i = 0; i < 18; ++i)
             angles.push_back(static_cast<float>(i) * 0.08726646f); // 5 degrees
         std::vector<Vec3f> albedo(angles.size());

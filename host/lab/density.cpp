@@ -1,5 +1,6 @@
 // SPDX-License-Identifier: Apache-2.0
 // What sample draws against the density that it tells.
+#include "base/grid.h"
 #include "lab/densityTest.h"
 #include "lab/report.h"
 
@@ -18,8 +19,7 @@ template <class Number>
 Panel painted(std::string title, DensityTest const& test, double lowest, Number const& number)
 {
     Panel panel{std::move(title), kWidth, kHeight, {}};
-    panel.values.assign(static_cast<std::size_t>(kWidth) * kHeight,
-                        std::numeric_limits<double>::quiet_NaN());
+    panel.values.assign(host::cellCount(kWidth, kHeight), std::numeric_limits<double>::quiet_NaN());
     for (DensityCell const& cell : test.cells) {
         double const value = number(cell);
         auto const row = [&](double z) { return (1 - z) / (1 - lowest) * kHeight; };
@@ -31,7 +31,7 @@ Panel painted(std::string title, DensityTest const& test, double lowest, Number 
         int const x1 = std::max(x0 + 1, static_cast<int>(std::lround(column(cell.phi1))));
         for (int y = y0; y < std::min(y1, kHeight); ++y)
             for (int x = x0; x < std::min(x1, kWidth); ++x)
-                panel.values[static_cast<std::size_t>(y * kWidth + x)] = value;
+                panel.values[host::cellIndex(x, y, kWidth)] = value;
     }
     return panel;
 }

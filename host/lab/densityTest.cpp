@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "lab/densityTest.h"
 
+#include "base/grid.h"
 #include "base/hash.h"
 
 #include <algorithm>
@@ -29,7 +30,7 @@ struct Draw {
 /// All draws of one seed, sorted by kind.
 struct Set {
     std::vector<Draw> spread;
-    std::size_t declined = 0, ofDensityOne = 0, broken = 0;
+    std::size_t declined = 0, ofDensityOne = 0, notUnit = 0, noDensity = 0;
     std::set<std::tuple<long, long, long>> directionsOfOne; ///< up to a few more than kFew
 
     Set(host::MaterialProbe const& probe, Vec3f wi, std::uint32_t draws, std::uint32_t seed,
@@ -43,9 +44,10 @@ struct Set {
             Vec3f const d = direction[i];
             if (type[i] == kSampleNone) {
                 ++declined;
-            } else if (!std::isfinite(d.x + d.y + d.z) || !(std::fabs(dot(d, d) - 1.0f) < 1e-3f)
-                       || !(density[i] > 0.0f)) {
-                ++broken;
+            } else if (!(std::fabs(dot(d, d) - 1.0f) < 1e-3f)) {
+                ++notUnit;
+            } else if (!(density[i] > 0.0f && std::isfinite(density[i]))) {
+                ++noDensity;
             } else if (density[i] == 1.0f) {
                 ++ofDensityOne;
                 if (directionsOfOne.size() <= kFew) {
@@ -84,8 +86,8 @@ bool fills(Draws draws, DensityCell const& cell)
         auto const part = [](double share) {
             return std::clamp(static_cast<int>(share * kFine), 0, kFine - 1);
         };
-        ++counts[static_cast<std::size_t>(part((d.z - cell.z0) / (cell.z1 - cell.z0)) * kFine
-                                          + part((d.phi - cell.phi0) / (cell.phi1 - cell.phi0)))];
+        ++counts[host::cellIndex(part((d.phi - cell.phi0) / (cell.phi1 - cell.phi0)),
+                                 part((d.z - cell.z0) / (cell.z1 - cell.z0)), kFine)];
     }
     return std::find(counts.begin(), counts.end(), 0) == counts.end();
 }
@@ -148,7 +150,8 @@ DensityTest testDensity(host::MaterialProbe const& probe, Vec3f wi, std::uint32_
     auto const n = static_cast<double>(draws);
     test.draws = draws;
     test.declined = static_cast<double>(set.declined) / n;
-    test.broken = static_cast<double>(set.broken) / n;
+    test.notUnit = static_cast<double>(set.notUnit) / n;
+    test.noDensity = static_cast<double>(set.noDensity) / n;
     (set.directionsOfOne.size() <= kFew ? test.specular : test.untold) =
         static_cast<double>(set.ofDensityOne) / n;
 
@@ -217,7 +220,7 @@ DensityTest testDensity(host::MaterialProbe const& probe, Vec3f wi, std::uint32_
                          * std::min(boost::math::gamma_q(test.degrees / 2.0, test.chiSquare / 2),
                                     std::erfc(off / std::sqrt(2.0))));
     }
-    if (test.broken > 0)
+    if (test.isBroken())
         test.pValue = 0;
     return test;
 }

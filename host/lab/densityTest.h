@@ -35,10 +35,12 @@ struct DensityTest {
     double declined = 0; ///< no direction
     double specular = 0; ///< one of a few directions, of density 1 as the contract asks for
     double untold = 0; ///< spread, yet of density 1
-    double broken = 0; ///< density or direction not finite
+    double notUnit = 0; ///< the direction has another length
+    double noDensity = 0; ///< the density is not above 0 and finite
 
     /// Whether a part of the draws was spread and told a density.
-    bool applies() const { return degrees > 0 || broken > 0; }
+    bool applies() const { return degrees > 0 || isBroken(); }
+    bool isBroken() const { return notUnit > 0 || noDensity > 0; }
 };
 
 /// For what goes on where `wi` came from. The contract tells the density of drawn directions only.

@@ -65,6 +65,7 @@ void measureOneLight(Report& report)
             chart.curves.push_back(std::move(line));
             if (specimen.has(kTransfer)) {
                 std::vector<double> all;
+                all.reserve(said.size());
                 for (Vec3f const& v : said)
                     all.push_back(kPi * luminance(v));
                 series.back()["transfer"] = jsonOf(all);

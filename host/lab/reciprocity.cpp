@@ -24,6 +24,17 @@ Vec3f directionAt(double angle, double azimuth)
             static_cast<float>(std::cos(angle * kRadians))};
 }
 
+/// The angles at the middle of a pixel.
+double firstAngle(std::size_t pixel)
+{
+    return (static_cast<double>(pixel % kSide) + 0.5) * 90 / kSide;
+}
+double secondAngle(std::size_t pixel)
+{
+    std::size_t const row = pixel / kSide;
+    return (kSide - static_cast<double>(row) - 0.5) * 90 / kSide;
+}
+
 } // namespace
 
 double reciprocityError(Vec3f there, Vec3f back)
@@ -70,16 +81,13 @@ void measureReciprocity(Report& report)
                 place = i;
             }
             panel.values.push_back(std::max(most, 1e-6));
-            csv.row(specimen.label(),
-                    {(static_cast<double>(i % kSide) + 0.5) * 90 / kSide,
-                     (kSide - static_cast<double>(i / kSide) - 0.5) * 90 / kSide, most});
+            csv.row(specimen.label(), {firstAngle(i), secondAngle(i), most});
         }
         map.panels.push_back(std::move(panel));
-        summary.push_back(
-            {{"material", specimen.label()},
-             {"worst", worst},
-             {"first", (static_cast<double>(place % kSide) + 0.5) * 90 / kSide},
-             {"second", (kSide - static_cast<double>(place / kSide) - 0.5) * 90 / kSide}});
+        summary.push_back({{"material", specimen.label()},
+                           {"worst", worst},
+                           {"first", firstAngle(place)},
+                           {"second", secondAngle(place)}});
     }
     if (summary.empty())
         return;

@@ -51,9 +51,10 @@ void measureSlice(Report& report)
         Panel panel{specimen.label(), kSide, kSide, {}};
         for (std::size_t i = 0; i < values.size(); ++i) {
             panel.values.push_back(luminance(values[i]));
+            std::size_t const row = i / kSide;
             csv.row(specimen.label(),
                     {(static_cast<double>(i % kSide) + 0.5) * 90 / kSide,
-                     (kSide - static_cast<double>(i / kSide) - 0.5) * 90 / kSide,
+                     (kSide - static_cast<double>(row) - 0.5) * 90 / kSide,
                      static_cast<double>(values[i].x), static_cast<double>(values[i].y),
                      static_cast<double>(values[i].z)});
         }

@@ -39,7 +39,8 @@ class WardMaterial : public Fields,
                      public IndirectDiffuseFunctions {
 public:
     static constexpr Departure kDepartures[] = {
-        {"light", "lights bring no pi to the glossy lobe, and fade out towards the horizon"}};
+        {"light", "lights bring no pi to the glossy lobe, and fade out towards the horizon"},
+        {"reciprocity", "the reflectivity follows the viewer's angle unless its curve is flat"}};
 
 #define WARD_USING(T, name, ...) using Fields::name;
     WARD_CHANNELS(WARD_USING, WARD_USING, ZSI_ROW_NONE)
