@@ -322,6 +322,21 @@ class Measured(unittest.TestCase):
             with self.assertRaisesRegex(zsi.Error, "matte.binary: expected a MERL table"):
                 zsi.merl.read(file)
 
+    def test_the_command_reads_tables_as_the_package_writes_them(self):
+        metal = zsi.material("corvid_Mtl_Metal", u_reflectColor=[1, 0.6, 0.2], u_roughValue=0.3)
+        wi, wo = (d.reshape(-1, 3).astype(np.float32) for d in zsi.merl.directions())
+        values = np.where((wi[:, 2:] > 0) & (wo[:, 2:] > 0), metal.eval(wi, wo), -1)
+        with tempfile.TemporaryDirectory() as folder:
+            file = os.path.join(folder, "metal.binary")
+            zsi.merl.write(file, values.reshape(*zsi.merl.SHAPE, 3))
+            subprocess.run([os.environ["ZSI_COMMAND"], "lab", "corvid_Mtl_Metal", "-q",
+                            "u_reflectColor=1,0.6,0.2", "u_roughValue=0.3", "+", "corvid_Mtl_Metal",
+                            "--merl", file, "-o", folder], check=True)
+            same, other = json.loads(
+                pathlib.Path(folder, "lab.json").read_text())["tableError"]["pairs"]
+            self.assertLess(same["meanRelative"], 1e-4)
+            self.assertGreater(other["meanRelative"], 0.5)
+
 
 if __name__ == "__main__":
     unittest.main()
