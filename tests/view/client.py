@@ -31,7 +31,7 @@ class Page:
             head += self._some()
         head, self.pending = head.split(b"\r\n\r\n", 1)
         self.status = int(head.split()[1])
-        self.tiles, self.pixels, self.generation = {}, None, 0
+        self.pixels, self.generation, self.samples, self.kind, self.size = None, 0, 0, 0, (0, 0)
 
     def _some(self):
         data = self.socket.recv(1 << 20)
@@ -103,6 +103,13 @@ class Page:
             if message["type"] == "error":
                 raise AssertionError(message["message"])
 
+    def receive_picture(self):
+        """Kind and file of the next picture that came as one."""
+        while True:
+            message = self.receive()
+            if isinstance(message, bytes) and message[28 - 4] > 1:
+                return message[24], message[32:]
+
     def finished(self, after=0):
         """Waits until a generation above `after` is done and all of it is here; its pixels."""
         frame = None
@@ -150,6 +157,16 @@ class Server:
         status, body = self.get(f"/{name}?token={self.token}{text}")
         assert status == 200, body
         return body
+
+    def memory(self):
+        """Bytes of the process in memory."""
+        with open(f"/proc/{self.process.pid}/statm") as statm:
+            return int(statm.read().split()[1]) * os.sysconf("SC_PAGE_SIZE")
+
+    def kill(self):
+        if self.process.poll() is None:
+            self.process.kill()
+        self.process.communicate()
 
     def end(self, signal):
         """Exit status and seconds that it took."""
