@@ -3,6 +3,7 @@
 
 #include "base/error.h"
 
+#include <algorithm>
 #include <boost/asio/ip/address.hpp>
 #include <charconv>
 #include <fmt/format.h>
@@ -39,11 +40,19 @@ Target parseTarget(std::string_view target)
         std::string_view const pair = target.substr(0, target.find('&'));
         std::size_t const equals = pair.find('=');
         if (equals != std::string_view::npos)
-            parsed.query[unescaped(pair.substr(0, equals))] = unescaped(pair.substr(equals + 1));
+            parsed.query.emplace_back(unescaped(pair.substr(0, equals)),
+                                      unescaped(pair.substr(equals + 1)));
         if (pair.size() == target.size())
             break;
     }
     return parsed;
+}
+
+std::string valueOf(Query const& query, std::string_view key)
+{
+    auto const found = std::find_if(query.begin(), query.end(),
+                                    [&](auto const& pair) { return pair.first == key; });
+    return found == query.end() ? std::string() : found->second;
 }
 
 bool isSameToken(std::string_view given, std::string_view right)

@@ -2,16 +2,21 @@
 /// What a request is allowed and what it asks for.
 #pragma once
 
-#include <map>
 #include <string>
 #include <string_view>
+#include <utility>
+#include <vector>
 
 namespace zsi::view {
+
+/// Keys and values in the order of the address.
+using Query = std::vector<std::pair<std::string, std::string>>;
+std::string valueOf(Query const& query, std::string_view key); ///< empty: not there
 
 /// The part of an address behind the host: "/picture.png?token=..." without its escapes.
 struct Target {
     std::string path; ///< begins with /
-    std::map<std::string, std::string> query;
+    Query query;
 };
 Target parseTarget(std::string_view target);
 

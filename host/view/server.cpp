@@ -42,7 +42,6 @@ struct Server::Impl : Audience {
     std::string token = newToken();
     Studio* studio = nullptr;
     Shown shown;
-    std::uint32_t generation = 0;
     std::map<PageId, std::shared_ptr<Page>> pages;
     PageId lastPage = kAllPages;
     std::size_t connections = 0;
@@ -74,7 +73,6 @@ struct Server::Impl : Audience {
                 open->second->send(binary);
         });
     }
-    void begin(std::uint32_t) override { }
     void show(std::vector<LayerUpdate> updates) override
     {
         asio::post(context, [this, updates = std::move(updates)] {
@@ -158,7 +156,7 @@ private:
         // What is the same in every installation is no secret.
         if (!isFront && file != files.end())
             return answer({200, mimeType(name), std::string(file->bytes)}, goesOn);
-        if (!isSameToken(target.query["token"], server_.token))
+        if (!isSameToken(valueOf(target.query, "token"), server_.token))
             return answer(
                 {403, "text/plain",
                  "the token is missing or wrong; open the address that zsi view prints\n"},

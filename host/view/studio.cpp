@@ -41,7 +41,7 @@ Studio::Studio(OpenedScene opened, host::ShaderSource const& shaders, StudioOpti
 
 Studio::~Studio()
 {
-    stopDenoising_ = true;
+    stopDenoising_ = stopAnswers_ = true;
     {
         std::lock_guard const locked(lock_);
         stop_ = true;
@@ -96,10 +96,8 @@ void Studio::run()
 
 void Studio::render()
 {
-    if (told_ != preview_.generation()) {
-        audience_->begin(preview_.generation());
+    if (told_ != preview_.generation())
         tellFrame(true);
-    }
     if (turntable_) {
         turntable_->step(live_, cancel_);
         audience_->tell(

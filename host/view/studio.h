@@ -5,6 +5,7 @@
 #include "view/document.h"
 #include "view/openScene.h"
 #include "view/preview.h"
+#include "view/request.h"
 #include "view/turntable.h"
 
 #include <condition_variable>
@@ -25,8 +26,6 @@ public:
     virtual void tell(PageId page, Json const& message) = 0;
     virtual void send(PageId page, Band binary) = 0;
     virtual void show(std::vector<LayerUpdate> updates) = 0;
-    /// What is shown is of this generation from now on.
-    virtual void begin(std::uint32_t generation) = 0;
 };
 
 /// A file for a page that asked for one; `status` as of HTTP.
@@ -60,9 +59,7 @@ public:
     void leave(PageId page);
     /// A message of a page; `handled` is called when it has been dealt with.
     void receive(PageId page, std::string text, std::function<void()> handled);
-    /// Files: "picture.png", "scene.json", ...; `answer` is called from another thread. `query`: as
-    /// in an address.
-    using Query = std::map<std::string, std::string>;
+    /// Files: "picture.png", "scene.json", ...; `answer` is called from another thread.
     void ask(std::string name, Query query, std::function<void(Reply)> answer);
 
 private:
@@ -96,6 +93,7 @@ private:
     void restart();
     Reply answer(std::string const& name, Query const& query);
     std::function<Reply()> thumbnail(Query const& query) const;
+    std::function<Reply()> measurement(Query const& query) const;
 
     host::ShaderSource const& shaders_;
     StudioOptions options_;
@@ -128,7 +126,8 @@ private:
     bool stop_ = false;
     /// Set while commands wait: the one for those that change the scene, the other for questions.
     std::atomic<bool> cancel_{false}, pause_{false};
-    std::vector<std::future<void>> thumbnails_; ///< being made
+    std::atomic<bool> stopAnswers_{false};
+    std::vector<std::future<void>> answers_; ///< being made beside the rendering
     std::thread thread_;
 };
 

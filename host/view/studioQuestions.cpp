@@ -3,6 +3,7 @@
 #include "base/error.h"
 #include "base/names.h"
 #include "film/imageFile.h"
+#include "lab/lab.h"
 #include "render/cameraRays.h"
 #include "render/render.h"
 #include "view/difference.h"
@@ -46,6 +47,25 @@ void filesOf(Json const& value, std::set<std::string>& files)
         else if (member.is_string())
             files.insert(member.get<std::string>());
     }
+}
+
+/// A copy of a material, which stays as it is when the scene is edited.
+lab::Specimen specimenOf(host::Scene const& scene, std::string const& name,
+                         host::ShaderSource const& shaders)
+{
+    auto const found = std::ranges::find(scene.materialNames, name);
+    if (found == scene.materialNames.end())
+        throw host::InputError("lab: the scene has no material " + host::printable(name));
+    host::Shader const& live =
+        scene.materials[static_cast<std::size_t>(found - scene.materialNames.begin())];
+    struct Owned {
+        std::shared_ptr<host::TextureStore> textures;
+        host::Shader shader;
+    };
+    auto const owned =
+        std::make_shared<Owned>(Owned{scene.textures, shaders.create(live.className())});
+    owned->shader.object()->copy(live.object());
+    return {host::printable(name), owned->shader, owned};
 }
 
 bool isBelow(std::filesystem::path const& file, std::filesystem::path const& folder)
@@ -158,13 +178,19 @@ void Studio::ask(std::string name, Query query, std::function<void(Reply)> answe
     post(
         [this, name = std::move(name), query = std::move(query), answer = std::move(answer)] {
             try {
-                if (name == "thumbnail") {
-                    // Pictures can be large: not on the thread that renders.
-                    std::erase_if(thumbnails_, [](std::future<void> const& f) {
+                if (name == "thumbnail" || name == "lab") { // take long: not on this thread
+                    std::erase_if(answers_, [](std::future<void> const& f) {
                         return f.wait_for(std::chrono::seconds(0)) == std::future_status::ready;
                     });
-                    thumbnails_.push_back(std::async(
-                        std::launch::async, [make = thumbnail(query), answer] { answer(make()); }));
+                    auto make = name == "lab" ? measurement(query) : thumbnail(query);
+                    answers_.push_back(
+                        std::async(std::launch::async, [make = std::move(make), answer] {
+                            try {
+                                answer(make());
+                            } catch (std::exception const& error) {
+                                answer({404, "text/plain", error.what() + std::string("\n")});
+                            }
+                        }));
                 } else {
                     answer(this->answer(name, query));
                 }
@@ -177,10 +203,7 @@ void Studio::ask(std::string name, Query query, std::function<void(Reply)> answe
 
 Reply Studio::answer(std::string const& name, Query const& query)
 {
-    auto const value = [&](char const* key) {
-        auto const found = query.find(key);
-        return found == query.end() ? std::string() : found->second;
-    };
+    auto const value = [&](char const* key) { return valueOf(query, key); };
     std::string const stem = file_.stem().string();
     if (name == "scene.json")
         return {200, "application/json", sceneText(document_.json()), stem + ".json"};
@@ -211,24 +234,48 @@ Reply Studio::answer(std::string const& name, Query const& query)
 
 std::function<Reply()> Studio::thumbnail(Query const& query) const
 {
-    auto const file = query.find("file"), side = query.find("size");
-    if (file == query.end())
+    std::string const file = valueOf(query, "file"), side = valueOf(query, "size");
+    if (file.empty())
         throw host::InputError("thumbnail: which file?");
     int size = 96;
-    if (side != query.end())
-        std::from_chars(side->second.data(), side->second.data() + side->second.size(), size);
+    std::from_chars(side.data(), side.data() + side.size(), size);
     std::set<std::string> named;
     filesOf(document_.json(), named);
     std::filesystem::path const folder = std::filesystem::absolute(file_).parent_path();
-    std::filesystem::path const path = std::filesystem::weakly_canonical(folder / file->second);
-    if (!named.contains(file->second) && !isBelow(path, std::filesystem::weakly_canonical(folder)))
+    std::filesystem::path const path = std::filesystem::weakly_canonical(folder / file);
+    if (!named.contains(file) && !isBelow(path, std::filesystem::weakly_canonical(folder)))
         throw host::InputError("thumbnail: the scene does not name this file");
     return [path, size = std::clamp(size, 16, 512)]() -> Reply {
-        try {
-            return {200, "image/png", pngOf(thumbnailOf(path, size))};
-        } catch (std::exception const& error) {
-            return {404, "text/plain", error.what() + std::string("\n")};
+        return {200, "image/png", pngOf(thumbnailOf(path, size))};
+    };
+}
+
+/// Of materials of the scene as they are now (`material`), or of classes (`class`, with parameters
+/// behind), overlaid.
+std::function<Reply()> Studio::measurement(Query const& query) const
+{
+    std::vector<lab::Specimen> specimens;
+    std::vector<std::string> words;
+    for (auto const& [key, value] : query) {
+        if (key == "material") {
+            specimens.push_back(specimenOf(live_.scene(), value, shaders_));
+        } else if (key == "class") {
+            if (!shaders_.has(value))
+                throw host::InputError("lab: unknown class " + host::printable(value));
+            words.push_back(value);
+        } else if (key != "token") {
+            words.push_back(key + '=' + value);
         }
+    }
+    for (lab::Specimen& specimen : lab::specimensOf(words, shaders_))
+        specimens.push_back(std::move(specimen));
+    if (specimens.empty())
+        throw host::InputError("lab: expected a material or a class");
+    return [this, specimens = std::move(specimens)]() -> Reply {
+        lab::LabOptions options = lab::quickOptions();
+        options.threads = 1; // the picture goes on beside
+        options.cancel = &stopAnswers_;
+        return {200, "application/json", lab::labJson(specimens, options)};
     };
 }
 

@@ -31,6 +31,7 @@ class Page:
             head += self._some()
         head, self.pending = head.split(b"\r\n\r\n", 1)
         self.status = int(head.split()[1])
+        self.frame = {"state": None}
         self.pixels, self.generation, self.samples, self.kind, self.size = None, 0, 0, 0, (0, 0)
 
     def _some(self):
@@ -73,7 +74,10 @@ class Page:
             if first & 15 == 9:
                 self.send_bytes(payload, 10)
             elif first & 15 == 1:
-                return json.loads(payload)
+                message = json.loads(payload)
+                if message["type"] == "frame":
+                    self.frame = message
+                return message
             elif first & 15 == 2:
                 self._tile(payload)
                 return payload
@@ -112,17 +116,15 @@ class Page:
 
     def finished(self, after=0):
         """Waits until a generation above `after` is done and all of it is here; its pixels."""
-        frame = None
         while True:
+            frame = self.frame
+            if (frame["state"] == "done" and frame["generation"] > after and self.pixels is not None
+                    and self.generation == frame["generation"] and len(self.rows) == self.size[1]
+                    and self.size == (frame["width"], frame["height"]) and self.samples == frame["samples"]):
+                return bytes(self.pixels)
             message = self.receive()
             if isinstance(message, dict) and message["type"] == "error":
                 raise AssertionError(message["message"])
-            if isinstance(message, dict) and message["type"] == "frame" and message["generation"] > after:
-                frame = message if message["state"] == "done" else None
-            if (frame and self.pixels is not None and self.generation == frame["generation"]
-                    and self.size == (frame["width"], frame["height"]) and len(self.rows) == self.size[1]
-                    and self.samples == frame["samples"]):
-                return bytes(self.pixels)
 
     def close(self):
         self.socket.close()
