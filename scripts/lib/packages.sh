@@ -6,9 +6,11 @@
 packages_build=(g++ cmake ninja-build libembree-dev libopenimageio-dev openimageio-tools
     libimath-dev libtbb-dev libassimp-dev zlib1g-dev nlohmann-json3-dev libcli11-dev libfmt-dev
     libelf-dev libboost-dev pybind11-dev python3-dev python3-numpy)
+# Others than Debian's bring npm with Node.
+command -v npm >/dev/null || packages_build+=(nodejs npm)
 packages_test=(libgtest-dev libbenchmark-dev binutils valgrind pkg-config dpkg-dev file groff-base
     python3-jsonschema python3-pil python3-scipy python3-matplotlib python3-distributed
-    mypy)
+    mypy chromium chromium-driver python3-selenium)
 packages_blender=(blender)
 packages_lint=(clang-14 clang-format-14 clang-tidy-14 cppcheck)
 
