@@ -72,7 +72,9 @@ export class PictureElement extends SessionElement {
     }
     if (session.frame) this.painter?.fit(session.frame);
     this.painter?.draw(tile);
-    if (this.canvas) this.canvas.dataset.shown = `${tile.generation}/${tile.samples}/${tile.kind}`;
+    if (!this.canvas) return;
+    if (tile.y + tile.height === tile.frameHeight) this.canvas.dataset.whole = String(tile.generation);
+    this.canvas.dataset.shown = `${tile.generation}/${tile.samples}/${tile.kind}`;
   }
 
   /** Of the frame, where the pointer is. */
