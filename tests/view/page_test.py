@@ -172,6 +172,16 @@ class PageTest(unittest.TestCase):
         text = browser.wait(lambda: (browser.driver.find_elements(By.CSS_SELECTOR, "[data-layer=beauty]") or [None])[0]).text
         self.assertTrue(all(float(v) >= 0 for v in text.split()[1:4]), text)
 
+    def test_the_lab_measures_what_was_edited(self):
+        summary = self.browser.find(".lab summary")
+        self.browser.run("arguments[0].scrollIntoView(); arguments[0].click()", summary)
+        plot = lambda: self.browser.run("""const i = document.querySelector("[data-figure='albedo'] img");
+            return i && i.complete && i.naturalWidth > 0 ? i.src : ''""")
+        before = self.browser.wait(plot)
+        self.browser.run("""const r = document.querySelector("[data-parameter='u_roughValue'] input[type=number]");
+            r.value = '0.9'; r.dispatchEvent(new Event('change'))""")
+        self.browser.wait(lambda: plot() not in ("", before))
+
     def test_a_lost_connection_comes_back_with_the_state(self):
         relay = Relay(self.server.port)
         self.addCleanup(relay.close)

@@ -8,6 +8,7 @@ import {classChooser, classRows} from "./entry";
 import {environmentPanel} from "./environment";
 import {lightPanel} from "./lights";
 import {scenePanel} from "./scene";
+import "./lab";
 
 type Tab = Selection["section"];
 const kTabs: {tab: Tab; title: string}[] = [
@@ -56,7 +57,8 @@ export class Panel extends SessionElement {
     const material = session.materials.find((m) => m.name === name);
     if (!material) return html`<p class="hint">Nothing is selected. Click on the picture.</p>`;
     return html`${classChooser("material", `materials.${name}`, material.class, {})}
-      ${classRows(`materials.${name}`, material.unwritten, this.filter)}`;
+      ${classRows(`materials.${name}`, material.unwritten, this.filter)}
+      <zsi-lab name=${name}></zsi-lab>`;
   }
 
   override render(): TemplateResult {
