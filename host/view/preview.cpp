@@ -17,6 +17,7 @@ namespace {
 
 constexpr int kTile = 16, kBandRows = 64; ///< pixels; bands hold whole tiles
 constexpr std::uint32_t kMostSamplesOfPass = 16;
+constexpr int kLeastRows = 48; ///< of a first look
 constexpr double kStepSeconds = 0.15, kFirstSeconds = 0.045;
 
 /// "beauty", and layers that a film can have.
@@ -142,8 +143,10 @@ void Preview::renderCoarse(std::atomic<bool> const& cancel)
 {
     int const width = film_.frameWidth(), height = film_.frameHeight();
     double const whole = secondsPerSample_ * width * height;
-    int const by = static_cast<int>(std::ceil(std::sqrt(whole / kFirstSeconds)));
-    if (by < 2 || live_.countsPixels() || std::min(width, height) / by < 8) {
+    // Small ones take little but what every call takes, which would count as slow samples.
+    int const most = std::max(1, std::min(width, height) / kLeastRows);
+    int const by = std::min(most, static_cast<int>(std::ceil(std::sqrt(whole / kFirstSeconds))));
+    if (by < 2 || live_.countsPixels()) {
         isCoarse_ = false;
         return;
     }
