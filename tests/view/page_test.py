@@ -63,7 +63,7 @@ class PageTest(unittest.TestCase):
     def document(self):
         return json.loads(self.server.file("scene.json"))
 
-    def drag(self, css, by, hold=()):
+    def drag(self, css, by):
         """In steps, as a hand would; `by` in pixels."""
         at = self.browser.find(css)
         chain = ActionChains(self.browser.driver, duration=20).move_to_element(at).click_and_hold()

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-import {html, type TemplateResult} from "lit";
+import {html, nothing, type TemplateResult} from "lit";
 import {customElement, property} from "lit/decorators.js";
 import type {PictureElement} from "../picture/picture";
 import {SessionElement} from "../session/element";
@@ -16,8 +16,7 @@ export class Toolbar extends SessionElement {
   private button(name: Parameters<typeof icon>[0], label: string, run: () => void,
     {pressed, disabled = false, text = ""}: {pressed?: boolean; disabled?: boolean; text?: string} = {}): TemplateResult {
     return html`<button class="tool" data-tool=${name} aria-label=${label} title=${label} ?disabled=${disabled}
-      aria-pressed=${pressed === undefined ? "mixed" : pressed} ?data-plain=${pressed === undefined}
-      @click=${run}>${icon(name)}${text ? html`<span class="text">${text}</span>` : ""}</button>`;
+      aria-pressed=${pressed ?? nothing} @click=${run}>${icon(name)}${text ? html`<span class="text">${text}</span>` : nothing}</button>`;
   }
 
   private states(): TemplateResult {

@@ -44,9 +44,6 @@ export class PictureElement extends SessionElement {
     new ResizeObserver(() => this.fit(place)).observe(place);
     this.listen("tile", (tile) => this.draw(tile));
     this.listen("comparison", (comparison) => this.comparer.begin(comparison));
-    this.listen("change", () => {
-      if (!session.isConnected) this.painter?.forget();
-    });
   }
 
   override updated(changes: Map<PropertyKey, unknown>): void {

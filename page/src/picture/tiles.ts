@@ -38,11 +38,6 @@ export class TilePainter {
       this.scratch, tile.x * x, tile.y * y, tile.width * x, tile.height * y);
   }
 
-  /** After a new connection: its generations have nothing to do with those before. */
-  forget(): void {
-    this.generation = 0;
-  }
-
   private context(): CanvasRenderingContext2D {
     const context = this.canvas.getContext("2d");
     if (!context) throw new Error("the browser gives no canvas");
