@@ -90,8 +90,16 @@ PictureFile::PictureFile(std::filesystem::path const& file, ColorSpace space)
         spec_.full_x = spec_.x, spec_.full_width = spec_.width;
         spec_.full_y = spec_.y, spec_.full_height = spec_.height;
     }
-    if (std::int64_t(spec_.full_width) * spec_.full_height > std::int64_t(1) << 31)
-        fail("expected no more than 2^31 texels");
+    // Bounds that a damaged header passes seldom, before memory is taken for what it says.
+    constexpr std::int64_t kMostSide = 1 << 17, kMostTexels = std::int64_t(1) << 31;
+    constexpr std::int64_t kMostBlank = 1 << 26; ///< around the data of a small picture
+    auto const texels = std::int64_t(spec_.full_width) * spec_.full_height;
+    auto const held = std::int64_t(spec_.width) * spec_.height;
+    if (std::max({spec_.full_width, spec_.full_height, spec_.width, spec_.height}) > kMostSide
+        || texels > kMostTexels)
+        fail("expected no more than 2^17 texels a side and 2^31 in all");
+    if (texels > std::max(kMostBlank, 64 * held))
+        fail("expected pixels in more than a small part of its frame");
     std::tie(format_.type, type_) = keptAs(spec_.format);
     format_.channels = std::min(spec_.nchannels, 4);
     format_.srgb = space == ColorSpace::Srgb

@@ -26,21 +26,31 @@ float encodeSrgb(float linear)
 
 /// The same over [0, 1], to a few millionths: over the square root of its argument the curve is
 /// nearly straight, and short straight pieces do.
-float encodeSrgbFast(float linear)
-{
-    constexpr int kPieces = 4096;
-    static std::vector<float> const table = [] {
-        std::vector<float> t(kPieces + 2);
-        for (int i = 0; i < kPieces + 2; ++i) {
-            float const root = static_cast<float>(i) / kPieces;
-            t[static_cast<std::size_t>(i)] = encodeSrgb(root * root);
-        }
-        return t;
-    }();
-    float const x = std::sqrt(linear) * kPieces;
-    auto const i = static_cast<std::size_t>(x);
-    return table[i] + (table[i + 1] - table[i]) * (x - static_cast<float>(i));
-}
+class FastSrgb {
+public:
+    float operator()(float linear) const
+    {
+        float const x = std::sqrt(linear) * kPieces;
+        auto const i = static_cast<std::size_t>(x);
+        return table_[i] + (table_[i + 1] - table_[i]) * (x - static_cast<float>(i));
+    }
+
+private:
+    static constexpr int kPieces = 4096;
+    static std::vector<float> const& table()
+    {
+        static std::vector<float> const table = [] {
+            std::vector<float> t(kPieces + 2);
+            for (int i = 0; i < kPieces + 2; ++i) {
+                float const root = static_cast<float>(i) / kPieces;
+                t[static_cast<std::size_t>(i)] = encodeSrgb(root * root);
+            }
+            return t;
+        }();
+        return table;
+    }
+    float const* table_ = table().data(); ///< looked for once, not for every value
+};
 
 float valueOf(std::uint8_t code) { return static_cast<float>(code) * (1.0f / 255.0f); }
 float valueOf(std::uint16_t code) { return static_cast<float>(code) * (1.0f / 65535.0f); }
@@ -190,9 +200,10 @@ template <class T>
 void TexelCodec::decodeAs(std::byte const* texels, std::size_t count, float* values) const
 {
     auto const channels = static_cast<std::size_t>(format_.channels);
+    std::size_t const bytes = format_.bytes();
     for (std::size_t i = 0; i < count; ++i)
         for (std::size_t c = 0; c < channels; ++c)
-            values[i * channels + c] = value<T>(texels + i * format_.bytes(), c);
+            values[i * channels + c] = value<T>(texels + i * bytes, c);
 }
 
 void TexelCodec::decode(std::byte const* texels, std::size_t count, float* values) const
@@ -204,17 +215,21 @@ void TexelCodec::encode(float const* values, std::size_t count, std::byte* texel
 {
     auto const channels = static_cast<std::size_t>(format_.channels);
     withType(format_.type, [&]<class T>(T) {
-        for (std::size_t i = 0; i < count * channels; ++i) {
-            float v = values[i];
-            if (isEncoded(i % channels))
-                v = v >= 0.0f && v <= 1.0f ? encodeSrgbFast(v) : encodeSrgb(v);
-            T code;
-            if constexpr (std::is_integral_v<T>)
-                // NOLINTNEXTLINE(bugprone-incorrect-roundings): never negative
-                code = static_cast<T>(clamp01(v) * static_cast<float>(T(~T(0))) + 0.5f);
-            else
-                code = T(v);
-            std::memcpy(texels + i * sizeof(T), &code, sizeof(T));
+        FastSrgb const srgb;
+        for (std::size_t c = 0; c < channels; ++c) {
+            bool const encoded = isEncoded(c);
+            for (std::size_t i = c; i < count * channels; i += channels) {
+                float v = values[i];
+                if (encoded)
+                    v = v >= 0.0f && v <= 1.0f ? srgb(v) : encodeSrgb(v);
+                T code;
+                if constexpr (std::is_integral_v<T>)
+                    // NOLINTNEXTLINE(bugprone-incorrect-roundings): never negative
+                    code = static_cast<T>(clamp01(v) * static_cast<float>(T(~T(0))) + 0.5f);
+                else
+                    code = T(v);
+                std::memcpy(texels + i * sizeof(T), &code, sizeof(T));
+            }
         }
     });
 }

@@ -211,6 +211,21 @@ TEST(Texture, ChannelsAndWindowsOfFloatFiles)
     }
 }
 
+// What damaged headers say would take gigabytes.
+TEST(Texture, FramesFarBeyondTheirPixelsAreRefused)
+{
+    test::TemporaryFolder const folder;
+    Values(4, 2, 16, anyCode).write(folder.path / "all.ppm");
+    Conversions const files{{"long.exr", "--fullsize 200000x2"},
+                            {"empty.exr", "--fullsize 40000x30000"}};
+    convert(folder.path / "all.ppm", files);
+    for (auto const& [name, options] : files) {
+        fs::path const file = folder.path / name;
+        std::string const error = errorOf([&] { TextureStore().load2D(file, ColorSpace::Auto); });
+        expectContains(error, {file.string(), "expected "});
+    }
+}
+
 /// TMPDIR while it lives.
 struct ScratchFolder {
     explicit ScratchFolder(fs::path const& folder) { setenv("TMPDIR", folder.c_str(), 1); }
