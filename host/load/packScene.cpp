@@ -18,7 +18,7 @@ using Files = std::map<std::string, std::string>;
 std::string pack(fs::path const& file, Files& files)
 {
     fs::path const here = fs::absolute(file).lexically_normal();
-    std::string const name = "files" + here.string();
+    std::string name = "files" + here.string();
     files[name] = here.string();
     return name;
 }

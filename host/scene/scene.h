@@ -66,8 +66,8 @@ struct PointLight {
     Vec3f color{1, 1, 1}; ///< that arrives at distance 1
     float radius = 0.0f;
     Vec3f axis{0, 0, -1}; ///< unit, of the cone
-    /// Across, degrees: full within the inner one, dark outside, a smoothstep of the cosine between;
-    /// 360 is all around.
+    /// Across, degrees: full within the inner one, dark outside, a smoothstep of the cosine
+    /// between; 360 is all around.
     float innerAngle = 360.0f, angle = 360.0f;
 };
 
