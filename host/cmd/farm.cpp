@@ -43,6 +43,7 @@ int farm(std::vector<std::string> arguments, std::string const& shaderPath)
     std::string const python = chosen ? chosen : ZSI_PYTHON;
     arguments.insert(arguments.begin(), {python, "-m", "zsi.farm"});
     std::vector<char*> line;
+    line.reserve(arguments.size() + 1);
     for (std::string& argument : arguments)
         line.push_back(argument.data());
     line.push_back(nullptr);
