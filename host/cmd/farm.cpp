@@ -23,7 +23,7 @@ fs::path packages()
     fs::path const here = fs::read_symlink("/proc/self/exe").parent_path();
     std::string looked;
     for (fs::path const& place : {here / "python", here / ZSI_INSTALLED_PYTHON}) {
-        fs::path const folder = place.lexically_normal();
+        fs::path folder = place.lexically_normal();
         if (fs::exists(folder / "zsi" / "farm" / "__main__.py"))
             return folder;
         looked += (looked.empty() ? "" : " and ") + folder.string();
