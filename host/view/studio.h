@@ -63,7 +63,7 @@ public:
     void ask(std::string name, Query query, std::function<void(Reply)> answer);
 
 private:
-    struct Slot {
+    struct Slot { // NOLINT(bugprone-exception-escape): moving JSON does not throw
         Json document;
         std::vector<float> rgba;
         ShownPicture shown;

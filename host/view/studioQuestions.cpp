@@ -264,7 +264,7 @@ std::function<Reply()> Studio::measurement(Query const& query) const
                 throw host::InputError("lab: unknown class " + host::printable(value));
             words.push_back(value);
         } else if (key != "token") {
-            words.push_back(key + '=' + value);
+            words.push_back(fmt::format("{}={}", key, value));
         }
     }
     for (lab::Specimen& specimen : lab::specimensOf(words, shaders_))
