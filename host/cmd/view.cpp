@@ -35,7 +35,8 @@ void openBrowser(std::string const& url)
 int view(Arguments const& arguments, std::string const& shaderPath)
 {
     host::ShaderLibraries const libraries = loadLibraries(shaderPath);
-    view::OpenedScene opened = view::openScene(arguments.scene, libraries, arguments.assignments);
+    view::OpenedScene const opened =
+        view::openScene(arguments.scene, libraries, arguments.assignments);
     view::StudioOptions options;
     options.version = ZSI_VERSION;
     if (!arguments.saveFolder.empty())
@@ -45,7 +46,7 @@ int view(Arguments const& arguments, std::string const& shaderPath)
     options.describeClass = classJson;
     options.listClasses = listJson;
     view::Server server({arguments.address, arguments.port});
-    view::Studio studio(std::move(opened), libraries, std::move(options));
+    view::Studio studio(opened, libraries, std::move(options));
     if (!arguments.quiet)
         for (std::string const& warning : studio.warnings())
             warn(warning);

@@ -251,8 +251,8 @@ void Server::Impl::openPage(beast::tcp_stream stream,
     PageId const id = ++lastPage;
     auto const page = std::make_shared<Page>(
         std::move(stream), shown,
-        Page::Events{[this, id](std::string text) {
-                         studio->receive(id, std::move(text), [this, id] {
+        Page::Events{[this, id](std::string const& text) {
+                         studio->receive(id, text, [this, id] {
                              asio::post(context, [this, id] {
                                  if (auto const open = pages.find(id); open != pages.end())
                                      open->second->handled();

@@ -23,7 +23,7 @@ constexpr int kMostPixels = 4096 * 2304;
 
 } // namespace
 
-Studio::Studio(OpenedScene opened, host::ShaderSource const& shaders, StudioOptions options)
+Studio::Studio(OpenedScene const& opened, host::ShaderSource const& shaders, StudioOptions options)
     : shaders_(shaders)
     , options_(std::move(options))
     , file_(opened.file)
@@ -236,7 +236,7 @@ void Studio::layersChanged()
         restart();
 }
 
-void Studio::receive(PageId page, std::string text, std::function<void()> handled)
+void Studio::receive(PageId page, std::string const& text, std::function<void()> const& handled)
 {
     Json message;
     try {

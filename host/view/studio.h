@@ -47,7 +47,7 @@ struct StudioOptions {
 class Studio {
 public:
     /// Loads the scene on the caller's thread; throws InputError.
-    Studio(OpenedScene opened, host::ShaderSource const& shaders, StudioOptions options);
+    Studio(OpenedScene const& opened, host::ShaderSource const& shaders, StudioOptions options);
     ~Studio(); ///< ends the rendering within a sample
     Studio(Studio const&) = delete;
     Studio& operator=(Studio const&) = delete;
@@ -58,7 +58,7 @@ public:
     void join(PageId page);
     void leave(PageId page);
     /// A message of a page; `handled` is called when it has been dealt with.
-    void receive(PageId page, std::string text, std::function<void()> handled);
+    void receive(PageId page, std::string const& text, std::function<void()> const& handled);
     /// Files: "picture.png", "scene.json", ...; `answer` is called from another thread.
     void ask(std::string name, Query query, std::function<void(Reply)> answer);
 
@@ -77,7 +77,7 @@ private:
 
     void handle(PageId page, Json const& message);
     void edit(PageId page, std::vector<Edit> const& edits, std::string const& group);
-    void goTo(PageId page, Json after, std::function<void()> const& commit);
+    void goTo(PageId page, Json const& after, std::function<void()> const& commit);
     void undo(PageId page, bool again);
     void setView(Json const& message);
     void pick(PageId page, Json const& message);

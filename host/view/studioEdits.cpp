@@ -27,7 +27,7 @@ void Studio::undo(PageId page, bool again)
 }
 
 /// Scene first: when it refuses, the document stays too.
-void Studio::goTo(PageId page, Json after, std::function<void()> const& commit)
+void Studio::goTo(PageId page, Json const& after, std::function<void()> const& commit)
 {
     std::vector<Difference> const changes = differences(document_.json(), after);
     int const width = live_.documentWidth(), height = live_.documentHeight();
