@@ -56,11 +56,11 @@ Plane filtered(Plane const& in, Size size, Plane const& across, Plane const& dow
         for (int y = 0; y < size.height; ++y)
             for (int x = 0; x < size.width; ++x) {
                 double sum = 0;
-                for (int i = -radius; i <= radius; ++i) {
-                    int const at = std::clamp((rows ? x : y) + i, 0, last);
+                for (int i = 0; i <= 2 * radius; ++i) {
+                    int const at = std::clamp((rows ? x : y) + i - radius, 0, last);
                     auto const row = static_cast<std::size_t>(rows ? y : at);
                     auto const column = static_cast<std::size_t>(rows ? at : x);
-                    sum += k[static_cast<std::size_t>(i + radius)]
+                    sum += k[static_cast<std::size_t>(i)]
                         * from[row * static_cast<std::size_t>(size.width) + column];
                 }
                 to[static_cast<std::size_t>(y) * static_cast<std::size_t>(size.width)

@@ -28,7 +28,7 @@ std::string laidOut(Json const& value, std::size_t indent)
     bool const hasObjects = value.is_object() && std::ranges::any_of(value, [](Json const& member) {
                                 return member.is_object() && !member.empty();
                             });
-    std::string const line = inOneLine(value);
+    std::string line = inOneLine(value);
     if (!value.is_structured() || value.empty()
         || ((!hasObjects || indent > 4) && indent + line.size() < kLine))
         return line;
