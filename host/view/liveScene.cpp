@@ -143,11 +143,10 @@ LiveScene::Plan LiveScene::planned(std::vector<Difference> const& changes, Json 
             plan.environment = true;
         else if (section == "materials" && inside)
             plan.materials.insert(name);
-        else if (section == "instances" && inside && (key == "transform" || key == "material")
-                 && member(before, "instances", name).contains("material") == (key == "material")
-                 && !change.value.is_null())
-            plan.instances.insert(name);
-        else if (section == "instances" && inside && key == "transform")
+        else if (section == "instances" && inside
+                 && (key == "transform"
+                     || (key == "material" && !change.value.is_null()
+                         && member(before, "instances", name).contains("material"))))
             plan.instances.insert(name);
         else if (section == "lights" && inside
                  && keepsShape(member(before, "lights", name), member(after, "lights", name)))

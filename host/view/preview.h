@@ -56,7 +56,7 @@ public:
         return seconds_ > 0 ? static_cast<double>(rays_) / seconds_ : 0;
     }
     /// What is shown of a layer; throws InputError for one that is not there.
-    ShownPicture shown(std::string const& layer) const;
+    ShownPicture shown(std::string const& name) const;
     /// The picture as it is now, with the layers of the scene's film and those that were wanted.
     host::Picture picture() const;
 
