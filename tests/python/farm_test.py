@@ -2,6 +2,7 @@
 """Pictures of a farm whose workers die, freeze, lack room or are others than they ought to be."""
 
 import os
+import resource
 import signal
 import subprocess
 import sys
@@ -33,11 +34,14 @@ class Farm(unittest.TestCase):
         self.addCleanup(cluster.close)
         return cluster
 
-    def farm(self, cluster, *options):
-        """The running command, with its units kept in `units`."""
+    def farm(self, cluster, *options, file_limit=-1):
+        """The running command, with its units kept in `units`. file_limit: bytes that a file may
+        have."""
         command = subprocess.Popen([ZSI, "farm", *SCENE, "-o", "got.exr", "--scheduler",
                                     cluster.address(), "--keep", "units", *options], text=True,
-                                   cwd=self.folder, stdout=subprocess.PIPE, stderr=subprocess.PIPE)
+                                   cwd=self.folder, stdout=subprocess.PIPE, stderr=subprocess.PIPE,
+                                   preexec_fn=lambda: resource.setrlimit(
+                                       resource.RLIMIT_FSIZE, (file_limit, file_limit)))
         self.addCleanup(command.communicate)
         self.addCleanup(command.kill)
         return command
@@ -73,6 +77,16 @@ class Farm(unittest.TestCase):
         self.assertIn("File too large", err)
         self.assertRegex(out, r"got.exr: 8 samples a pixel, 40 units, \d+ rays")
         self.assertEqual([full.poll(), old.poll()], [None, None])
+        # No room here is told by file, in one line beside the engine's workers that were lost.
+        for options, limit, why in (
+                (["--keep", "full"], 2000, r"^zsi: full/.*\.exr: cannot be written: File too large$"),
+                (["--scheduler", "tls://127.0.0.1:1"], -1, "tls.*: expected --tls-ca, --tls-cert")):
+            command = self.farm(cluster, *options, file_limit=limit)
+            last = command.communicate(timeout=60)[1]
+            self.assertEqual(command.returncode, 1)
+            self.assertRegex(last.splitlines()[-1], why)
+            self.assertNotIn("Traceback", last)
+        self.assertNotIn("distributed.client", err)
         # The units are what `zsi merge` takes, and each file of the scene is there once.
         subprocess.run([ZSI, "merge", *self.kept(), "-o", "merged.exr", "-q"], cwd=self.folder,
                        check=True)

@@ -122,8 +122,17 @@ def engine() -> Any:
 
 
 def security(a: argparse.Namespace) -> Any:
+    """Raises zsi.Error where an encrypted scheduler lacks what it asks for."""
     if not (a.tls_ca or a.tls_cert or a.tls_key):
+        # The engine's own configuration may name the files.
+        if (a.scheduler or "").startswith("tls://") and \
+                not engine().Security().get_connection_args("client").get("ssl_context"):
+            raise zsi.Error(f"{a.scheduler}: expected --tls-ca, --tls-cert and --tls-key")
         return None
+    for file in (a.tls_ca, a.tls_cert, a.tls_key):
+        if not file or not os.access(file, os.R_OK):
+            raise zsi.Error(f"{file}: cannot be read" if file else
+                            "TLS needs all of --tls-ca, --tls-cert and --tls-key")
     return engine().Security(tls_ca_file=a.tls_ca, tls_client_cert=a.tls_cert, tls_client_key=a.tls_key,
                              tls_worker_cert=a.tls_cert, tls_worker_key=a.tls_key,
                              tls_scheduler_cert=a.tls_cert, tls_scheduler_key=a.tls_key,
@@ -209,11 +218,12 @@ def main() -> int:
         sys.stderr.write(MISSING + "\n")
         return 1
     if not a.verbose:
-        logging.getLogger("distributed").setLevel(logging.CRITICAL)
-        logging.getLogger("tornado").setLevel(logging.CRITICAL)
+        for name in list(logging.root.manager.loggerDict):  # some have a level of their own
+            if name.partition(".")[0] in ("distributed", "tornado"):
+                logging.getLogger(name).setLevel(logging.CRITICAL)
     try:
         return asyncio.run(farm(a))
-    except zsi.Error as error:
+    except (zsi.Error, OSError) as error:
         sys.stderr.write(f"zsi: {error}\n")
         return 1
 

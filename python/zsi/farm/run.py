@@ -115,10 +115,15 @@ class Job:
         """Merges a unit and keeps its file."""
         name = "{0}-{1}-{2}-{3}-{4}-{5}.exr".format(*box)
         self.merging.add(name, data)
-        self.folder.mkdir(parents=True, exist_ok=True)
         part = self.folder / (name + ".part")
-        part.write_bytes(data)
-        part.replace(self.folder / name)
+        try:
+            self.folder.mkdir(parents=True, exist_ok=True)
+            part.write_bytes(data)
+            part.replace(self.folder / name)
+        except OSError as error:
+            with suppress(OSError):
+                part.unlink()
+            raise Failed(f"{self.folder / name}: cannot be written: {error.strerror}") from None
         self._count()
 
     def picture(self, options: Options, finished: bool) -> None:
@@ -334,6 +339,8 @@ class Farm:
                 await other.cancel()
             try:
                 await self._in_pool(unit.job.add, unit.box, data)
+            except Failed:
+                raise
             except zsi.Error as wrong:  # such as another build that counts otherwise
                 unit.done, error = False, str(wrong)
         if unit.done:
