@@ -92,6 +92,7 @@ private:
     void layersChanged();
     void restart();
     Reply answer(std::string const& name, Query const& query);
+    std::filesystem::path fileForPages(std::string const& file) const;
     std::function<Reply()> thumbnail(Query const& query) const;
     std::function<Reply()> measurement(Query const& query) const;
 

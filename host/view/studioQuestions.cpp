@@ -232,6 +232,19 @@ Reply Studio::answer(std::string const& name, Query const& query)
     throw host::InputError(host::printable(name) + ": there is no such file");
 }
 
+/// What pages may read: files that the scene names, and those in its folder.
+std::filesystem::path Studio::fileForPages(std::string const& file) const
+{
+    std::set<std::string> named;
+    filesOf(document_.json(), named);
+    std::filesystem::path const folder = std::filesystem::absolute(file_).parent_path();
+    std::filesystem::path path = std::filesystem::weakly_canonical(folder / file);
+    if (!named.contains(file) && !isBelow(path, std::filesystem::weakly_canonical(folder)))
+        throw host::InputError(host::printable(file)
+                               + ": expected a file that the scene names or that is in its folder");
+    return path;
+}
+
 std::function<Reply()> Studio::thumbnail(Query const& query) const
 {
     std::string const file = valueOf(query, "file"), side = valueOf(query, "size");
@@ -239,26 +252,23 @@ std::function<Reply()> Studio::thumbnail(Query const& query) const
         throw host::InputError("thumbnail: which file?");
     int size = 96;
     std::from_chars(side.data(), side.data() + side.size(), size);
-    std::set<std::string> named;
-    filesOf(document_.json(), named);
-    std::filesystem::path const folder = std::filesystem::absolute(file_).parent_path();
-    std::filesystem::path const path = std::filesystem::weakly_canonical(folder / file);
-    if (!named.contains(file) && !isBelow(path, std::filesystem::weakly_canonical(folder)))
-        throw host::InputError("thumbnail: the scene does not name this file");
-    return [path, size = std::clamp(size, 16, 512)]() -> Reply {
+    return [path = fileForPages(file), size = std::clamp(size, 16, 512)]() -> Reply {
         return {200, "image/png", pngOf(thumbnailOf(path, size))};
     };
 }
 
 /// Of materials of the scene as they are now (`material`), or of classes (`class`, with parameters
-/// behind), overlaid.
+/// behind), and of measured tables (`merl`, files), overlaid.
 std::function<Reply()> Studio::measurement(Query const& query) const
 {
     std::vector<lab::Specimen> specimens;
     std::vector<std::string> words;
+    std::vector<std::filesystem::path> tables;
     for (auto const& [key, value] : query) {
         if (key == "material") {
             specimens.push_back(specimenOf(live_.scene(), value, shaders_));
+        } else if (key == "merl") {
+            tables.push_back(fileForPages(value));
         } else if (key == "class") {
             if (!shaders_.has(value))
                 throw host::InputError("lab: unknown class " + host::printable(value));
@@ -269,9 +279,11 @@ std::function<Reply()> Studio::measurement(Query const& query) const
     }
     for (lab::Specimen& specimen : lab::specimensOf(words, shaders_))
         specimens.push_back(std::move(specimen));
-    if (specimens.empty())
+    if (specimens.empty() && tables.empty())
         throw host::InputError("lab: expected a material or a class");
-    return [this, specimens = std::move(specimens)]() -> Reply {
+    return [this, specimens = std::move(specimens), tables = std::move(tables)]() mutable -> Reply {
+        for (std::filesystem::path const& table : tables) // 33 MB each: not on the studio's thread
+            specimens.push_back(lab::measuredSpecimen(table));
         lab::LabOptions options = lab::quickOptions();
         options.threads = 1; // the picture goes on beside
         options.cancel = &stopAnswers_;

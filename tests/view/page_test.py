@@ -1,17 +1,22 @@
 # SPDX-License-Identifier: Apache-2.0
 """The page as people use it, in a browser. ZSI_COMMAND: the command; ZSI_ASSETS: the folder."""
+import io
 import json
 import os
 import pathlib
 import signal
+import struct
 import tempfile
 import unittest
+from urllib.parse import unquote
 
 from browser import Browser, difference
 from client import Server
+from PIL import Image
 from relay import Relay
 from selenium.webdriver import ActionChains
 from selenium.webdriver.common.by import By
+from selenium.webdriver.common.actions.wheel_input import ScrollOrigin
 from selenium.webdriver.common.keys import Keys
 
 ZSI = os.environ["ZSI_COMMAND"]
@@ -62,6 +67,11 @@ class PageTest(unittest.TestCase):
 
     def document(self):
         return json.loads(self.server.file("scene.json"))
+
+    def choose(self, css, value):
+        """Of a list, or typed into a field."""
+        self.browser.run("""const s = document.querySelector(arguments[0]);
+            s.value = arguments[1]; s.dispatchEvent(new Event('change'))""", css, value)
 
     def drag(self, css, by):
         """In steps, as a hand would; `by` in pixels."""
@@ -117,8 +127,7 @@ class PageTest(unittest.TestCase):
 
     def test_edits_of_every_part_are_saved_and_give_the_same_picture_again(self):
         browser = self.browser
-        choose = lambda css, text: browser.run(
-            "const s = document.querySelector(arguments[0]); s.value = arguments[1]; s.dispatchEvent(new Event('change'))", css, text)
+        choose = self.choose
         browser.run("""const c = document.querySelector("[data-parameter='u_reflectColor'] input[type=color]");
             c.value = '#bc0000'; c.dispatchEvent(new Event('input'))""")
         browser.click("#tab-lights")
@@ -175,12 +184,24 @@ class PageTest(unittest.TestCase):
     def test_the_lab_measures_what_was_edited(self):
         summary = self.browser.find(".lab summary")
         self.browser.run("arguments[0].scrollIntoView(); arguments[0].click()", summary)
-        plot = lambda: self.browser.run("""const i = document.querySelector("[data-figure='albedo'] img");
+        plot = lambda: self.browser.run("""const i = document.querySelector("[data-figure='light'] img");
             return i && i.complete && i.naturalWidth > 0 ? i.src : ''""")
         before = self.browser.wait(plot)
         self.browser.run("""const r = document.querySelector("[data-parameter='u_roughValue'] input[type=number]");
             r.value = '0.9'; r.dispatchEvent(new Event('change'))""")
-        self.browser.wait(lambda: plot() not in ("", before))
+        alone = self.browser.wait(lambda: plot() not in ("", before) and plot())
+        self.choose("[data-control=beside]", "plain")
+        both = self.browser.wait(lambda: plot() not in ("", alone) and plot())
+        self.assertIn("plain", unquote(both), "the legend names both")
+
+        # Half red, measured: the ball's metal is another thing, by a number.
+        with open(self.folder / "half.binary", "wb") as file:
+            cells = 90 * 90 * 180
+            file.write(struct.pack("<3i", 90, 90, 180) + struct.pack("<d", 500) * cells + bytes(16 * cells))
+        self.browser.run("""const f = document.querySelector("[data-control=merl]");
+            f.value = 'half.binary'; f.dispatchEvent(new Event('change'))""")
+        text = self.browser.wait(lambda: [e.text for e in self.browser.driver.find_elements(By.CSS_SELECTOR, "[data-error=metal]")])[0]
+        self.assertGreater(float(text.partition("RMS ")[2].partition(",")[0]), 0.01)
 
     def test_a_lost_connection_comes_back_with_the_state(self):
         relay = Relay(self.server.port)
@@ -198,6 +219,60 @@ class PageTest(unittest.TestCase):
         self.assertAlmostEqual(float(number.get_attribute("value")), exposure)
         _, after = self.settled(lambda: self.drag(EXPOSURE + " input[type=range]", (-40, 0)))
         self.assertGreater(difference(before, after), 1)
+
+    def test_pictures_are_chosen_by_file(self):
+        Image.new("RGB", (8, 8), (0, 188, 0)).save(self.folder / "green.png")
+        Image.new("RGB", (8, 4), (188, 0, 0)).save(self.folder / "red.png")
+        seen = lambda css: self.browser.wait(lambda: self.browser.run(
+            "const i = document.querySelector(arguments[0]); return i && i.complete && i.naturalWidth", css + " .thumbnail"))
+        row = "[data-parameter='u_reflectMap']"
+        self.browser.run("document.querySelector(arguments[0]).closest('details').open = true", row)
+        self.choose(row + " .file", "green.png")
+        seen(row)
+        self.settled(lambda: self.browser.run("document.querySelector(arguments[0]).click()", "[data-parameter='u_reflectMapEnable'] input"))
+        self.assertEqual(self.document()["materials"]["metal"]["parameters"]["u_reflectMap"], {"texture": "green.png"})
+
+        # Around a scene that has nothing around it.
+        self.browser.click("#tab-environment")
+        self.settled(lambda: self.choose("[data-control=class]", "none"))
+        self.assertNotIn("environment", self.document())
+        row = "[data-parameter='environment.file']"
+        _, lit = self.settled(lambda: self.choose(row + " .file", "red.png"))
+        seen(row)
+        self.assertEqual(self.document()["environment"], {"file": "red.png"})
+        corner = Image.open(io.BytesIO(lit)).convert("RGB").getpixel((1, 1))
+        self.assertGreater(corner[0], 10 * max(corner[1:]))
+
+    def test_hand_and_wheel_move_the_camera_and_the_rest_of_the_bar_works(self):
+        browser, canvas = self.browser, self.browser.find("canvas")
+        browser.finished()
+        camera = lambda: self.document()["camera"]
+        distance = lambda: sum((a - b) ** 2 for a, b in zip(camera()["position"], camera()["target"])) ** 0.5
+        ActionChains(browser.driver).key_down(Keys.SHIFT).perform()
+        self.drag("canvas", (40, 0))
+        ActionChains(browser.driver).key_up(Keys.SHIFT).perform()
+        browser.wait(lambda: camera()["target"] != [0, 0, 0])
+        # What is under the hand stays under it: 3.26 fill the height.
+        self.assertAlmostEqual(camera()["target"][0], -40 / canvas.size["height"] * 2 * 37 ** 0.5 * 0.26795, delta=0.1)
+        self.assertAlmostEqual(distance(), 37 ** 0.5, places=2)
+        ActionChains(browser.driver).scroll_from_origin(ScrollOrigin.from_element(canvas), 0, -400).perform()
+        browser.wait(lambda: distance() < 0.95 * 37 ** 0.5)
+
+        # Denoised is what follows the last samples.
+        browser.finished()
+        browser.click("[data-tool=denoise]")
+        browser.wait(lambda: browser.find("canvas").get_attribute("data-shown").endswith("/1"))
+        browser.click("[data-tool=denoise]")
+
+        browser.find("canvas").send_keys(Keys.CONTROL, "s")
+        for field, value in (("#turn-frames", "3"), ("#turn-samples", "1")):
+            self.choose(field, value)
+        browser.click("[data-tool=turntable]")
+        frame = lambda: browser.run("""const i = document.querySelector('.turntable img');
+            return i && i.complete && i.naturalWidth ? i.src : ''""")
+        seen = {browser.wait(frame)}
+        browser.wait(lambda: seen.add(frame()) or len(seen - {""}) == 3)
+        browser.find("body").send_keys(Keys.ESCAPE)
 
     def test_names_roles_and_narrow_windows(self):
         browser = self.browser

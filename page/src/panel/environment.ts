@@ -32,20 +32,21 @@ export function environmentPanel(filter: string): TemplateResult {
   const isFile = isObject(entry) && entry.file !== undefined;
   const className = isObject(entry) && typeof entry.class === "string" ? entry.class : "";
   const none = {name: "none", value: null};
-  const file = {name: "a picture", value: {file: isFile ? entry.file! : ""}};
   const shader = session.shaderClass(className);
   const turn = turnOf(session.valueAt(`environment.parameters.${kMatrix}`));
   const turns = shader?.parameters.some((row) => row.name === kMatrix) && turn !== undefined;
   return html`
-    ${classChooser("environment", "environment", className || (isFile ? file.name : none.name),
-      isObject(entry) && entry.visible !== undefined ? {visible: entry.visible} : {}, isFile ? [none, file] : [none])}
+    ${classChooser("environment", "environment", className || (isFile ? "a picture" : none.name),
+      isObject(entry) && entry.visible !== undefined ? {visible: entry.visible} : {},
+      isFile ? [none, {name: "a picture", value: entry}] : [none])}
+    <div class="row" data-parameter="environment.file"><span class="name">picture</span><span class="control">
+      <zsi-texture label="picture around the scene" key="file" .value=${isFile ? entry : null}
+        @edit=${(e: CustomEvent<Change<Json>>) => session.set("environment", e.detail.value)}></zsi-texture></span>
+      <small>${className ? "around the scene, in place of the class" : "around the scene, by latitude and longitude"}</small></div>
     ${fieldRows("film", [{key: "exposure", meaning: "stops, of what is shown and of 8-bit files", type: "number", otherwise: 0,
       minimum: -6, maximum: 6}])}
     ${turns ? rotation(`environment.parameters.${kMatrix}`, turn, (v) => ({rotate: [0, 0, 1, v]})) : nothing}
     ${isFile ? html`
-      <div class="row"><span class="name">file</span><span class="control">
-        <zsi-texture label="picture of the environment" key="file" .value=${entry}
-          @edit=${(e: CustomEvent<Change<Json>>) => session.set("environment", e.detail.value)}></zsi-texture></span></div>
       ${rotation("environment.rotate", Number(entry.rotate ?? 0), (v) => v)}
       ${fieldRows("environment", [
         {key: "intensity", meaning: "factor", type: Array.isArray(entry.intensity) ? "color" : "number", otherwise: 1, maximum: 4},

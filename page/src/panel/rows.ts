@@ -63,6 +63,9 @@ function control(row: Row, value: Json, edit: (event: CustomEvent<Change<Json>>)
     return html`<input type="checkbox" aria-label=${label} .checked=${value === true}
       @change=${(e: Event) => plain((e.target as HTMLInputElement).checked)} />`;
   const number = Number(value);
+  if (row.type === "int" && row.minimum === 0 && row.maximum === 1 && (number === 0 || number === 1))
+    return html`<input type="checkbox" aria-label=${label} .checked=${number === 1}
+      @change=${(e: Event) => plain(Number((e.target as HTMLInputElement).checked))} />`;
   const choices = choicesOf(row);
   if (choices.length > 0)
     return html`<select aria-label=${label} @change=${(e: Event) => plain(Number((e.target as HTMLSelectElement).value))}>

@@ -56,11 +56,10 @@ export class Connection {
 }
 
 /** Of a file of this session, with the token that the page was opened with. */
-export function address(name: string, query: Record<string, string> = {}): string {
+export function address(name: string, query: Record<string, string | string[]> = {}): string {
   const url = new URL(name, location.href);
-  url.search = new URLSearchParams({
-    token: new URLSearchParams(location.search).get("token") ?? "",
-    ...query,
-  }).toString();
+  const words = new URLSearchParams({token: new URLSearchParams(location.search).get("token") ?? ""});
+  for (const [key, values] of Object.entries(query)) for (const value of [values].flat()) words.append(key, value);
+  url.search = words.toString();
   return url.href;
 }
