@@ -31,6 +31,7 @@ struct Subcommand {
 Subcommand addInfo(CLI::App& app, std::string const& shaderPath);
 Subcommand addRender(CLI::App& app, std::string const& shaderPath);
 Subcommand addView(CLI::App& app, std::string const& shaderPath);
+Subcommand addConvert(CLI::App& app);
 Subcommand addSchema(CLI::App& app, std::string const& shaderPath);
 Subcommand addDenoise(CLI::App& app);
 Subcommand addRenderUnit(CLI::App& app, std::string const& shaderPath);

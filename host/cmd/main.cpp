@@ -69,15 +69,11 @@ int run(int argc, char** argv)
                    "ZSI_SHADER_PATH, else the folder `shaders` beside this program, else the "
                    "installed one")
         ->type_name("FOLDER[:FOLDER]");
-    Subcommand const subcommands[] = {addInfo(app, shaderPath),
-                                      addRender(app, shaderPath),
-                                      addView(app, shaderPath),
-                                      addSchema(app, shaderPath),
-                                      addDenoise(app),
-                                      addRenderUnit(app, shaderPath),
-                                      addMerge(app),
-                                      addFarm(app, shaderPath),
-                                      addLab(app, shaderPath)};
+    Subcommand const subcommands[] = {addInfo(app, shaderPath),       addRender(app, shaderPath),
+                                      addView(app, shaderPath),       addConvert(app),
+                                      addSchema(app, shaderPath),     addDenoise(app),
+                                      addRenderUnit(app, shaderPath), addMerge(app),
+                                      addFarm(app, shaderPath),       addLab(app, shaderPath)};
     app.footer("Exit status: 0 done, 1 bad input, 2 bad command line, 130 interrupted.");
 
     try {
@@ -90,8 +86,8 @@ int run(int argc, char** argv)
     for (Subcommand const& subcommand : subcommands)
         if (subcommand.app->parsed())
             return subcommand.run();
-    throw UsageError("a subcommand is missing: info, render, view, denoise, schema, render-unit, "
-                     "merge, farm or lab (zsi --help)");
+    throw UsageError("a subcommand is missing: info, render, view, convert, denoise, schema, "
+                     "render-unit, merge, farm or lab (zsi --help)");
 }
 
 } // namespace

@@ -131,7 +131,10 @@ void addThreadsOption(CLI::App& command, int& threads)
 
 void addSceneOptions(CLI::App& command, SceneOptions& options)
 {
-    command.add_option("SCENE", options.file, "The scene, a JSON file; - is standard input")
+    command
+        .add_option(
+            "SCENE", options.file,
+            "The scene, a JSON file, or a model (glTF, GLB, OBJ, PLY, STL); - is standard input")
         ->required();
     command.add_option("--size", options.size, "Size in pixels, instead of the scene's")
         ->type_name("WxH");

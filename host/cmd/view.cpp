@@ -72,8 +72,10 @@ Subcommand addView(CLI::App& app, std::string const& shaderPath)
     CLI::App* const command =
         app.add_subcommand("view", "Edit a scene in the browser, with its picture beside");
     command
-        ->add_option("SCENE", arguments->scene,
-                     "The scene, a JSON file; or a shader class, shown on a small stage")
+        ->add_option(
+            "SCENE", arguments->scene,
+            "The scene, a JSON file; a model (glTF, GLB, OBJ, PLY, STL); or a shader class, shown "
+            "on a small stage")
         ->required();
     command->add_option("--port", arguments->port, "Port to serve on; 0 is any that is free");
     command

@@ -2,7 +2,7 @@
 /// Values of a scene given apart from its file.
 #pragma once
 
-#include "load/jsonTree.h"
+#include "json/jsonTree.h"
 
 #include <string>
 

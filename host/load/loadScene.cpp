@@ -63,7 +63,11 @@ void read(JsonReader const& root, SceneBuilder& builder, LoadOptions const& opti
 Scene loadScene(std::filesystem::path const& file, ShaderSource const& shaders,
                 LoadOptions const& options)
 {
-    return loadScene(readSceneFile(file, options.assignments), file, shaders, options);
+    std::vector<std::string> warnings;
+    Scene scene =
+        loadScene(readSceneFile(file, options.assignments, &warnings), file, shaders, options);
+    scene.warnings.insert(scene.warnings.begin(), warnings.begin(), warnings.end());
+    return scene;
 }
 
 Scene loadScene(JsonValue const& document, std::filesystem::path const& file,

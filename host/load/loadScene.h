@@ -2,10 +2,10 @@
 /// Reads a JSON scene file.
 #pragma once
 
-#include "load/jsonTree.h"
 #include "plugin/shaderSource.h"
 #include "scene/scene.h"
 #include "texture/textureStore.h"
+#include "json/jsonTree.h"
 
 #include <filesystem>
 #include <functional>

@@ -6,6 +6,7 @@
 #include "mesh/meshCompletion.h"
 #include "mesh/meshFile.h"
 #include "mesh/meshShapes.h"
+#include "model/gltfMesh.h"
 
 #include <fmt/format.h>
 
@@ -14,14 +15,26 @@ namespace {
 
 constexpr int kMostSegments = 4096;
 
+/// A mesh of those in a glTF file.
+Mesh readOneMesh(JsonReader const& index, std::filesystem::path const& file, Scene& scene)
+{
+    if (!isYUp(file))
+        index.fail("only glTF and GLB files have meshes by number");
+    std::shared_ptr<GltfFile const> const model = GltfFile::open(file);
+    for (std::filesystem::path const& further : model->bufferFiles())
+        scene.furtherFiles.push_back(further.string());
+    return readGltfMesh(*model, model->indexOf("meshes", index));
+}
+
 Mesh readMeshFromFile(JsonReader const& reader, Scene& scene)
 {
-    reader.expectKeys({"file", "up", "normals"});
+    reader.expectKeys({"file", "mesh", "up", "normals"});
     JsonReader const name = reader.at("file");
     std::filesystem::path const file = name.toFile();
+    auto const one = reader.find("mesh");
     Mesh mesh;
     try {
-        mesh = readMeshFile(file, &scene.furtherFiles);
+        mesh = one ? readOneMesh(*one, file, scene) : readMeshFile(file, &scene.furtherFiles);
     } catch (InputError const& error) {
         name.fail(error.what());
     }

@@ -2,8 +2,8 @@
 /// The meshes of a scene file.
 #pragma once
 
-#include "load/jsonReader.h"
 #include "scene/scene.h"
+#include "json/jsonReader.h"
 
 namespace zsi::host {
 

@@ -1,8 +1,8 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "load/packScene.h"
 
-#include "load/jsonReader.h"
 #include "load/sceneFile.h"
+#include "json/jsonReader.h"
 
 #include <fmt/format.h>
 #include <map>
@@ -67,8 +67,10 @@ void write(JsonReader const& reader, Files& files, std::string& text)
 
 PackedScene packScene(fs::path const& file, ShaderSource const& shaders, LoadOptions const& options)
 {
-    JsonValue const tree = readSceneFile(file, options.assignments);
+    std::vector<std::string> warnings;
+    JsonValue const tree = readSceneFile(file, options.assignments, &warnings);
     PackedScene packed{loadScene(tree, file, shaders, options), {}, {}};
+    packed.scene.warnings.insert(packed.scene.warnings.begin(), warnings.begin(), warnings.end());
     Files files;
     write(JsonReader(tree), files, packed.text);
     packed.text += '\n';

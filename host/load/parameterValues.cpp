@@ -3,7 +3,11 @@
 
 #include "base/error.h"
 #include "load/transforms.h"
+#include "model/gltfFile.h"
 #include "texture/textureStore.h"
+
+#include <algorithm>
+#include <fmt/format.h>
 
 namespace zsi::host {
 
@@ -41,6 +45,71 @@ auto readTexture(JsonReader const& reader, Load&& load)
     reader.expectKeys({"texture", "colorSpace"});
     ColorSpace const space = readColorSpace(reader);
     return loaded(reader.at("texture"), [&](auto const& file) { return load(file, space); });
+}
+
+/// A picture of its own, or one in a model.
+PictureSource sourceOf(JsonReader const& reader, std::filesystem::path const& file)
+{
+    auto const image = reader.find("image");
+    if (!image)
+        return {file};
+    std::shared_ptr<GltfFile const> const model = GltfFile::open(file);
+    std::size_t const index = model->indexOf("images", *image);
+    if (std::filesystem::path const own = model->imageFile(index); !own.empty())
+        return {own};
+    return {file, fmt::format("images[{}]", index), [=] { return model->imageBytes(index); }};
+}
+
+std::array<EdgeMode, 2> readEdges(JsonReader const& reader)
+{
+    constexpr EdgeMode kModes[] = {EdgeMode::Repeat, EdgeMode::Clamp, EdgeMode::Mirror};
+    auto const mode = [&](JsonReader const& one) {
+        return kModes[one.toChoice({"repeat", "clamp", "mirror"})];
+    };
+    if (reader.kind() != JsonValue::Kind::Array)
+        return {mode(reader), mode(reader)};
+    std::vector<JsonReader> const both = reader.items();
+    if (both.size() != 2)
+        reader.failExpected("one mode, or two, along u and v");
+    return {mode(both[0]), mode(both[1])};
+}
+
+PictureTreatment readTreatment(JsonReader const& reader)
+{
+    PictureTreatment treatment;
+    if (auto const v = reader.find("channel"))
+        treatment.channel = static_cast<int>(v->toChoice({"r", "g", "b", "a"}));
+    if (auto const v = reader.find("factor")) {
+        if (v->kind() == JsonValue::Kind::Array) {
+            std::vector<float> const f = v->toFloats(v->value().items.size() == 3 ? 3 : 4);
+            std::copy(f.begin(), f.end(), treatment.factor.begin());
+        } else {
+            treatment.factor.fill(v->toFloat());
+        }
+    }
+    if (auto const v = reader.find("power"))
+        treatment.power = v->toPositive();
+    if (auto const v = reader.find("curve"))
+        for (JsonReader const& knot : v->items())
+            treatment.curve.push_back(knot.toFloat());
+    if (auto const v = reader.find("threshold"))
+        treatment.threshold = v->toFloat(0);
+    if (auto const v = reader.find("wrap"))
+        treatment.edges = readEdges(*v);
+    return treatment;
+}
+
+HostTexture2D const* readTexture2D(JsonReader const& reader, TextureStore& textures)
+{
+    if (!reader.isObject())
+        reader.failExpected("{\"texture\": file, \"colorSpace\": ...}");
+    reader.expectKeys({"texture", "colorSpace", "image", "channel", "factor", "power", "curve",
+                       "threshold", "wrap"});
+    ColorSpace const space = readColorSpace(reader);
+    PictureTreatment const treatment = readTreatment(reader);
+    return loaded(reader.at("texture"), [&](auto const& file) {
+        return textures.load2D(sourceOf(reader, file), space, treatment);
+    });
 }
 
 HostTextureCube const* readCube(JsonReader const& reader, TextureStore& textures)
@@ -92,9 +161,7 @@ ParameterValue readParameterValue(JsonReader const& reader, ParameterType type,
             return textures.load1D(file, space);
         });
     case ParameterType::Texture2D:
-        return readTexture(reader, [&](auto const& file, ColorSpace space) {
-            return textures.load2D(file, space);
-        });
+        return readTexture2D(reader, textures);
     case ParameterType::TextureCube:
         return readCube(reader, textures);
     }

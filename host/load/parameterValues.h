@@ -2,8 +2,8 @@
 /// From JSON to what a shader's parameters take.
 #pragma once
 
-#include "load/jsonReader.h"
 #include "plugin/shader.h"
+#include "json/jsonReader.h"
 
 namespace zsi::host {
 

@@ -2,8 +2,8 @@
 /// What a scene file says of the picture: camera, film and settings.
 #pragma once
 
-#include "load/jsonReader.h"
 #include "scene/scene.h"
+#include "json/jsonReader.h"
 
 namespace zsi::host {
 

@@ -2,7 +2,7 @@
 /// Where things of a scene file stand, which way they point and how large they are.
 #pragma once
 
-#include "load/jsonReader.h"
+#include "json/jsonReader.h"
 
 namespace zsi::host {
 

@@ -2,8 +2,8 @@
 /// A scene while it is read from a file.
 #pragma once
 
-#include "load/jsonReader.h"
 #include "load/loadScene.h"
+#include "json/jsonReader.h"
 
 #include <map>
 #include <unordered_map>

@@ -4,7 +4,8 @@
 #include "base/error.h"
 #include "base/names.h"
 #include "load/assignment.h"
-#include "load/jsonReader.h"
+#include "model/modelScene.h"
+#include "json/jsonReader.h"
 
 #include <algorithm>
 #include <iostream>
@@ -127,7 +128,19 @@ JsonValue readStandardInput()
     return parseJson(text, "<stdin>");
 }
 
-JsonValue withIncludes(JsonValue scene, fs::path const& file, std::vector<fs::path>& open)
+/// A scene file, or the scene that shows a model.
+JsonValue readFile(fs::path const& file, std::vector<std::string>* warnings)
+{
+    if (!isModel(file))
+        return readJson(file);
+    ModelScene model = modelScene(file, {file.parent_path(), {}});
+    if (warnings)
+        warnings->insert(warnings->end(), model.warnings.begin(), model.warnings.end());
+    return std::move(model.document);
+}
+
+JsonValue withIncludes(JsonValue scene, fs::path const& file, std::vector<fs::path>& open,
+                       std::vector<std::string>* warnings)
 {
     JsonReader const reader(scene);
     if (!reader.isObject())
@@ -141,7 +154,7 @@ JsonValue withIncludes(JsonValue scene, fs::path const& file, std::vector<fs::pa
         include->fail(included.string() + " includes itself");
     if (!fs::exists(included))
         include->fail(included.string() + ": no such file");
-    JsonValue merged = withIncludes(readJson(included), included, open);
+    JsonValue merged = withIncludes(readFile(included, warnings), included, open, warnings);
     std::erase_if(scene.members, [](JsonMember const& m) { return m.key == "include"; });
     merge(merged, JsonReader(scene), Level::Scene, {});
     return merged;
@@ -149,12 +162,13 @@ JsonValue withIncludes(JsonValue scene, fs::path const& file, std::vector<fs::pa
 
 } // namespace
 
-JsonValue readSceneFile(fs::path const& file, std::vector<std::string> const& assignments)
+JsonValue readSceneFile(fs::path const& file, std::vector<std::string> const& assignments,
+                        std::vector<std::string>* warnings)
 {
     std::vector<fs::path> open;
     bool const piped = file == "-";
-    JsonValue scene =
-        withIncludes(piped ? readStandardInput() : readJson(file), piped ? "<stdin>" : file, open);
+    JsonValue scene = withIncludes(piped ? readStandardInput() : readFile(file, warnings),
+                                   piped ? "<stdin>" : file, open, warnings);
     for (std::string const& assignment : assignments)
         assign(scene, assignment, "--set");
     refuseNull(JsonReader(scene));

@@ -2,7 +2,7 @@
 /// Matrices as scene files write them.
 #pragma once
 
-#include "load/jsonReader.h"
+#include "json/jsonReader.h"
 
 namespace zsi::host {
 

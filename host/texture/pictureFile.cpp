@@ -8,6 +8,7 @@
 #include <cmath>
 #include <cstring>
 #include <fstream>
+#include <sstream>
 #include <tuple>
 #include <vector>
 
@@ -48,9 +49,8 @@ void replaceNonFinite(TexelType type, std::byte* values, std::size_t count)
 }
 
 /// Whether a PNG's blocks follow one another to the last: its reader leaves off after the pixels.
-bool endsWhole(std::filesystem::path const& png)
+bool endsWhole(std::istream& in)
 {
-    std::ifstream in(png, std::ios::binary);
     in.seekg(8);
     for (std::array<unsigned char, 8> head; in.read(reinterpret_cast<char*>(head.data()), 8);) {
         std::uint32_t size = 0;
@@ -72,15 +72,44 @@ bool isHarmless(std::string const& error)
 
 } // namespace
 
-PictureFile::PictureFile(std::filesystem::path const& file, ColorSpace space)
-    : path_(file)
+std::string_view pictureEnding(std::vector<unsigned char> const& bytes)
+{
+    auto const has = [&](std::size_t at, std::string_view mark) {
+        return bytes.size() >= at + mark.size()
+            && std::memcmp(bytes.data() + at, mark.data(), mark.size()) == 0;
+    };
+    return has(0, "\x89PNG")               ? ".png"
+        : has(0, "\xff\xd8\xff")           ? ".jpg"
+        : has(0, "RIFF") && has(8, "WEBP") ? ".webp"
+                                           : "";
+}
+
+void PictureFile::open(OIIO::ImageSpec const& config)
+{
+    if (!source_.bytes) {
+        input_ = OIIO::ImageInput::open(source_.file.string(), &config);
+        return;
+    }
+    bytes_ = source_.bytes();
+    std::string_view const ending = pictureEnding(bytes_);
+    if (ending.empty())
+        fail("expected PNG, JPEG or WebP");
+    memory_ = std::make_unique<OIIO::Filesystem::IOMemReader>(bytes_.data(), bytes_.size());
+    OIIO::ImageSpec own = config;
+    OIIO::Filesystem::IOProxy* proxy = memory_.get();
+    own.attribute("oiio:ioproxy", OIIO::TypeDesc::PTR, &proxy);
+    input_ = OIIO::ImageInput::open("part" + std::string(ending), &own);
+}
+
+PictureFile::PictureFile(PictureSource const& source, ColorSpace space)
+    : source_(source)
 {
     std::error_code ignored;
-    if (!std::filesystem::exists(file, ignored))
-        throw InputError(file.string() + ": no such file");
+    if (!std::filesystem::exists(source.file, ignored))
+        throw InputError(source.file.string() + ": no such file");
     OIIO::ImageSpec config;
     config.attribute("oiio:UnassociatedAlpha", 1);
-    input_ = OIIO::ImageInput::open(file.string(), &config);
+    open(config);
     if (!input_)
         fail(OIIO::geterror());
     spec_ = input_->spec();
@@ -110,7 +139,7 @@ PictureFile::PictureFile(std::filesystem::path const& file, ColorSpace space)
 void PictureFile::fail(std::string const& why) const
 {
     std::string const line = why.substr(0, why.find('\n'));
-    throw InputError(path_.string() + ": cannot be read as a picture: "
+    throw InputError(source_.name() + ": cannot be read as a picture: "
                      + (line.empty() ? "it is damaged or ends early" : line));
 }
 
@@ -166,8 +195,12 @@ void PictureFile::readRows(Row const& row)
     }
     while (next < height())
         row(next++, blank.data());
-    if (std::string_view(input_->format_name()) == "png" && !endsWhole(path_))
-        fail("the file ends early");
+    if (std::string_view(input_->format_name()) == "png") {
+        std::ifstream file(source_.file, std::ios::binary);
+        std::istringstream part(std::string(bytes_.begin(), bytes_.end()));
+        if (!endsWhole(memory_ ? static_cast<std::istream&>(part) : file))
+            fail("the file ends early");
+    }
 }
 
 void PictureFile::readLinear(std::function<void(int y, Vec4f const* texels)> const& row)

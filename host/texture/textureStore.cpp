@@ -17,9 +17,11 @@ namespace {
 
 class Texture2D final : public HostTexture2D {
 public:
-    explicit Texture2D(TiledPicture picture)
+    Texture2D(TiledPicture picture, std::array<EdgeMode, 2> edges)
         : picture_(std::move(picture))
+        , edges_(edges)
     {
+        picture_.clampEdges(edges[0] != EdgeMode::Repeat, edges[1] != EdgeMode::Repeat);
     }
     void reserved0() override { }
     void reserved1() override { }
@@ -30,12 +32,22 @@ public:
         if (TextureProbe* const probe = TextureProbe::current()) [[unlikely]]
             *result = probe->texel();
         else if (std::isfinite(uv->x) && std::isfinite(uv->y))
-            *result =
-                picture_.filtered(TextureFootprint::width(), fract(uv->x), 1.0f - fract(uv->y));
+            *result = picture_.filtered(TextureFootprint::width(), within(uv->x, edges_[0]),
+                                        1.0f - within(uv->y, edges_[1]));
     }
 
 private:
+    /// 0..1.
+    static float within(float x, EdgeMode edge)
+    {
+        if (edge == EdgeMode::Repeat) [[likely]]
+            return fract(x);
+        return edge == EdgeMode::Clamp ? clamp01(x)
+                                       : std::fabs(2.0f * fract(0.5f * x + 0.5f) - 1.0f);
+    }
+
     TiledPicture picture_;
+    std::array<EdgeMode, 2> edges_;
 };
 
 class Texture1D final : public HostTexture1D {
@@ -82,6 +94,22 @@ public:
 private:
     TiledPicture picture_;
 };
+
+/// Of what a treatment makes: one channel where all are alike, finer than codes of 8 bits where
+/// values change.
+TexelFormat treatedFormat(PictureFile const& picture, PictureTreatment const& treatment)
+{
+    TexelFormat const& from = picture.format();
+    TexelFormat format;
+    bool const keeps = treatment.keepsValues() && !from.srgb;
+    format.type = keeps || from.type == TexelType::Float ? from.type : TexelType::Half;
+    bool const allAlike = treatment.channel >= 0
+        && treatment.factor
+            == std::array{treatment.factor[0], treatment.factor[0], treatment.factor[0],
+                          treatment.factor[0]};
+    format.channels = allAlike ? 1 : 4;
+    return format;
+}
 
 /// Writes rows of an environment, evened out, as three or four channels.
 class CubeWriter {
@@ -156,18 +184,19 @@ struct TextureStore::Impl {
     std::map<void const*, TextureOrigin> origins;
 
     template <class Texture, class Make>
-    Texture const* keep(Kept<Texture>& kept, std::filesystem::path const& file, ColorSpace space,
+    Texture const* keep(Kept<Texture>& kept, PictureSource const& source, ColorSpace space,
                         std::string const& variant, Make&& make)
     {
-        std::string const key =
-            file.string() + '|' + std::to_string(static_cast<int>(space)) + '|' + variant;
+        std::string const file = source.file.string();
+        std::string const key = file + '|' + source.part + '|'
+            + std::to_string(static_cast<int>(space)) + '|' + variant;
         auto const found = kept.find(key);
         if (found != kept.end())
             return found->second.get();
-        PictureFile picture(file, space);
+        PictureFile picture(source, space);
         try {
             Texture const* const made = kept.emplace(key, make(picture)).first->second.get();
-            origins[made] = {file, key.substr(file.string().size())};
+            origins[made] = {source.file, key.substr(file.size())};
             return made;
         } catch (std::system_error const& error) {
             picture.fail(error.what());
@@ -184,36 +213,54 @@ TextureStore::TextureStore(TextureOptions const& options)
 
 TextureStore::~TextureStore() = default;
 
-HostTexture2D const* TextureStore::load2D(std::filesystem::path const& file, ColorSpace space)
+HostTexture2D const* TextureStore::load2D(PictureSource const& source, ColorSpace space,
+                                          PictureTreatment const& treatment)
 {
-    return impl_->keep(impl_->textures2D, file, space, "", [&](PictureFile& picture) {
-        TiledPictureWriter writer(picture.format(), picture.width(), picture.height(), true,
-                                  impl_->memory);
-        picture.readRows([&](int, std::byte const* texels) { writer.addRow(texels); });
-        return std::make_unique<Texture2D>(writer.finish());
-    });
+    auto const make = [&](PictureFile& picture) {
+        bool const asItIs = treatment.channel < 0 && treatment.keepsValues();
+        TexelFormat const format = asItIs ? picture.format() : treatedFormat(picture, treatment);
+        TiledPictureWriter writer(format, picture.width(), picture.height(), true, impl_->memory);
+        if (asItIs) {
+            picture.readRows([&](int, std::byte const* texels) { writer.addRow(texels); });
+        } else {
+            std::vector<float> values;
+            picture.readLinear([&](int, Vec4f const* texels) {
+                values.clear();
+                for (int x = 0; x < picture.width(); ++x) {
+                    Vec4f const v = treatment.applied(texels[x]);
+                    float const channels[] = {v.x, v.y, v.z, v.w};
+                    values.insert(values.end(), channels, channels + format.channels);
+                }
+                writer.addLinearRow(values.data());
+            });
+        }
+        return std::make_unique<Texture2D>(writer.finish(), treatment.edges);
+    };
+    return impl_->keep(impl_->textures2D, source, space, treatment.key(), make);
 }
 
 HostTexture1D const* TextureStore::load1D(std::filesystem::path const& file, ColorSpace space)
 {
-    return impl_->keep(impl_->textures1D, file, space, "", [&](PictureFile& picture) {
-        std::vector<Vec4f> ramp;
-        picture.readLinear([&](int y, Vec4f const* texels) {
-            if (y == picture.height() / 2)
-                ramp.assign(texels, texels + picture.width());
-        });
-        return std::make_unique<Texture1D>(std::move(ramp));
-    });
+    return impl_->keep(impl_->textures1D, PictureSource{file}, space, "",
+                       [&](PictureFile& picture) {
+                           std::vector<Vec4f> ramp;
+                           picture.readLinear([&](int y, Vec4f const* texels) {
+                               if (y == picture.height() / 2)
+                                   ramp.assign(texels, texels + picture.width());
+                           });
+                           return std::make_unique<Texture1D>(std::move(ramp));
+                       });
 }
 
 HostTextureCube const* TextureStore::loadCube(std::filesystem::path const& file, ColorSpace space,
                                               float blur)
 {
-    return impl_->keep(impl_->cubes, file, space, std::to_string(blur), [&](PictureFile& picture) {
-        return std::make_unique<TextureCube>(blurShows(blur, picture.width())
-                                                 ? blurredCube(picture, blur, impl_->memory)
-                                                 : sharpCube(picture, impl_->memory));
-    });
+    return impl_->keep(
+        impl_->cubes, PictureSource{file}, space, std::to_string(blur), [&](PictureFile& picture) {
+            return std::make_unique<TextureCube>(blurShows(blur, picture.width())
+                                                     ? blurredCube(picture, blur, impl_->memory)
+                                                     : sharpCube(picture, impl_->memory));
+        });
 }
 
 HostTextureCube const* TextureStore::loadIrradiance(std::filesystem::path const& file,

@@ -3,6 +3,7 @@
 #pragma once
 
 #include "texture/pictureFile.h"
+#include "texture/pictureTreatment.h"
 
 #include <filesystem>
 #include <memory>
@@ -34,7 +35,13 @@ public:
 
     /// v runs upwards: (0, 0) is the lower left corner of the picture. Wraps periodically; reads
     /// smaller levels under a TextureFootprint.
-    HostTexture2D const* load2D(std::filesystem::path const& file, ColorSpace space);
+    HostTexture2D const* load2D(std::filesystem::path const& file, ColorSpace space)
+    {
+        return load2D(PictureSource{file}, space, {});
+    }
+    /// The same of what `treatment` makes of it.
+    HostTexture2D const* load2D(PictureSource const& source, ColorSpace space,
+                                PictureTreatment const& treatment);
     /// A ramp along u at the middle row; clamps.
     HostTexture1D const* load1D(std::filesystem::path const& file, ColorSpace space);
     /// An environment from a latitude-longitude picture; the cube's y axis is up. `blur` is the

@@ -11,7 +11,13 @@
 namespace zsi::host {
 namespace {
 
-int wrapped(int i, int n) { return i < 0 ? i + n : i >= n ? i - n : i; }
+/// One step past an edge.
+int beyond(int i, int n, bool clamp)
+{
+    if (i >= 0 && i < n) [[likely]]
+        return i;
+    return (i < 0) == clamp ? 0 : n - 1;
+}
 
 } // namespace
 
@@ -47,10 +53,10 @@ Vec4f TiledPicture::bilinear(Level const& level, float s, float t) const
     float const y = t * static_cast<float>(level.height) - 0.5f;
     float const left = std::floor(x), top = std::floor(y);
     float const fx = x - left, fy = y - top;
-    int const x0 = wrapped(static_cast<int>(left), level.width);
-    int const x1 = wrapped(static_cast<int>(left) + 1, level.width);
-    int const y0 = wrapped(static_cast<int>(top), level.height);
-    int const y1 = wrapped(static_cast<int>(top) + 1, level.height);
+    int const x0 = beyond(static_cast<int>(left), level.width, clampAcross_);
+    int const x1 = beyond(static_cast<int>(left) + 1, level.width, clampAcross_);
+    int const y0 = beyond(static_cast<int>(top), level.height, clampDown_);
+    int const y1 = beyond(static_cast<int>(top) + 1, level.height, clampDown_);
     Vec4f const above = texel(level, x0, y0) * (1.0f - fx) + texel(level, x1, y0) * fx;
     Vec4f const below = texel(level, x0, y1) * (1.0f - fx) + texel(level, x1, y1) * fx;
     return above * (1.0f - fy) + below * fy;

@@ -27,11 +27,18 @@ public:
     /// at its other end. 0 <= x < width.
     void addFour(Level const& level, int x, int y, float const* weights, float scale,
                  Vec4f& sum) const;
-    /// Between texel centres; the picture repeats. s, t in [0, 1], t from the top.
+    /// Between texel centres; past an edge, what is at the other one, or at this one where that is
+    /// chosen. s, t in [0, 1], t from the top.
     Vec4f bilinear(Level const& level, float s, float t) const;
     /// The same over a blend of the two levels whose texels are next to `width`, of which 1 is the
     /// picture. Up to the size of a texel it is `bilinear` of level 0.
     Vec4f filtered(float width, float s, float t) const;
+
+    void clampEdges(bool across, bool down)
+    {
+        clampAcross_ = across;
+        clampDown_ = down;
+    }
 
 private:
     friend class TiledPictureWriter;
@@ -52,6 +59,7 @@ private:
     std::size_t texelBytes_;
     std::vector<Level> levels_;
     std::unique_ptr<TileBlock> block_;
+    bool clampAcross_ = false, clampDown_ = false;
 };
 
 /// Makes a picture from its rows from the top. Levels are means over area, of linear values.

@@ -2,7 +2,7 @@
 /// A scene's JSON while it is edited: the one truth of a session, with its past.
 #pragma once
 
-#include "load/jsonTree.h"
+#include "json/jsonTree.h"
 
 #include <nlohmann/json.hpp>
 #include <optional>

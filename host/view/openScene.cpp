@@ -4,50 +4,40 @@
 #include "base/error.h"
 #include "load/assignment.h"
 #include "load/sceneFile.h"
+#include "model/stage.h"
+#include "json/jsonText.h"
 
 namespace zsi::view {
 namespace {
 
-/// A ball, a tile and a floor under soft boxes, as the gallery's stage but without files.
-constexpr char kStage[] = R"({
-  "camera": {"position": [0, -7.4, 2.3], "target": [0, 0, 0.85], "fov": 23},
-  "film": {"width": 960, "height": 640},
-  "settings": {"samples": 256, "integrator": "path", "sampleClamp": 6},
+/// A ball and a tile, in the order in which they stand before the floor.
+constexpr char kSubjects[] = R"({
   "meshes": {
     "ball": {"sphere": {"radius": 0.95, "segments": 192}},
-    "tile": {"box": {"size": [0.9, 0.08, 0.9]}},
-    "floor": {"plane": {"size": 40}},
-    "wall": {"plane": {"size": [40, 20]}}
-  },
-  "materials": {
-    "floor": {"class": "corvid_Mtl_Ward",
-      "parameters": {"u_additionalColor": [0, 0, 0], "u_diffuseColor": [0.35, 0.355, 0.365],
-                     "u_brdf00Reflectivity": 0.0, "u_brdf90Reflectivity": 0.0,
-                     "usingRaytracedAO": false}}
+    "tile": {"box": {"size": [0.9, 0.08, 0.9]}}
   },
   "instances": {
     "ball": {"mesh": "ball", "material": "subject", "transform": {"translate": [-0.55, 0, 0.95]}},
     "tile": {"mesh": "tile", "material": "subject",
-             "transform": {"rotate": [[1, 0, 0, -14], [0, 0, 1, -18]], "translate": [1.1, -0.1, 0.45]}},
-    "floor": {"mesh": "floor", "material": "floor"},
-    "wall": {"mesh": "wall", "material": "floor",
-             "transform": {"rotate": [1, 0, 0, 90], "translate": [0, 9, 0]}}
-  },
-  "lights": {
-    "key": {"kind": "rectangle", "position": [-4.2, -4, 4.6], "target": [-0.2, 0, 0.8], "size": [2.6, 3],
-            "emission": [10, 9.7, 9.3]},
-    "top": {"kind": "rectangle", "position": [0.4, 0.2, 6], "target": [0.2, 0, 0.6], "size": [3.6, 2.4],
-            "emission": [3.2, 3.25, 3.3]},
-    "rim": {"kind": "rectangle", "position": [4.2, 2.6, 3], "target": [0, 0, 1], "size": [0.7, 4.2],
-            "emission": [13, 13.4, 14]},
-    "front": {"kind": "rectangle", "position": [-4.6, -9, 3.4], "target": [0.4, 0, 0.6], "size": [5, 4],
-              "emission": [0.75, 0.76, 0.8]}
+             "transform": {"rotate": [[1, 0, 0, -14], [0, 0, 1, -18]], "translate": [1.1, -0.1, 0.45]}}
   }
 })";
 
+host::JsonValue stageWithSubjects(std::filesystem::path const& file)
+{
+    host::JsonValue scene = host::stage({}, {});
+    host::JsonValue const subjects = host::parseJson(kSubjects, file);
+    for (host::JsonMember& section : scene.members)
+        if (host::JsonValue const* const own = subjects.find(section.key))
+            section.value.members.insert(section.value.members.begin(), own->members.begin(),
+                                         own->members.end());
+    host::setOrigin(scene, file);
+    return scene;
+}
+
 host::JsonValue stageFor(host::Shader const& shader, std::filesystem::path const& file)
 {
-    host::JsonValue scene = host::parseJson(kStage, file);
+    host::JsonValue scene = stageWithSubjects(file);
     auto const set = [&](std::string const& assignment) {
         host::assign(scene, assignment, file.string());
     };
@@ -90,7 +80,7 @@ OpenedScene openScene(std::string const& argument, host::ShaderSource const& sha
     if (opened.isFile) {
         if (argument == "-")
             throw host::InputError("-: expected a scene file or a shader class");
-        opened.document = host::readSceneFile(argument, assignments);
+        opened.document = host::readSceneFile(argument, assignments, &opened.warnings);
         opened.file = argument;
         return opened;
     }

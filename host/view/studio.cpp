@@ -31,7 +31,8 @@ Studio::Studio(OpenedScene const& opened, host::ShaderSource const& shaders, Stu
     , live_(opened.document, opened.file, shaders, {})
     , preview_(live_)
 {
-    warnings_ = live_.scene().warnings;
+    warnings_ = opened.warnings;
+    warnings_.insert(warnings_.end(), live_.scene().warnings.begin(), live_.scene().warnings.end());
     for (std::string const& omission : live_.session().omissions())
         warnings_.push_back(live_.scene().file + ": " + omission);
     host::screenTransform(host::screenView(live_.scene().film)); // refuses an unknown view

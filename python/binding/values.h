@@ -3,7 +3,7 @@
 /// is read, checked and complained of as in a file.
 #pragma once
 
-#include "load/jsonReader.h"
+#include "json/jsonReader.h"
 #include "plugin/shader.h"
 
 #include <pybind11/numpy.h>

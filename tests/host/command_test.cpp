@@ -282,7 +282,7 @@ TEST_F(Command, BadCallsEndInOneLineAndLeaveNothing)
     };
     std::string const render = "render scene.json -o a.png ";
     Call const calls[] = {
-        {"", 2, {"info, render, view, denoise, schema"}},
+        {"", 2, {"info, render, view, convert, denoise, schema"}},
         {"view absent.json", 1, {"absent.json"}},
         {"view scene.json --bind nowhere", 1, {"cannot listen on nowhere"}},
         {"rendr scene.json", 2, {"rendr", "did you mean render?"}},

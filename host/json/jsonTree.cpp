@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "load/jsonTree.h"
+#include "json/jsonTree.h"
 
 #include "base/error.h"
 #include "base/names.h"

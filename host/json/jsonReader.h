@@ -2,7 +2,7 @@
 /// Typed, checked access to the values of a JSON tree.
 #pragma once
 
-#include "load/jsonTree.h"
+#include "json/jsonTree.h"
 
 #include <array>
 #include <limits>

@@ -1,5 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
-#include "load/jsonReader.h"
+#include "json/jsonReader.h"
 
 #include "base/error.h"
 #include "base/names.h"
