@@ -98,7 +98,10 @@ Vec3f PathIntegrator::directLight(ShadingContext::Call& call)
 
 bool PathIntegrator::scatter(PathRay& ray, SurfacePoint const& surface, Path& path)
 {
-    if (context_.scene().materialOf(surface).showsMore && passes(ray, surface, path))
+    PreparedMaterial const& material = context_.scene().materialOf(surface);
+    bool const isFront = dot(ray.direction, surface.Ng) <= 0.0f;
+    if ((isFront ? material.showsMoreInFront : material.showsMoreBehind)
+        && passes(ray, surface, path))
         return true;
     PathRay next = ray;
     {
@@ -163,6 +166,7 @@ bool PathIntegrator::draw(PathRay& ray, ShadingContext::Call& call, Path& path)
     if (maxComponent(path.throughput * weight) <= 0.0f || !isFinite(state.sampleDirection)
         || !(dot(state.sampleDirection, state.sampleDirection) > 0.0f))
         return false;
+    float const density = maxComponent(state.outBrdf) * state.sampleCosine;
     path.weigh(weight, ray);
 
     if (state.sampleType == kSampleStraight && state.sampleDirection == state.I) {
@@ -178,12 +182,11 @@ bool PathIntegrator::draw(PathRay& ray, ShadingContext::Call& call, Path& path)
     ray.depth += 1;
     ray.type = kRayReflection;
     ray.scatteredAt = call.surface.P;
-    // Lights have been asked for where `transfer` tells what `sample` draws.
+    // Lights have been asked for where `sample` tells the value that `transfer` has.
     bool const shares = state.sampleType == kSampleMixture
         && (context_.scene().lights().hasSurfaces()
             || !context_.scene().sky(kRayReflection).isEmpty());
-    ray.lobeDensity = ray.skyDensity =
-        shares ? context_.lobeDensity(ray.direction) : std::numeric_limits<float>::infinity();
+    ray.lobeDensity = ray.skyDensity = shares ? density : std::numeric_limits<float>::infinity();
     path.open = 0.0f;
     path.bends += 1;
     ShadingContext::changeMedia(ray, arrived, call.surface,

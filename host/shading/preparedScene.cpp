@@ -109,13 +109,18 @@ void PreparedScene::examineMaterials()
         }
         using Asked = ShadingContext::Asked;
         material.mixes = findings.mixes;
-        material.continuesPaths =
-            findings.mixes && !(findings.emits && !(findings.asked & Asked::kIndirect));
+        unsigned const asked = findings.front.asked | findings.back.asked;
+        bool const emits = findings.front.emits || findings.back.emits;
+        material.continuesPaths = findings.mixes && !(emits && !(asked & Asked::kIndirect));
         material.transmits = findings.transmits;
-        material.occludesLights = findings.asked & Asked::kOcclusion;
+        material.occludesLights = asked & Asked::kOcclusion;
         bool const hasAmbient = !(scene_.settings.ambient == Vec3f(0, 0, 0));
-        material.showsMore = findings.emits || ((findings.asked & Asked::kAmbient) && hasAmbient)
-            || (!findings.transmits && (findings.asked & (Asked::kStraight | Asked::kBeyond)));
+        auto const showsMore = [&](ShadingContext::Findings::Side const& side) {
+            return side.emits || ((side.asked & Asked::kAmbient) && hasAmbient)
+                || (!findings.transmits && (side.asked & (Asked::kStraight | Asked::kBeyond)));
+        };
+        material.showsMoreInFront = showsMore(findings.front);
+        material.showsMoreBehind = showsMore(findings.back);
 
         material.ofGathered = material.ofOthers = {};
         if (!material.mixes || !environment())

@@ -43,8 +43,9 @@ struct PreparedMaterial {
     bool continuesPaths = false;
     /// Its samples go through the surface too: what lies behind is theirs, not `shade`'s alone.
     bool transmits = false;
-    /// `shade` shows more than `sample` and `transfer` stand for (ShadingContext::shadeBeside).
-    bool showsMore = false;
+    /// `shade` shows more than `sample` and `transfer` stand for (ShadingContext::shadeBeside),
+    /// where the face looks at the viewer, and away.
+    bool showsMoreInFront = false, showsMoreBehind = false;
     /// `shade` darkens the light of lights by occlusion.
     bool occludesLights = false;
 

@@ -172,8 +172,12 @@ public:
     ShadeState trialRecord(PreparedMaterial const& material, std::uint32_t rayType);
     /// What a material's entry points turn out to do.
     struct Findings {
-        bool mixes = false, transmits = false, emits = false;
-        unsigned asked = 0; ///< of Asked
+        bool mixes = false, transmits = false;
+        struct Side {
+            bool emits = false;
+            unsigned asked = 0; ///< of Asked
+        };
+        Side front, back; ///< where the face looks at the viewer, and away
     };
     /// Calls the material's entry points at a place of its own choice; adds to `findings`.
     void examine(PreparedMaterial const& material, Findings& findings);
@@ -289,12 +293,10 @@ Vec3f ShadingContext::fromSky(std::uint32_t rayType, Value const& value, Density
     Vec3f const sent = value(d);
     if (!(maxComponent(sent) > 0.0f))
         return {0, 0, 0};
-    Vec3f const light = sky(rayType, d);
-    if (!(maxComponent(light) > 0.0f))
-        return {0, 0, 0};
-    ++rays_.shadow;
+    ++rays_.shadow; // directions of the map are bright: what is in the way is asked for first
     if (scene_.rays().occluded({shadowStart(call_->surface.P, d), d}, Visibility::All))
         return {0, 0, 0};
+    Vec3f const light = sky(rayType, d);
     Vec3f const brought = finite(sent * light / (drawn + density(d)));
     arrived_.all += brought;
     arrived_.parts.environment += brought;
