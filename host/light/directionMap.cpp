@@ -2,6 +2,7 @@
 #include "light/directionMap.h"
 
 #include "base/grid.h"
+#include "sampling/directions.h"
 
 #include <algorithm>
 #include <cmath>
@@ -125,7 +126,7 @@ float DirectionMap::density(Vec3f d) const
 {
     if (isEmpty())
         return 0.0f;
-    float const turn = std::atan2(d.y, d.x) / (2 * kPi);
+    float const turn = angleOf(d.y, d.x) / (2 * kPi);
     return cellDensity(clampedIndex((1.0f - d.z) * 0.5f * kHeight, kHeight),
                        clampedIndex((turn < 0.0f ? turn + 1.0f : turn) * kWidth, kWidth));
 }

@@ -11,8 +11,7 @@ constexpr std::uint32_t reverseBits(std::uint32_t x)
     x = ((x >> 1) & 0x55555555u) | ((x & 0x55555555u) << 1);
     x = ((x >> 2) & 0x33333333u) | ((x & 0x33333333u) << 2);
     x = ((x >> 4) & 0x0f0f0f0fu) | ((x & 0x0f0f0f0fu) << 4);
-    x = ((x >> 8) & 0x00ff00ffu) | ((x & 0x00ff00ffu) << 8);
-    return (x >> 16) | (x << 16);
+    return __builtin_bswap32(x);
 }
 
 /// Second Sobol dimension with its bits reversed; the first is the index itself. The matrix is
@@ -48,7 +47,7 @@ constexpr std::uint32_t shuffled(std::uint32_t index, std::uint32_t seed)
 /// A Sobol number with its bits reversed, scrambled as nested intervals are.
 float scrambled(std::uint32_t reversed, std::uint32_t seed)
 {
-    return toUnitFloat(reverseBits(permuteUpwards(reversed, hash32(seed))));
+    return toUnitFloat(reverseBits(permuteUpwards(reversed, seed)));
 }
 
 constexpr std::uint32_t kFirst = 0x68bc21ebu, kSecond = 0x02e5be93u, kPixels = 0x967a889bu;
@@ -129,14 +128,17 @@ void Sampler::start(std::uint32_t index)
 Sampler::Pair Sampler::nextPair()
 {
     std::uint32_t const dimension = dimension_++;
+    auto const made = [](std::uint32_t seed, std::uint32_t pixelX, std::uint32_t pixelY) -> Pair {
+        return {seed, hash32(seed ^ kFirst), hash32(seed ^ kSecond), pixelX, pixelY};
+    };
     if (dimension >= kShared)
-        return {hashCombine(pixelSeed_, dimension), 0, 0};
+        return made(hashCombine(pixelSeed_, dimension), 0, 0);
     Pair& pair = shared_[dimension];
     if (!(known_ >> dimension & 1u)) {
         known_ |= 1u << dimension;
         std::uint32_t const seed = hashCombine(seed_, dimension);
         std::uint32_t const place = shuffled(pixel_, seed ^ kPixels);
-        pair = {seed, digitsAt0(place), digitsAt1(place)};
+        pair = made(seed, digitsAt0(place), digitsAt1(place));
     }
     return pair;
 }
@@ -144,7 +146,7 @@ Sampler::Pair Sampler::nextPair()
 float Sampler::next()
 {
     Pair const pair = nextPair();
-    return scrambled(shuffled(index_, pair.seed) ^ pair.pixelX, pair.seed ^ kFirst);
+    return scrambled(shuffled(index_, pair.shuffle) ^ pair.pixelX, pair.scrambleX);
 }
 
 Vec2f Sampler::next2D() { return next2D(1)[0]; }
@@ -156,9 +158,9 @@ Sampler::Points Sampler::next2D(int count)
 
 Vec2f Sampler::Points::operator[](int i) const
 {
-    std::uint32_t const index = shuffled(first_ + static_cast<std::uint32_t>(i), pair_.seed);
-    return {scrambled(index ^ pair_.pixelX, pair_.seed ^ kFirst),
-            scrambled(sobolSecond(index) ^ pair_.pixelY, pair_.seed ^ kSecond)};
+    std::uint32_t const index = shuffled(first_ + static_cast<std::uint32_t>(i), pair_.shuffle);
+    return {scrambled(index ^ pair_.pixelX, pair_.scrambleX),
+            scrambled(sobolSecond(index) ^ pair_.pixelY, pair_.scrambleY)};
 }
 
 } // namespace zsi::host

@@ -21,7 +21,7 @@ namespace zsi::host {
 class Sampler {
     /// What sets the points of one dimension pair apart.
     struct Pair {
-        std::uint32_t seed; ///< of shuffling and scrambling
+        std::uint32_t shuffle, scrambleX, scrambleY; ///< seeds
         std::uint32_t pixelX, pixelY; ///< digits that the pixel adds to those of its samples
     };
 

@@ -1,6 +1,7 @@
 // SPDX-License-Identifier: Apache-2.0
 #include "texture/latLong.h"
 
+#include "sampling/directions.h"
 #include "texture/areaShares.h"
 
 #include <algorithm>
@@ -21,15 +22,17 @@ struct SplineWeights {
     explicit SplineWeights(float t)
     {
         float const s = 1.0f - t, t2 = t * t, t3 = t2 * t;
-        w[0] = s * s * s / 6.0f;
-        w[1] = (3.0f * t3 - 6.0f * t2 + 4.0f) / 6.0f;
-        w[2] = (-3.0f * t3 + 3.0f * t2 + 3.0f * t + 1.0f) / 6.0f;
-        w[3] = t3 / 6.0f;
+        w[0] = s * s * s * (1.0f / 6);
+        w[1] = (0.5f * t - 1.0f) * t2 + 2.0f / 3;
+        w[2] = ((1.0f - t) * t + 1.0f) * t * 0.5f + 1.0f / 6;
+        w[3] = t3 * (1.0f / 6);
     }
 };
 
 int wrapped(int i, int n)
 {
+    if (i >= 0 && i < n)
+        return i;
     int const r = i % n;
     return r < 0 ? r + n : r;
 }
@@ -60,12 +63,12 @@ Vec4f lookupLatLong(TiledPicture const& picture, Vec3f d)
     float const largest = maxOf(std::fabs(d.x), maxOf(std::fabs(d.y), std::fabs(d.z)));
     d = largest > 0.0f ? d / largest : Vec3f(0, 1, 0);
     float const across = std::sqrt(d.x * d.x + d.z * d.z);
-    float const column = (0.5f + std::atan2(d.x, -d.z) / (2.0f * kPi)) * static_cast<float>(width);
-    float const row = std::atan2(across, d.y) / kPi * static_cast<float>(height);
+    float const column = (0.5f + angleOf(d.x, -d.z) * (0.5f / kPi)) * static_cast<float>(width);
+    float const row = angleOf(across, d.y) * (1.0f / kPi) * static_cast<float>(height);
 
     float const left = std::floor(column - 0.5f), top = std::floor(row - 0.5f);
     SplineWeights const wx(column - 0.5f - left), wy(row - 0.5f - top);
-    Vec4f sum{0, 0, 0, 0};
+    TiledPicture::Place rows[4];
     for (int j = 0; j < 4; ++j) {
         int y = static_cast<int>(top) - 1 + j;
         int x = static_cast<int>(left) - 1;
@@ -74,10 +77,9 @@ Vec4f lookupLatLong(TiledPicture const& picture, Vec3f d)
             y = y < 0 ? -1 - y : 2 * height - 1 - y;
             x += width / 2;
         }
-        y = std::clamp(y, 0, height - 1);
-        picture.addFour(level, wrapped(x, width), y, wx.w, wy.w[j], sum);
+        rows[j] = {wrapped(x, width), std::clamp(y, 0, height - 1)};
     }
-    return sum;
+    return picture.sumOfBlock(level, rows, wx.w, wy.w);
 }
 
 void evenOutRow(Vec4f* row, int y, int width, int height)

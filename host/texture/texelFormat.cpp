@@ -3,10 +3,10 @@
 
 #include <OpenImageIO/half.h>
 #include <algorithm>
-#include <bit>
 #include <cmath>
 #include <cstdint>
 #include <cstring>
+#include <emmintrin.h>
 #include <vector>
 #include <zsi/vecmath.h>
 
@@ -56,14 +56,69 @@ float valueOf(std::uint8_t code) { return static_cast<float>(code) * (1.0f / 255
 float valueOf(std::uint16_t code) { return static_cast<float>(code) * (1.0f / 65535.0f); }
 float valueOf(half code) { return code; }
 
-/// The value of a finite half by arithmetic, for many at a time: a table of all is larger than the
-/// nearest cache.
-float valueOfFinite(std::uint16_t bits)
+/// The values of four finite halves, in the lower 16 bits of each part, by arithmetic: a table of
+/// all is larger than the nearest cache.
+__m128 valuesOfFinite(__m128i bits)
 {
-    std::uint32_t const rest = bits & 0x7fffu;
-    float const normal = std::bit_cast<float>((rest << 13) + (112u << 23));
-    float const tiny = static_cast<float>(static_cast<std::int32_t>(rest)) * 0x1p-24f;
-    return std::copysign(rest < 0x400u ? tiny : normal, (bits & 0x8000u) ? -1.0f : 1.0f);
+    __m128i const rest = _mm_and_si128(bits, _mm_set1_epi32(0x7fff));
+    __m128i const sign = _mm_slli_epi32(_mm_xor_si128(bits, rest), 16);
+    __m128i const normal = _mm_add_epi32(_mm_slli_epi32(rest, 13), _mm_set1_epi32(112 << 23));
+    __m128 const tiny = _mm_mul_ps(_mm_cvtepi32_ps(rest), _mm_set1_ps(0x1p-24f));
+    __m128i const isTiny = _mm_cmplt_epi32(rest, _mm_set1_epi32(0x400));
+    __m128i const value = _mm_or_si128(_mm_and_si128(isTiny, _mm_castps_si128(tiny)),
+                                       _mm_andnot_si128(isTiny, normal));
+    return _mm_castsi128_ps(_mm_or_si128(value, sign));
+}
+
+/// Of finite halves, three for a texel: twelve values of a row are three vectors, whose parts are
+/// told apart when all rows are added up.
+Vec4f sumOfRgb(std::byte const* const* rows, float const* across, float const* down)
+{
+    __m128i const zero = _mm_setzero_si128();
+    __m128 sums[3] = {};
+    for (int j = 0; j < 4; ++j) {
+        auto const eight = _mm_loadu_si128(reinterpret_cast<__m128i const*>(rows[j]));
+        auto const four = _mm_loadl_epi64(reinterpret_cast<__m128i const*>(rows[j] + 16));
+        __m128i const bits[3] = {_mm_unpacklo_epi16(eight, zero), _mm_unpackhi_epi16(eight, zero),
+                                 _mm_unpacklo_epi16(four, zero)};
+        __m128 const weight = _mm_set1_ps(down[j]);
+        for (int i = 0; i < 3; ++i)
+            sums[i] = _mm_add_ps(sums[i], _mm_mul_ps(valuesOfFinite(bits[i]), weight));
+    }
+    alignas(16) float v[12];
+    for (int i = 0; i < 3; ++i)
+        _mm_store_ps(v + 4 * i, sums[i]);
+    auto const channel = [&](int c) {
+        return v[c] * across[0] + v[c + 3] * across[1] + v[c + 6] * across[2]
+            + v[c + 9] * across[3];
+    };
+    float const all =
+        (across[0] + across[1] + across[2] + across[3]) * (down[0] + down[1] + down[2] + down[3]);
+    return {channel(0), channel(1), channel(2), all};
+}
+
+/// The same with four for a texel: a vector each.
+Vec4f sumOfRgba(std::byte const* const* rows, float const* across, float const* down)
+{
+    __m128i const zero = _mm_setzero_si128();
+    __m128 sums[4] = {};
+    for (int j = 0; j < 4; ++j)
+        for (int i = 0; i < 2; ++i) {
+            auto const two = _mm_loadu_si128(reinterpret_cast<__m128i const*>(rows[j] + 16 * i));
+            __m128 const weight = _mm_set1_ps(down[j]);
+            __m128& first = sums[2 * i];
+            __m128& second = sums[2 * i + 1];
+            first = _mm_add_ps(first,
+                               _mm_mul_ps(valuesOfFinite(_mm_unpacklo_epi16(two, zero)), weight));
+            second = _mm_add_ps(second,
+                                _mm_mul_ps(valuesOfFinite(_mm_unpackhi_epi16(two, zero)), weight));
+        }
+    __m128 sum = _mm_setzero_ps();
+    for (int i = 0; i < 4; ++i)
+        sum = _mm_add_ps(sum, _mm_mul_ps(sums[i], _mm_set1_ps(across[i])));
+    alignas(16) float v[4];
+    _mm_store_ps(v, sum);
+    return {v[0], v[1], v[2], v[3]};
 }
 
 template <class T>
@@ -153,31 +208,18 @@ Vec4f TexelCodec::readAs(TexelCodec const& codec, std::byte const* texel)
 }
 
 template <class T, int Channels>
-void TexelCodec::addFourAs(TexelCodec const& codec, std::byte const* texels, float const* weights,
-                           float scale, Vec4f& sum)
+Vec4f TexelCodec::sumOfBlockAs(TexelCodec const& codec, std::byte const* const* rows,
+                               float const* across, float const* down)
 {
-    auto const add = [&](Vec4f const& texel, float weight) {
-        sum.x += texel.x * weight;
-        sum.y += texel.y * weight;
-        sum.z += texel.z * weight;
-        sum.w += texel.w * weight;
-    };
     if constexpr (std::is_same_v<T, half> && Channels >= 3)
-        if (!codec.format_.srgb) {
-            std::uint16_t bits[4 * Channels];
-            std::memcpy(bits, texels, sizeof bits);
-            float v[4 * Channels];
-            for (int i = 0; i < 4 * Channels; ++i)
-                v[i] = valueOfFinite(bits[i]);
-            for (int i = 0; i < 4; ++i) {
-                float const* const texel = v + i * Channels;
-                add({texel[0], texel[1], texel[2], Channels == 4 ? texel[Channels - 1] : 1.0f},
-                    weights[i] * scale);
-            }
-            return;
-        }
-    for (std::size_t i = 0; i < 4; ++i)
-        add(readAs<T, Channels>(codec, texels + i * codec.format_.bytes()), weights[i] * scale);
+        if (!codec.format_.srgb)
+            return Channels == 3 ? sumOfRgb(rows, across, down) : sumOfRgba(rows, across, down);
+    constexpr std::size_t kBytes = sizeof(T) * Channels;
+    Vec4f sum{0, 0, 0, 0};
+    for (std::size_t j = 0; j < 4; ++j)
+        for (std::size_t i = 0; i < 4; ++i)
+            sum = sum + readAs<T, Channels>(codec, rows[j] + i * kBytes) * (across[i] * down[j]);
+    return sum;
 }
 
 TexelCodec::TexelCodec(TexelFormat const& format)
@@ -187,9 +229,9 @@ TexelCodec::TexelCodec(TexelFormat const& format)
         Vec4f (*const readers[])(TexelCodec const&, std::byte const*) = {
             readAs<T, 1>, readAs<T, 2>, readAs<T, 3>, readAs<T, 4>};
         read_ = readers[format.channels - 1];
-        void (*const adders[])(TexelCodec const&, std::byte const*, float const*, float, Vec4f&) = {
-            addFourAs<T, 1>, addFourAs<T, 2>, addFourAs<T, 3>, addFourAs<T, 4>};
-        addFour_ = adders[format.channels - 1];
+        decltype(sumOfBlock_) const blocks[] = {sumOfBlockAs<T, 1>, sumOfBlockAs<T, 2>,
+                                                sumOfBlockAs<T, 3>, sumOfBlockAs<T, 4>};
+        sumOfBlock_ = blocks[format.channels - 1];
         if constexpr (!std::is_same_v<T, float>)
             for (std::size_t c = 0; c < values_.size(); ++c)
                 values_[c] = tableOf<T>(isEncoded(c));

@@ -29,10 +29,10 @@ public:
 
     /// RGBA: grey is repeated, alpha is 1 where there is none.
     Vec4f read(std::byte const* texel) const { return read_(*this, texel); }
-    /// Adds four texels side by side to `sum`, each times its weight and `scale`.
-    void addFour(std::byte const* texels, float const* weights, float scale, Vec4f& sum) const
+    /// Four rows of four texels side by side, each times its weights: `across[column] down[row]`.
+    Vec4f sumOfBlock(std::byte const* const* rows, float const* across, float const* down) const
     {
-        addFour_(*this, texels, weights, scale, sum);
+        return sumOfBlock_(*this, rows, across, down);
     }
     /// A row of texels to `channels` values for each.
     void decode(std::byte const* texels, std::size_t count, float* values) const;
@@ -45,8 +45,8 @@ private:
     template <class T, int Channels>
     static Vec4f readAs(TexelCodec const& codec, std::byte const* texel);
     template <class T, int Channels>
-    static void addFourAs(TexelCodec const& codec, std::byte const* texels, float const* weights,
-                          float scale, Vec4f& sum);
+    static Vec4f sumOfBlockAs(TexelCodec const& codec, std::byte const* const* rows,
+                              float const* across, float const* down);
     template <class T>
     void decodeAs(std::byte const* texels, std::size_t count, float* values) const;
 
@@ -57,7 +57,7 @@ private:
 
     TexelFormat format_;
     Vec4f (*read_)(TexelCodec const&, std::byte const*);
-    void (*addFour_)(TexelCodec const&, std::byte const*, float const*, float, Vec4f&);
+    Vec4f (*sumOfBlock_)(TexelCodec const&, std::byte const* const*, float const*, float const*);
     std::array<float const*, 4> values_{}; ///< of each channel: linear values of all codes
 };
 

@@ -37,14 +37,25 @@ TiledPicture::TiledPicture(TexelFormat const& format, int width, int height, boo
     block_ = memory.allocate(size);
 }
 
-void TiledPicture::addFour(Level const& level, int x, int y, float const* weights, float scale,
-                           Vec4f& sum) const
+Vec4f TiledPicture::sumOfBlock(Level const& level, Place const* rows, float const* across,
+                               float const* down) const
 {
-    // A row of a tile is in memory side by side.
-    if ((static_cast<std::size_t>(x) & kTileMask) + 3 < kTile && x + 3 < level.width)
-        return codec_.addFour(at(level, x, y), weights, scale, sum);
-    for (int i = 0; i < 4; ++i)
-        sum = sum + texel(level, (x + i) % level.width, y) * (weights[i] * scale);
+    constexpr std::size_t kLargestTexel = 16;
+    std::byte copies[4][4 * kLargestTexel];
+    std::byte const* texels[4];
+    for (int j = 0; j < 4; ++j) {
+        auto const [x, y] = rows[j];
+        // A row of a tile is in memory side by side.
+        if ((static_cast<std::size_t>(x) & kTileMask) + 3 < kTile && x + 3 < level.width) {
+            texels[j] = at(level, x, y);
+            continue;
+        }
+        for (int i = 0; i < 4; ++i)
+            std::memcpy(copies[j] + static_cast<std::size_t>(i) * texelBytes_,
+                        at(level, (x + i) % level.width, y), texelBytes_);
+        texels[j] = copies[j];
+    }
+    return codec_.sumOfBlock(texels, across, down);
 }
 
 Vec4f TiledPicture::bilinear(Level const& level, float s, float t) const

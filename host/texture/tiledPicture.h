@@ -23,10 +23,13 @@ public:
 
     /// Linear RGBA of a texel of `level`; 0 <= x < width, 0 <= y < height.
     Vec4f texel(Level const& level, int x, int y) const { return codec_.read(at(level, x, y)); }
-    /// Adds the four texels from x on to `sum`, each times its weight and `scale`; the row goes on
-    /// at its other end. 0 <= x < width.
-    void addFour(Level const& level, int x, int y, float const* weights, float scale,
-                 Vec4f& sum) const;
+    struct Place {
+        int x, y;
+    };
+    /// The texels of four rows, four from each place on, times their weights, which are products of
+    /// one of the column and one of the row; a row goes on at its other end.
+    Vec4f sumOfBlock(Level const& level, Place const* rows, float const* across,
+                     float const* down) const;
     /// Between texel centres; past an edge, what is at the other one, or at this one where that is
     /// chosen. s, t in [0, 1], t from the top.
     Vec4f bilinear(Level const& level, float s, float t) const;
