@@ -109,7 +109,10 @@ char const* const kFormat = R"json({
     "box": {"type": "object", "additionalProperties": false,
             "properties": {"size": {"$ref": "#/$defs/size"}}},
     "plane": {"type": "object", "additionalProperties": false,
-              "properties": {"size": {"$ref": "#/$defs/size"}}}}},
+              "properties": {"size": {"$ref": "#/$defs/size"}}},
+    "sweep": {"type": "object", "additionalProperties": false,
+              "properties": {"size": {"$ref": "#/$defs/size"},
+                             "radius": {"type": "number", "exclusiveMinimum": 0}}}}},
   "instance": {"type": ["object", "null"], "additionalProperties": false, "properties": {
     "mesh": {"type": "string"},
     "material": {"type": ["string", "null"]},

@@ -60,19 +60,29 @@ Mesh readMeshFromFile(JsonReader const& reader, Scene& scene)
 
 Mesh readMesh(JsonReader const& reader, Scene& scene)
 {
-    std::vector<std::string> const kinds{"file", "sphere", "box", "plane"};
+    std::vector<std::string> const kinds{"file", "sphere", "box", "plane", "sweep"};
     if (!reader.isObject())
         reader.failExpected("an object");
     if (reader.find("file") && !reader.find("sphere") && !reader.find("box")
-        && !reader.find("plane"))
+        && !reader.find("plane") && !reader.find("sweep"))
         return readMeshFromFile(reader, scene);
-    reader.expectKeys({"sphere", "box", "plane", "file"});
+    reader.expectKeys({"sphere", "box", "plane", "sweep", "file"});
     JsonReader const shape = reader.onlyOf(kinds);
     if (reader.find("sphere")) {
         shape.expectKeys({"radius", "segments"});
         auto const radius = shape.find("radius"), segments = shape.find("segments");
         return sphereMesh(radius ? radius->toPositive() : 1.0f,
                           segments ? segments->toInt(3, kMostSegments) : 64);
+    }
+    if (reader.find("sweep")) {
+        shape.expectKeys({"size", "radius"});
+        std::vector<float> const s = readSize(shape, 3);
+        float const most = minOf(s[1], s[2]);
+        auto const radius = shape.find("radius");
+        float const r = radius ? radius->toPositive() : 0.5f * most;
+        if (r > most)
+            radius->failExpected("no more than the depth and the height");
+        return sweepMesh({s[0], s[1], s[2]}, r);
     }
     shape.expectKeys({"size"});
     if (reader.find("box")) {

@@ -88,6 +88,32 @@ Mesh planeMesh(Vec2f size)
     return mesh;
 }
 
+Mesh sweepMesh(Vec3f size, float radius)
+{
+    constexpr int kArc = 64; // pieces
+    constexpr float kQuarter = 1.57079633f;
+    float const width = size.x, end = 0.5f * size.y;
+    float const floor = size.y - radius, arc = kQuarter * radius, wall = size.z - radius;
+    Mesh mesh;
+    auto const add = [&](Vec3f at, Vec3f normal, float along) {
+        for (float const side : {-0.5f, 0.5f})
+            addVertex(mesh, {side * width, at.y, at.z}, normal, {1, 0, 0},
+                      {side + 0.5f, along / (floor + arc + wall)});
+    };
+    add({0, -end, 0}, {0, 0, 1}, 0);
+    for (int i = 0; i <= kArc; ++i) {
+        float const share = static_cast<float>(i) / kArc;
+        float const s = std::sin(kQuarter * share), c = std::cos(kQuarter * share);
+        add({0, end - radius * (1 - s), radius * (1 - c)}, {0, -s, c}, floor + arc * share);
+    }
+    add({0, end, size.z}, {0, -1, 0}, floor + arc + wall);
+    for (std::uint32_t i = 0; i + 2 < mesh.positions.size(); i += 2) {
+        mesh.triangles.push_back({i, i + 1, i + 3});
+        mesh.triangles.push_back({i, i + 3, i + 2});
+    }
+    return mesh;
+}
+
 Mesh discMesh(float radius)
 {
     constexpr std::uint32_t kCorners = 128;

@@ -17,6 +17,12 @@ Mesh boxMesh(Vec3f size);
 /// A rectangle in the xy plane around the origin, facing +z; u along +x, v along +y.
 Mesh planeMesh(Vec2f size);
 
+/// A floor that bends up into a wall, as behind a photographer's table: the floor in the xy plane
+/// around the origin, facing +z; at its end towards +y an arc of this radius, and the wall above
+/// it. size: width along x, depth along y, height; 0 < radius <= depth and height. u along +x, v
+/// along the bend from the floor's front to the wall's top.
+Mesh sweepMesh(Vec3f size, float radius);
+
 /// A disc in the xy plane around the origin, facing +z, of 128 corners and the area of the circle.
 Mesh discMesh(float radius);
 

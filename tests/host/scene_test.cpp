@@ -356,7 +356,9 @@ TEST(Mesh, ShapesAreClosedFaceOutwardsAndRunWithUv)
     };
     Shape shapes[] = {{sphereMesh(2, 96), 4.0 / 3 * kPi * 8},
                       {boxMesh({1, 2, 3}), 6.0},
-                      {planeMesh({2, 3}), 0.0}};
+                      {planeMesh({2, 3}), 0.0},
+                      // Wall, arc and its centre at (2, 1) seen from the origin.
+                      {sweepMesh({4, 6, 3}, 1), -4.0 / 3 * (3 * 2 + (2 - 1) + kPi / 2)}};
     for (Shape const& shape : shapes) {
         expectComplete(shape.mesh);
         double volume = 0; // by the divergence theorem
@@ -365,7 +367,7 @@ TEST(Mesh, ShapesAreClosedFaceOutwardsAndRunWithUv)
             volume += static_cast<double>(dot(p[t[0]], cross(p[t[1]], p[t[2]]))) / 6;
             EXPECT_GT(dot(faceNormal(shape.mesh, t), shape.mesh.normals[t[0]]), 0.9f);
         }
-        EXPECT_NEAR(volume, shape.volume, 0.01 * shape.volume + 1e-6);
+        EXPECT_NEAR(volume, shape.volume, 0.01 * std::fabs(shape.volume) + 1e-6);
         // Tangents made anew from uv must be those of the shape, poles included.
         Mesh again = shape.mesh;
         again.tangents.clear();
