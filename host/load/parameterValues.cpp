@@ -8,6 +8,7 @@
 
 #include <algorithm>
 #include <fmt/format.h>
+#include <zsi/vecmath.h>
 
 namespace zsi::host {
 
@@ -74,9 +75,18 @@ std::array<EdgeMode, 2> readEdges(JsonReader const& reader)
     return {mode(both[0]), mode(both[1])};
 }
 
-PictureTreatment readTreatment(JsonReader const& reader)
+HostTexture2D const* readTexture2D(JsonReader const& reader, TextureStore& textures);
+
+Vec3f readKnot(JsonReader const& reader)
+{
+    return reader.kind() == JsonValue::Kind::Array ? reader.toVec3f() : grey(reader.toFloat());
+}
+
+PictureTreatment readTreatment(JsonReader const& reader, TextureStore& textures)
 {
     PictureTreatment treatment;
+    if (auto const v = reader.find("from"))
+        treatment.fromNormals = v->toChoice({"values", "normals"}) == 1;
     if (auto const v = reader.find("channel"))
         treatment.channel = static_cast<int>(v->toChoice({"r", "g", "b", "a"}));
     if (auto const v = reader.find("factor")) {
@@ -91,9 +101,13 @@ PictureTreatment readTreatment(JsonReader const& reader)
         treatment.power = v->toPositive();
     if (auto const v = reader.find("curve"))
         for (JsonReader const& knot : v->items())
-            treatment.curve.push_back(knot.toFloat());
+            treatment.curve.push_back(readKnot(knot));
     if (auto const v = reader.find("threshold"))
         treatment.threshold = v->toFloat(0);
+    if (auto const v = reader.find("weight"))
+        treatment.weight = readTexture2D(*v, textures);
+    if (auto const v = reader.find("ground"))
+        treatment.ground = v->toFloat();
     if (auto const v = reader.find("wrap"))
         treatment.edges = readEdges(*v);
     return treatment;
@@ -103,10 +117,10 @@ HostTexture2D const* readTexture2D(JsonReader const& reader, TextureStore& textu
 {
     if (!reader.isObject())
         reader.failExpected("{\"texture\": file, \"colorSpace\": ...}");
-    reader.expectKeys({"texture", "colorSpace", "image", "channel", "factor", "power", "curve",
-                       "threshold", "wrap"});
+    reader.expectKeys({"texture", "colorSpace", "image", "from", "channel", "factor", "power",
+                       "curve", "threshold", "weight", "ground", "wrap"});
     ColorSpace const space = readColorSpace(reader);
-    PictureTreatment const treatment = readTreatment(reader);
+    PictureTreatment const treatment = readTreatment(reader, textures);
     return loaded(reader.at("texture"), [&](auto const& file) {
         return textures.load2D(sourceOf(reader, file), space, treatment);
     });

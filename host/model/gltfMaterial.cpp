@@ -58,6 +58,10 @@ private:
             return ward();
         if (metal >= 0.5f)
             return hasCoat() ? coatedMetal() : bareMetal();
+        if (s_.normal && hasCoat())
+            leftOut("bumps below a clear coat are left out");
+        else if (s_.normal)
+            return ward();
         bool const hasTint = !isWhite(s_.specularColor.factor) || s_.specularColor.texture;
         return hasTint || reflected() == 0.0f ? ward() : paint();
     }
@@ -94,6 +98,7 @@ private:
                 jsonShort(Vec3f(decades(kept.x), decades(kept.y), decades(kept.z))));
             set("u_falloffEnable", jsonOf(true));
         }
+        bump("u_normal0", "u_normal0MapEnable");
         return "corvid_Mtl_Dielectric";
     }
 
@@ -104,7 +109,12 @@ private:
         set("u_rough", jsonShort(maxOf(width * width, 0.0001f)));
         if (s_.roughness.factor > 0.2f)
             leftOut("a thin pane is clear; the roughness of what lies behind it is left out");
-        tint("u_refractColor");
+        if (s_.base.texture)
+            map("u_transmittance", *s_.base.texture, Values::Colors, factorOf(s_.base.factor),
+                "u_transmittanceTransform");
+        set("u_refractColor", jsonShort(meanColor()));
+        if (s_.normal)
+            leftOut("bumps of thin panes are left out");
         return "corvid_Mtl_Glazing";
     }
 
@@ -114,6 +124,7 @@ private:
         set("u_edgeColor", jsonOf(Vec3f(1, 1, 1)));
         if (!anisotropic())
             rough("u_rough", s_.roughness, 1.0f);
+        bump("u_pattern", "u_patternEnable");
         return "corvid_Mtl_Metal";
     }
 
@@ -173,14 +184,16 @@ private:
         rough("u_coatRough", roughness, kWidestCoat);
     }
 
-    /// Metal or not by texel, with light of its own, with a tinted highlight.
+    /// Metal or not by texel, bumps, light of its own, a tinted highlight.
     char const* ward()
     {
         if (hasCoat())
-            leftOut("clear coat beside emission or metal by picture is left out");
-        float const metal = s_.metallic.factor * meanOfPicture(s_.metallic);
-        bool const isMetal = metal >= 0.5f;
-        if (isMetal) {
+            leftOut("a clear coat beside emission, bumps or metal in places is left out");
+        bool const isMetal = s_.metallic.factor * meanOfPicture(s_.metallic) >= 0.5f;
+        set("u_brdfCurvePower", jsonOf(5));
+        if (isMixed()) {
+            mixedLayers();
+        } else if (isMetal) {
             set("u_diffuseColor", jsonOf(Vec3f(0, 0, 0)));
             color("u_specular", s_.base);
             set("u_brdf00Reflectivity", jsonOf(1));
@@ -191,15 +204,84 @@ private:
             set("u_brdf00Reflectivity", jsonShort(reflected()));
             set("u_brdf90Reflectivity", jsonOf(reflected() > 0.0f ? 1 : 0));
         }
-        set("u_brdfCurvePower", jsonOf(5));
-        float const roughness = s_.roughness.factor * meanOfPicture(s_.roughness);
-        set("u_roughValue", jsonShort(widthOf(roughness)));
-        set("u_reflectGlossyValue", jsonShort(minOf(roughness * roughness, 1.0f)));
-        if (s_.roughness.texture)
-            leftOut("the picture of the roughness beside emission or metal by picture is left out; "
-                    "its mean counts");
+        wardRoughness();
+        bump("u_normal0", "u_normal0MapEnable");
+        if (s_.normal) // for diffuse light too
+            for (char const* const row : {"u_normal1AsShadingNormal", "u_cosineUsesBump"})
+                set(row, jsonOf(true));
         added(s_.emission);
         return "corvid_Mtl_Ward";
+    }
+
+    /// By the share m of metal: diffuse base (1 - m), highlight of colour 1 - m + base m and of
+    /// reflectance at normal incidence F0 (1 - m) + m.
+    void mixedLayers()
+    {
+        GltfTexture const& metal = *s_.metallic.texture;
+        JsonMember const channel = channelOf(s_.metallic.channel);
+        JsonMember const factor{"factor", jsonOf(s_.metallic.factor)};
+        auto const along = [&](JsonValue none, JsonValue whole) {
+            return std::vector<JsonMember>{
+                channel, factor, {"curve", jsonArray({std::move(none), std::move(whole)})}};
+        };
+        Vec3f const black(0, 0, 0), white(1, 1, 1);
+        set("u_brdf90Reflectivity", jsonOf(1));
+        map("u_brdf00Reflect", metal, Values::Numbers, along(jsonShort(reflected()), jsonOf(1)),
+            "u_brdf00ReflectTransform");
+        if (!s_.base.texture) {
+            map("u_diffuse", metal, Values::Numbers, along(jsonOf(s_.base.factor), jsonOf(black)),
+                "u_diffuseTransform");
+            map("u_specular", metal, Values::Numbers, along(jsonOf(white), jsonOf(s_.base.factor)),
+                "u_specularTransform");
+            return;
+        }
+        auto const base = [&](JsonValue share, float ground) {
+            std::vector<JsonMember> treatment = factorOf(s_.base.factor);
+            treatment.push_back({"weight", std::move(share)});
+            if (ground != 0.0f)
+                treatment.push_back({"ground", jsonOf(ground)});
+            return treatment;
+        };
+        map("u_diffuse", *s_.base.texture, Values::Colors,
+            base(pictures_.value(metal, Values::Numbers, along(jsonOf(1), jsonOf(0))), 0),
+            "u_diffuseTransform");
+        map("u_specular", *s_.base.texture, Values::Colors,
+            base(pictures_.value(metal, Values::Numbers, {channel, factor}), 1),
+            "u_specularTransform");
+    }
+
+    void wardRoughness()
+    {
+        float const roughness = s_.roughness.factor * meanOfPicture(s_.roughness);
+        set("u_reflectGlossyValue", jsonShort(minOf(roughness * roughness, 1.0f)));
+        if (!s_.roughness.texture)
+            return set("u_roughValue", jsonShort(widthOf(roughness)));
+        // The glossiness for which the class has the width r², at r = 0, 1/16 ... 1.
+        static constexpr float kGlossiness[] = {0.898f, 0.898f, 0.898f, 0.898f, 0.753f, 0.669f,
+                                                0.596f, 0.528f, 0.282f, 0.217f, 0.181f, 0.153f,
+                                                0.129f, 0.108f, 0.078f, 0.04f,  0.0f};
+        std::vector<JsonMember> treatment{channelOf(s_.roughness.channel)};
+        if (s_.roughness.factor != 1.0f)
+            treatment.push_back({"factor", jsonOf(s_.roughness.factor)});
+        treatment.push_back({"curve", jsonOf(std::span<float const>(kGlossiness))});
+        map("u_rough", *s_.roughness.texture, Values::Numbers, std::move(treatment),
+            "u_roughTransform");
+    }
+
+    /// A normal map as heights: PREFIXMap, its transform and its depth.
+    void bump(std::string const& prefix, char const* enable)
+    {
+        if (!s_.normal)
+            return;
+        // The classes add three channels of heights and take differences over 0.001 of the picture,
+        // times 3.33: with this, amount 1 gives the slopes of the map.
+        constexpr float kHeights = 1 / (3 * 3.33f * 0.001f);
+        set(enable, jsonOf(true));
+        set(prefix + "Map",
+            pictures_.value(*s_.normal, Values::Numbers,
+                            {{"from", jsonOf("normals")}, {"factor", jsonShort(kHeights)}}));
+        set(prefix + "Transform", transformValue(*s_.normal));
+        set(prefix + "Amount", jsonShort(s_.normalScale));
     }
 
     // Rows
@@ -253,9 +335,14 @@ private:
     /// Of what is let through, which has no picture.
     void tint(char const* name)
     {
-        set(name, jsonOf(s_.base.factor));
+        set(name, jsonShort(meanColor()));
         if (s_.base.texture)
-            leftOut("the picture of the base colour of what lets light through is left out");
+            leftOut("the picture of the base colour of glass is left out; its mean counts");
+    }
+    Vec3f meanColor()
+    {
+        return s_.base.texture ? pictures_.meanColor(*s_.base.texture) * s_.base.factor
+                               : s_.base.factor;
     }
 
     void added(GltfColor const& glow)

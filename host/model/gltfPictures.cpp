@@ -6,7 +6,7 @@
 
 #include <algorithm>
 #include <cctype>
-#include <cstring>
+#include <cmath>
 #include <fmt/format.h>
 
 namespace zsi::host {
@@ -25,12 +25,17 @@ std::string nameFrom(std::filesystem::path const& folder, std::filesystem::path 
     return relative.empty() ? whole.string() : relative.string();
 }
 
-PictureSource GltfPictures::source(std::size_t image) const
+std::filesystem::path GltfPictures::fileOf(GltfTexture const& texture) const
 {
-    if (std::filesystem::path const own = file_.imageFile(image); !own.empty())
+    return texture.ownFile.empty() ? file_->imageFile(texture.image) : texture.ownFile;
+}
+
+PictureSource GltfPictures::source(GltfTexture const& texture) const
+{
+    if (std::filesystem::path const own = fileOf(texture); !own.empty())
         return {own};
-    return {file_.file(), fmt::format("images[{}]", image),
-            [this, image] { return file_.imageBytes(image); }};
+    return {file_->file(), fmt::format("images[{}]", texture.image),
+            [this, image = texture.image] { return file_->imageBytes(image); }};
 }
 
 std::string GltfPictures::embeddedName(std::size_t image)
@@ -38,13 +43,13 @@ std::string GltfPictures::embeddedName(std::size_t image)
     auto const [name, isNew] = names_.try_emplace(image);
     if (!isNew)
         return name->second;
-    JsonReader const entry = file_.element("images", image);
+    JsonReader const entry = file_->element("images", image);
     auto const given = entry.find("name");
     std::string stem;
     for (char const c : given ? given->toString() : std::string())
         if (stem.size() < 40)
             stem += std::isalnum(static_cast<unsigned char>(c)) || c == '-' ? c : '_';
-    Bytes const bytes = file_.imageBytes(image);
+    Bytes const bytes = file_->imageBytes(image);
     std::string_view const ending = pictureEnding(bytes);
     if (ending.empty())
         entry.fail("expected PNG, JPEG or WebP");
@@ -58,12 +63,12 @@ JsonValue GltfPictures::value(GltfTexture const& texture, Values values,
                               std::vector<JsonMember> treatment)
 {
     std::vector<JsonMember> members;
-    if (std::filesystem::path const own = file_.imageFile(texture.image); !own.empty()) {
+    if (std::filesystem::path const own = fileOf(texture); !own.empty()) {
         members.push_back({"texture", jsonOf(nameFrom(places_.folder, own))});
     } else if (!places_.embedded.empty()) {
         members.push_back({"texture", jsonOf(embeddedName(texture.image))});
     } else {
-        members.push_back({"texture", jsonOf(nameFrom(places_.folder, file_.file()))});
+        members.push_back({"texture", jsonOf(nameFrom(places_.folder, file_->file()))});
         members.push_back({"image", jsonOf(static_cast<int>(texture.image))});
     }
     members.push_back({"colorSpace", jsonOf(values == Values::Colors ? "srgb" : "linear")});
@@ -74,12 +79,13 @@ JsonValue GltfPictures::value(GltfTexture const& texture, Values values,
     return jsonObject(std::move(members));
 }
 
-GltfPictures::Statistics const& GltfPictures::statistics(std::size_t image)
+GltfPictures::Statistics const& GltfPictures::statistics(GltfTexture const& texture)
 {
-    auto const [found, isNew] = statistics_.try_emplace(image);
+    PictureSource const from = source(texture);
+    auto const [found, isNew] = statistics_.try_emplace(from.name());
     if (!isNew)
         return found->second;
-    PictureFile picture(source(image), ColorSpace::Linear);
+    PictureFile picture(from, ColorSpace::Linear);
     for (auto& channel : found->second.histogram)
         channel.assign(kSteps, 0.0f);
     double const each = 1.0 / (double(picture.width()) * picture.height());
@@ -101,7 +107,7 @@ GltfPictures::Statistics const& GltfPictures::statistics(std::size_t image)
 
 float GltfPictures::shareAbove(GltfTexture const& texture, int channel, float least)
 {
-    auto const& histogram = statistics(texture.image).histogram[static_cast<std::size_t>(channel)];
+    auto const& histogram = statistics(texture).histogram[static_cast<std::size_t>(channel)];
     float share = 0;
     for (std::size_t i = 0; i < kSteps; ++i)
         if (static_cast<float>(i) / 255.0f >= least)
@@ -111,11 +117,25 @@ float GltfPictures::shareAbove(GltfTexture const& texture, int channel, float le
 
 float GltfPictures::mean(GltfTexture const& texture, int channel)
 {
-    auto const& histogram = statistics(texture.image).histogram[static_cast<std::size_t>(channel)];
+    auto const& histogram = statistics(texture).histogram[static_cast<std::size_t>(channel)];
     float mean = 0;
     for (std::size_t i = 0; i < kSteps; ++i)
         mean += histogram[i] * static_cast<float>(i) / 255.0f;
     return mean;
+}
+
+Vec3f GltfPictures::meanColor(GltfTexture const& texture)
+{
+    // The histograms are of codes: IEC 61966-2-1 makes them linear.
+    auto const linear = [](float c) {
+        return c <= 0.04045f ? c / 12.92f : std::pow((c + 0.055f) / 1.055f, 2.4f);
+    };
+    auto const& channels = statistics(texture).histogram;
+    std::array<float, 3> mean{};
+    for (std::size_t c = 0; c < 3; ++c)
+        for (std::size_t i = 0; i < kSteps; ++i)
+            mean[c] += channels[c][i] * linear(static_cast<float>(i) / 255.0f);
+    return {mean[0], mean[1], mean[2]};
 }
 
 JsonValue transformValue(GltfTexture const& texture)

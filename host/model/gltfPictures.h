@@ -20,8 +20,13 @@ struct PicturePlaces {
 
 class GltfPictures {
 public:
+    /// Of a model whose pictures are all files of their own.
+    explicit GltfPictures(PicturePlaces const& places)
+        : places_(places)
+    {
+    }
     GltfPictures(GltfFile const& file, PicturePlaces const& places)
-        : file_(file)
+        : file_(&file)
         , places_(places)
     {
     }
@@ -36,6 +41,9 @@ public:
     /// Mean of the channel, linear.
     float mean(GltfTexture const& texture, int channel);
 
+    /// Of an sRGB picture; linear.
+    Vec3f meanColor(GltfTexture const& texture);
+
     /// Names, below `folder`, of embedded pictures that values name, and their numbers.
     std::map<std::string, std::size_t> const& embedded() const { return embedded_; }
 
@@ -43,15 +51,16 @@ private:
     struct Statistics {
         std::array<std::vector<float>, 4> histogram; ///< shares of 256 steps of each channel
     };
-    Statistics const& statistics(std::size_t image);
-    PictureSource source(std::size_t image) const;
+    Statistics const& statistics(GltfTexture const& texture);
+    PictureSource source(GltfTexture const& texture) const;
+    std::filesystem::path fileOf(GltfTexture const& texture) const; ///< empty: embedded
     std::string embeddedName(std::size_t image);
 
-    GltfFile const& file_;
+    GltfFile const* file_ = nullptr;
     PicturePlaces const& places_;
     std::map<std::string, std::size_t> embedded_;
     std::map<std::size_t, std::string> names_;
-    std::map<std::size_t, Statistics> statistics_;
+    std::map<std::string, Statistics> statistics_; ///< by the picture's name
 };
 
 /// The rows of a transform of texture coordinates, for a Mat3f parameter.

@@ -10,7 +10,9 @@ namespace zsi::host {
 
 /// A picture of a material: glTF's "textureInfo".
 struct GltfTexture {
-    std::size_t image; ///< index
+    std::size_t image = 0; ///< index
+    std::filesystem::path ownFile =
+        {}; ///< not empty: of a model that is no glTF file, in its place
     int set = 0; ///< TEXCOORD_n
     Mat3f transform{1, 0, 0, 0, 1, 0, 0, 0, 1}; ///< of uv whose v runs upwards
     bool isTransformed = false;

@@ -3,10 +3,12 @@
 
 #include "base/activity.h"
 
+#include "texture/heightsOfNormals.h"
 #include "texture/latLong.h"
 #include "texture/textureFootprint.h"
 #include "texture/textureProbe.h"
 
+#include <algorithm>
 #include <cmath>
 #include <map>
 #include <system_error>
@@ -102,13 +104,52 @@ TexelFormat treatedFormat(PictureFile const& picture, PictureTreatment const& tr
     TexelFormat const& from = picture.format();
     TexelFormat format;
     bool const keeps = treatment.keepsValues() && !from.srgb;
-    format.type = keeps || from.type == TexelType::Float ? from.type : TexelType::Half;
-    bool const allAlike = treatment.channel >= 0
+    // Differences of heights side by side are small beside the heights.
+    format.type = treatment.fromNormals          ? TexelType::Float
+        : keeps || from.type == TexelType::Float ? from.type
+                                                 : TexelType::Half;
+    bool const isGrey =
+        std::ranges::all_of(treatment.curve, [](Vec3f c) { return c.x == c.y && c.y == c.z; });
+    bool const allAlike = (treatment.channel >= 0 || treatment.fromNormals) && isGrey
         && treatment.factor
             == std::array{treatment.factor[0], treatment.factor[0], treatment.factor[0],
                           treatment.factor[0]};
     format.channels = allAlike ? 1 : 4;
     return format;
+}
+
+void addTreatedRow(PictureFile const& picture, PictureTreatment const& treatment,
+                   TexelFormat const& format, int y, Vec4f const* texels,
+                   TiledPictureWriter& writer)
+{
+    std::vector<float> values;
+    float const v = 1.0f - (static_cast<float>(y) + 0.5f) / static_cast<float>(picture.height());
+    for (int x = 0; x < picture.width(); ++x) {
+        float const u = (static_cast<float>(x) + 0.5f) / static_cast<float>(picture.width());
+        Vec4f const made = treatment.applied(texels[x], {u, v});
+        float const channels[] = {made.x, made.y, made.z, made.w};
+        values.insert(values.end(), channels, channels + format.channels);
+    }
+    writer.addLinearRow(values.data());
+}
+
+void writeHeights(PictureFile& picture, PictureTreatment const& treatment,
+                  TexelFormat const& format, TiledPictureWriter& writer)
+{
+    std::vector<Vec3f> normals;
+    picture.readLinear([&](int, Vec4f const* texels) {
+        for (int x = 0; x < picture.width(); ++x)
+            normals.push_back(rgb(texels[x]));
+    });
+    std::vector<float> const heights = heightsOfNormals(normals, picture.width(), picture.height());
+    std::vector<Vec4f> row;
+    for (int y = 0; y < picture.height(); ++y) {
+        auto const first = heights.begin() + std::ptrdiff_t(y) * picture.width();
+        row.clear();
+        for (auto h = first; h != first + picture.width(); ++h)
+            row.emplace_back(*h, *h, *h, 1.0f);
+        addTreatedRow(picture, treatment, format, y, row.data(), writer);
+    }
 }
 
 /// Writes rows of an environment, evened out, as three or four channels.
@@ -220,23 +261,21 @@ HostTexture2D const* TextureStore::load2D(PictureSource const& source, ColorSpac
         bool const asItIs = treatment.channel < 0 && treatment.keepsValues();
         TexelFormat const format = asItIs ? picture.format() : treatedFormat(picture, treatment);
         TiledPictureWriter writer(format, picture.width(), picture.height(), true, impl_->memory);
-        if (asItIs) {
+        if (asItIs)
             picture.readRows([&](int, std::byte const* texels) { writer.addRow(texels); });
-        } else {
-            std::vector<float> values;
-            picture.readLinear([&](int, Vec4f const* texels) {
-                values.clear();
-                for (int x = 0; x < picture.width(); ++x) {
-                    Vec4f const v = treatment.applied(texels[x]);
-                    float const channels[] = {v.x, v.y, v.z, v.w};
-                    values.insert(values.end(), channels, channels + format.channels);
-                }
-                writer.addLinearRow(values.data());
+        else if (treatment.fromNormals)
+            writeHeights(picture, treatment, format, writer);
+        else
+            picture.readLinear([&](int y, Vec4f const* texels) {
+                addTreatedRow(picture, treatment, format, y, texels, writer);
             });
-        }
         return std::make_unique<Texture2D>(writer.finish(), treatment.edges);
     };
-    return impl_->keep(impl_->textures2D, source, space, treatment.key(), make);
+    PictureTreatment keyed = treatment;
+    if (treatment.weight)
+        keyed.weightKey =
+            origin(treatment.weight).file.string() + origin(treatment.weight).treatment;
+    return impl_->keep(impl_->textures2D, source, space, keyed.key(), make);
 }
 
 HostTexture1D const* TextureStore::load1D(std::filesystem::path const& file, ColorSpace space)

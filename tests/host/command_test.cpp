@@ -37,6 +37,23 @@ std::string content(fs::path const& file)
     return {std::istreambuf_iterator<char>(in), {}};
 }
 
+/// RFC 4648.
+std::string base64(std::string const& bytes)
+{
+    static char const* const kDigits =
+        "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
+    std::string text;
+    for (std::size_t i = 0; i < bytes.size(); i += 3) {
+        unsigned bits = 0;
+        for (std::size_t k = 0; k < 3; ++k)
+            bits =
+                bits << 8 | (i + k < bytes.size() ? static_cast<unsigned char>(bytes[i + k]) : 0u);
+        for (std::size_t k = 0; k < 4; ++k)
+            text += i + k <= bytes.size() ? kDigits[bits >> (18 - 6 * k) & 63] : '=';
+    }
+    return text;
+}
+
 /// Runs the command in a folder of its own that holds a scene.
 class Command : public testing::Test {
 protected:
@@ -139,6 +156,43 @@ TEST_F(Command, RendersTheSceneAndOptionsOverrideIt)
     host::writePicture(folder_.path / "want.exr", host::render(scene), {});
     EXPECT_TRUE(content(folder_.path / "c.exr") == content(folder_.path / "want.exr"));
     EXPECT_EQ(files().size(), before_.size() + 5) << "nothing but the pictures";
+}
+
+TEST_F(Command, AModelRendersAsTheSceneThatItConvertsTo)
+{
+    // A triangle whose picture lies in the file, in base64.
+    std::string const png = content(ZSI_SOURCE_DIR "/assets/textures/checker.png");
+    folder_.write("model.gltf",
+                  R"({"asset": {"version": "2.0"}, "scenes": [{"nodes": [0]}],
+      "nodes": [{"mesh": 0}], "materials": [{"pbrMetallicRoughness": {"metallicFactor": 0,
+        "baseColorFactor": [1, 0.5, 0.5, 1], "baseColorTexture": {"index": 0}},
+        "extensions": {"KHR_materials_sheen": {}}}],
+      "textures": [{"source": 0}], "images": [{"uri": "data:image/png;base64,)"
+                      + base64(png) + R"("}],
+      "meshes": [{"primitives": [{"attributes": {"POSITION": 0}, "material": 0}]}],
+      "accessors": [{"bufferView": 0, "componentType": 5121, "count": 3, "type": "VEC3"}],
+      "bufferViews": [{"buffer": 0, "byteLength": 9}],
+      "buffers": [{"byteLength": 9, "uri": "data:application/octet-stream;base64,AAAAAQAAAAEA"}]})");
+    std::string const small = " -o picture.png --quiet --size 30x20 --samples 2";
+    Result const direct = zsi("render model.gltf -o picture.png --size 30x20 --samples 2");
+    ASSERT_EQ(direct.status, 0) << direct.err;
+    EXPECT_EQ(
+        direct.err,
+        "zsi: warning: model.gltf: sheen has no counterpart and is left out (materials[0])\n");
+    std::string const picture = content(folder_.path / "picture.png");
+    fs::create_directory(folder_.path / "sub");
+    for (std::string const name : {"converted", "sub/converted"}) {
+        EXPECT_EQ(zsi("convert model.gltf " + name + ".json --quiet").err, "");
+        EXPECT_EQ(content(folder_.path / (name + "_pictures/0.png")), png);
+        fs::remove(folder_.path / "picture.png");
+        EXPECT_EQ(zsi("render " + name + ".json" + small).err, "");
+        EXPECT_EQ(content(folder_.path / "picture.png"), picture) << name;
+    }
+    EXPECT_EQ(zsi("render model.gltf" + small + " --set materials=null").status, 1);
+    expectContains(zsi("convert scene.json x.json").err, {"scene.json: expected a model"});
+    expectContains(zsi("convert model.gltf /no/such/x.json").err,
+                   {"/no/such/x.json: cannot be written"});
+    EXPECT_EQ(zsi("convert model.gltf x.txt").status, 2);
 }
 
 TEST_F(Command, DenoisesAfterRenderingOrLater)

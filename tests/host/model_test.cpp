@@ -6,6 +6,7 @@
 #include "support/hostLibraries.h"
 #include "support/inputError.h"
 #include "support/temporaryFolder.h"
+#include "texture/heightsOfNormals.h"
 #include "json/jsonReader.h"
 #include "json/jsonText.h"
 
@@ -197,6 +198,116 @@ TEST_F(Model, MaterialsBecomeTheNearestClass)
         expectContains(told(scene.find("materials")->find("M")), c.parts);
         EXPECT_EQ(errorOf([&] { loadScene(folder.path / "m.glb", libraries()); }), "no error");
     }
+}
+
+/// Pictures of 2 x 2 texels; text, rows from the top.
+TEST_F(Model, PicturesBecomeWhatTheClassesRead)
+{
+    // Left metal, right none; rough 0.5 everywhere (128 / 255); base colour a quarter below, 1
+    // above.
+    folder.write("orm.ppm", "P3 2 2 255  9 128 255  9 128 0  9 128 255  9 128 0");
+    folder.write("base.ppm", "P3 2 2 255  255 255 255  255 255 255  137 137 137  137 137 137");
+    Scene const scene = load(kBuffers + "," + kNodes + R"(,
+      "images": [{"uri": "orm.ppm"}, {"uri": "base.ppm"}], "textures": [{"source": 0}, {"source": 1}],
+      "meshes": [{"primitives": [{"attributes": {"POSITION": 0, "TEXCOORD_0": 1}, "material": 0}]}],
+      "materials": [{"pbrMetallicRoughness": {"baseColorFactor": [1, 0.5, 1, 1],
+        "baseColorTexture": {"index": 1}, "metallicRoughnessTexture": {"index": 0}}}])");
+    Shader const& ward = scene.materials[0];
+    ASSERT_EQ(ward.className(), "corvid_Mtl_Ward");
+    auto const seen = [&](char const* name, float u, float v) {
+        Vec2f const at(u, v);
+        Vec4f texel;
+        static_cast<TextureSampler2D const*>(ward.find(name)->field)->texture->lookup(&texel, &at);
+        return rgb(texel);
+    };
+    auto const near = [](Vec3f got, Vec3f want) {
+        EXPECT_LT(length(got - want), 0.004f) << got.x << ' ' << got.y << ' ' << got.z;
+    };
+    near(seen("u_diffuseMap", 0.25f, 0.75f), {0, 0, 0});
+    near(seen("u_diffuseMap", 0.75f, 0.75f), {1, 0.5f, 1});
+    near(seen("u_diffuseMap", 0.75f, 0.25f), {0.25f, 0.125f, 0.25f});
+    near(seen("u_specularMap", 0.25f, 0.25f), {0.25f, 0.125f, 0.25f});
+    near(seen("u_specularMap", 0.75f, 0.25f), {1, 1, 1});
+    near(seen("u_brdf00ReflectMap", 0.25f, 0.75f), {1, 1, 1});
+    near(seen("u_brdf00ReflectMap", 0.75f, 0.75f), grey(0.04f));
+    // The class's width for this glossiness is 0.25: 1 - 0.282 goes through its cubic.
+    float const x = 1 - seen("u_roughMap", 0.5f, 0.5f).x;
+    EXPECT_NEAR(((24.1745f * x - 45.6128f) * x + 28.605f) * x - 5.72202f, 0.25f, 0.005f);
+}
+
+TEST_F(Model, SamplersTransformsAndCutoffsAreThoseOfTheFile)
+{
+    folder.write("base.ppm", "P3 2 2 255  255 0 0  0 255 0  0 0 255  255 255 255");
+    Scene const scene = load(kBuffers + "," + kNodes + R"(,
+      "images": [{"uri": "base.ppm"}],
+      "samplers": [{"wrapS": 33071, "wrapT": 33648}],
+      "textures": [{"source": 0, "sampler": 0}],
+      "meshes": [{"primitives": [{"attributes": {"POSITION": 0, "TEXCOORD_0": 1}, "material": 0}]}],
+      "materials": [{"alphaMode": "MASK", "alphaCutoff": 0.5,
+        "pbrMetallicRoughness": {"metallicFactor": 0, "baseColorFactor": [1, 1, 1, 0.4],
+        "baseColorTexture": {"index": 0, "extensions": {"KHR_texture_transform":
+          {"offset": [0.25, 0], "rotation": 1.5707963, "scale": [2, 1]}}}}}])");
+    Shader const& paint = scene.materials[0];
+    auto const lookup = [&](char const* name, Vec2f at) {
+        Vec4f texel;
+        static_cast<TextureSampler2D const*>(paint.find(name)->field)->texture->lookup(&texel, &at);
+        return rgb(texel);
+    };
+    expectNear(lookup("u_baseMap", {-7, 0.25f}), {0, 0, 1}); // stops at the left
+    expectNear(lookup("u_baseMap", {9, 0.25f}), {1, 1, 1});
+    expectNear(lookup("u_baseMap", {0, 1.25f}), {1, 0, 0}); // the upper row again
+    expectNear(lookup("u_baseMap", {0, 1.75f}), {0, 0, 1});
+    EXPECT_EQ(lookup("maskingTexture", {0.5f, 0.5f}).x, 0.0f) << "0.4 is below the cutoff";
+    // Downwards (u, w): scaled to (2u, w), turned counterclockwise to (w, -2u), moved to (w + 0.25,
+    // -2u). Upwards w = 1 - v: (1.25 - v, 1 + 2u).
+    Vec2f const at =
+        transformUv(*static_cast<Mat3f const*>(paint.find("u_baseTransform")->field), {0.1f, 0.3f});
+    EXPECT_NEAR(at.x, 0.95f, 1e-6f);
+    EXPECT_NEAR(at.y, 1.2f, 1e-6f);
+}
+
+TEST(NormalMap, HeightsHaveItsSlopes)
+{
+    // z = a sin(2 pi (2 u + v)), v upwards, over 64 x 32 texels.
+    constexpr int kWidth = 64, kHeight = 32;
+    constexpr float kA = 0.02f, kTurn = 6.2831853f;
+    std::vector<Vec3f> normals;
+    std::vector<float> want;
+    for (int y = 0; y < kHeight; ++y)
+        for (int x = 0; x < kWidth; ++x) {
+            float const phase = kTurn
+                * (2 * (static_cast<float>(x) + 0.5f) / kWidth + 1
+                   - (static_cast<float>(y) + 0.5f) / kHeight);
+            float const slope = kA * kTurn * std::cos(phase);
+            Vec3f const n = normalize(Vec3f(-2 * slope, -slope, 1));
+            normals.push_back(n * 0.5f + Vec3f(0.5f, 0.5f, 0.5f));
+            want.push_back(kA * std::sin(phase));
+        }
+    std::vector<float> const heights = heightsOfNormals(normals, kWidth, kHeight);
+    for (std::size_t i = 0; i < want.size(); ++i)
+        ASSERT_NEAR(heights[i], want[i], 1e-4f * kA) << i;
+}
+
+TEST_F(Model, ObjFilesBringTheirMaterials)
+{
+    folder.write("a.mtl",
+                 "newmtl red\nKd 1 0 0\nNs 30\nnewmtl tin\nKd .5 .5 .5\nPm 1\nPr 0.5\n"
+                 "newmtl unused\nmap_Kd no.png\n");
+    fs::path const file = folder.write(
+        "a.obj",
+        "mtllib a.mtl\nv 0 0 0\nv 1 0 0\nv 0 1 0\nusemtl red\nf 1 2 3\nusemtl tin\nf 3 2 1\n"
+        "usemtl lost\nf 1 3 2\n");
+    Scene const scene = loadScene(file, libraries());
+    ASSERT_GE(scene.materials.size(), 3u);
+    EXPECT_EQ(scene.materialNames[0] + scene.materialNames[1] + scene.materialNames[2],
+              "redtinplain");
+    // An exponent of 30: the width is the root of 2 / 32.
+    EXPECT_NEAR(*static_cast<float const*>(scene.materials[0].find("u_coatRoughValue")->field),
+                0.25f, 1e-4f);
+    EXPECT_EQ(scene.materials[1].className(), "corvid_Mtl_Metal");
+    expectNear(placed(scene, 0, 2), {0, 0, 1}); // y is up
+    fs::remove(folder.path / "a.mtl");
+    expectContains(loadScene(file, libraries()).warnings.at(0), {"a.obj: ", "not there", "a.mtl"});
 }
 
 TEST_F(Model, LightsAndTheCameraKeepTheirUnits)
