@@ -11,8 +11,8 @@ import "../controls/number";
 import "../controls/texture";
 import "../controls/transform";
 
-/** What nearly every material has comes after what makes it what it is. */
-const kCommonGroups = ["ambient occlusion", "masking"];
+/** What nearly every material has, and what few use, come after what makes it what it is. */
+const kCommonGroups = ["bump", "ambient occlusion", "masking"];
 
 /** What numbers mean, where a row tells it: "-1 off, 0 constant, 1 UV". */
 export function choicesOf(row: Row): {value: number; name: string}[] {
