@@ -63,7 +63,8 @@ private:
         else if (s_.normal)
             return ward();
         bool const hasTint = !isWhite(s_.specularColor.factor) || s_.specularColor.texture;
-        return hasTint || reflected() == 0.0f ? ward() : paint();
+        bool const isPlain = !hasTint && reflected() > 0.0f;
+        return isPlain || hasCoat() ? paint() : ward(); // the coat is the paint's only highlight
     }
 
     // Classes
@@ -165,16 +166,21 @@ private:
 
     char const* paint()
     {
-        color("u_base", s_.base);
+        float const coat =
+            hasCoat() ? s_.coat.factor * meanOfPicture(s_.coat) * 0.04f : reflected();
+        // The class takes it as it is seen below the coat.
+        if (s_.base.texture) {
+            color("u_base", s_.base);
+            set("u_baseAmount", jsonShort(1.0f - coat));
+        } else {
+            set("u_baseColor", jsonShort(s_.base.factor * (1.0f - coat)));
+        }
         set("u_baseRoughValue", jsonOf(0));
         set("u_flakeDensity", jsonOf(0));
         set("u_pearlColor", jsonOf(std::array{1.0f, 1.0f, 1.0f, 0.0f}));
-        if (hasCoat()) {
+        if (hasCoat())
             leftOut("under its clear coat the surface has no highlight of its own");
-            coatOf(s_.coat.factor * meanOfPicture(s_.coat) * 0.04f, s_.coatRoughness);
-        } else {
-            coatOf(reflected(), s_.roughness);
-        }
+        coatOf(coat, hasCoat() ? s_.coatRoughness : s_.roughness);
         return "corvid_Mtl_MetallicPaint";
     }
 

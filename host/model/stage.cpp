@@ -14,21 +14,18 @@ namespace {
 constexpr char kStage[] = R"({
   "camera": {"position": [0, -7.4, 2.3], "target": [0, 0, 0.85], "fov": 23},
   "film": {"width": 960, "height": 640},
-  "settings": {"samples": 256, "integrator": "path", "sampleClamp": 6},
+  "settings": {"samples": 256, "integrator": "path", "sampleClamp": 3},
   "meshes": {
-    "floor": {"plane": {"size": [40, 40]}},
-    "wall": {"plane": {"size": [40, 20]}}
+    "ground": {"sweep": {"size": [60, 32, 24], "radius": 9}}
   },
   "materials": {
-    "floor": {"class": "corvid_Mtl_Ward",
+    "ground": {"class": "corvid_Mtl_Ward",
       "parameters": {"u_additionalColor": [0, 0, 0], "u_diffuseColor": [0.35, 0.355, 0.365],
                      "u_brdf00Reflectivity": 0.0, "u_brdf90Reflectivity": 0.0,
                      "usingRaytracedAO": false}}
   },
   "instances": {
-    "floor": {"mesh": "floor", "material": "floor", "transform": {"translate": [0, 0, 0]}},
-    "wall": {"mesh": "wall", "material": "floor",
-             "transform": {"rotate": [1, 0, 0, 90], "translate": [0, 9, 0]}}
+    "ground": {"mesh": "ground", "material": "ground", "transform": {"translate": [0, -5, 0]}}
   },
   "lights": {
     "key": {"kind": "rectangle", "position": [-4.2, -4, 4.6], "target": [-0.2, 0, 0.8], "size": [2.6, 3],
@@ -54,6 +51,8 @@ void place(JsonValue& tree, StagePlacing const& to)
         if (isPoint) {
             Vec3f const p = JsonReader(member.value).toVec3f() * to.scale;
             member.value = jsonShort(Vec3f(c * p.x - s * p.y, s * p.x + c * p.y, p.z) + to.at);
+        } else if (member.key == "radius") {
+            member.value = jsonShort(static_cast<float>(member.value.number) * to.scale);
         } else if (member.key == "size") {
             for (JsonValue& side : member.value.items)
                 side = jsonShort(static_cast<float>(side.number) * to.scale);

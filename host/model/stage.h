@@ -20,9 +20,10 @@ struct StagePlacing {
     Vec3f at{0, 0, 0};
 };
 
-/// A scene with film, settings and what `parts` names: a floor and a wall behind (named "floor" and
-/// "wall", of material "floor"), soft boxes ("key", "top", "rim", "front") and a dim ceiling. What
-/// stands in it is about 2.4 wide around (0, 0, 0.95), on z = 0; `placing` says where it is.
+/// A scene with film, settings and what `parts` names: a floor that bends up into a wall
+/// (named "ground", of material "ground"), soft boxes ("key", "top", "rim", "front") and a dim
+/// ceiling. What stands in it is about 2.4 wide around (0, 0, 0.95), on z = 0; `placing` says where
+/// it is.
 JsonValue stage(StagePlacing const& placing, StageParts const& parts);
 
 } // namespace zsi::host

@@ -60,9 +60,8 @@ host::JsonValue stageFor(host::Shader const& shader, std::filesystem::path const
         set(R"(materials.subject={"class": "corvid_Mtl_Mirror"})");
         set("materials.matt=" + plain);
         set("instances.tile.material=matt");
-        set("instances.floor=null");
-        set("instances.wall=null");
-        set("materials.floor=null");
+        set("instances.ground=null");
+        set("materials.ground=null");
         set("lights=null");
         set(R"(environment={"class": )" + quoted + R"(, "visible": true})");
     }

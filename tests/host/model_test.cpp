@@ -335,7 +335,7 @@ TEST_F(Model, LightsAndTheCameraKeepTheirUnits)
                    {R"("direction": [0, -1, 0])", R"("color": [1, 1, 1])"});
     expectContains(told(scene.find("camera")), {R"("position": [0, -5, 0])", R"("fov": 45)"});
     expectContains(told(scene.find("film")), {R"("width": 1280, "height": 640)"});
-    EXPECT_FALSE(scene.find("instances")->find("floor")) << "a model with both is a scene";
+    EXPECT_FALSE(scene.find("instances")->find("ground")) << "a model with both is a scene";
 }
 
 TEST_F(Model, TheCameraSeesAllOfIt)
