@@ -3,7 +3,7 @@
 
 #include "base/error.h"
 #include "load/transforms.h"
-#include "model/gltfFile.h"
+#include "model/gltfPictures.h"
 #include "texture/textureStore.h"
 
 #include <algorithm>
@@ -55,10 +55,7 @@ PictureSource sourceOf(JsonReader const& reader, std::filesystem::path const& fi
     if (!image)
         return {file};
     std::shared_ptr<GltfFile const> const model = GltfFile::open(file);
-    std::size_t const index = model->indexOf("images", *image);
-    if (std::filesystem::path const own = model->imageFile(index); !own.empty())
-        return {own};
-    return {file, fmt::format("images[{}]", index), [=] { return model->imageBytes(index); }};
+    return pictureSource(model, model->indexOf("images", *image));
 }
 
 std::array<EdgeMode, 2> readEdges(JsonReader const& reader)

@@ -17,7 +17,6 @@ namespace {
 
 namespace fs = std::filesystem;
 
-/// What a file may need: what is read, and what is left out with a word about it.
 constexpr std::string_view kKnownExtensions[] = {
     "EXT_mesh_gpu_instancing",
     "EXT_texture_webp",
@@ -28,6 +27,7 @@ constexpr std::string_view kKnownExtensions[] = {
     "KHR_materials_emissive_strength",
     "KHR_materials_ior",
     "KHR_materials_iridescence",
+    "KHR_materials_pbrSpecularGlossiness",
     "KHR_materials_sheen",
     "KHR_materials_specular",
     "KHR_materials_transmission",
@@ -90,10 +90,10 @@ std::optional<Bytes> fromBase64(std::string_view text)
 {
     static constexpr std::string_view kDigits =
         "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
-    std::array<signed char, 256> values{};
+    std::array<int, 256> values{};
     values.fill(-1);
     for (std::size_t i = 0; i < kDigits.size(); ++i)
-        values[static_cast<unsigned char>(kDigits[i])] = static_cast<signed char>(i);
+        values[static_cast<unsigned char>(kDigits[i])] = static_cast<int>(i);
     while (text.ends_with('='))
         text.remove_suffix(1);
     Bytes bytes;
@@ -161,6 +161,11 @@ std::uint64_t offsetOf(JsonReader const& reader)
 
 } // namespace
 
+bool isKnownExtension(std::string_view name)
+{
+    return std::ranges::find(kKnownExtensions, name) != std::end(kKnownExtensions);
+}
+
 GltfFile::GltfFile(fs::path const& file)
     : file_(file)
 {
@@ -198,7 +203,7 @@ GltfFile::GltfFile(fs::path const& file)
         version.failExpected("glTF of version 2");
     if (auto const required = root().find("extensionsRequired"))
         for (JsonReader const& name : required->items())
-            if (std::ranges::find(kKnownExtensions, name.toString()) == std::end(kKnownExtensions))
+            if (!isKnownExtension(name.toString()))
                 name.fail(fmt::format("the file needs the extension {}, which is not known here",
                                       printable(name.toString())));
 }

@@ -59,4 +59,7 @@ private:
     mutable std::map<std::string const*, Bytes> decoded_; ///< `data:` addresses
 };
 
+/// What files may need or use: what is read, and what is left out with a word of its own.
+bool isKnownExtension(std::string_view name);
+
 } // namespace zsi::host

@@ -224,6 +224,11 @@ private:
     void mixedLayers()
     {
         GltfTexture const& metal = *s_.metallic.texture;
+        if (s_.base.texture
+            && !std::equal(std::begin(metal.transform.m), std::end(metal.transform.m),
+                           std::begin(s_.base.texture->transform.m)))
+            leftOut("metal in places lies as the base colour's picture does; its own transform is "
+                    "left out");
         JsonMember const channel = channelOf(s_.metallic.channel);
         JsonMember const factor{"factor", jsonOf(s_.metallic.factor)};
         auto const along = [&](JsonValue none, JsonValue whole) {

@@ -25,6 +25,14 @@ std::string nameFrom(std::filesystem::path const& folder, std::filesystem::path 
     return relative.empty() ? whole.string() : relative.string();
 }
 
+PictureSource pictureSource(std::shared_ptr<GltfFile const> const& file, std::size_t index)
+{
+    if (std::filesystem::path const own = file->imageFile(index); !own.empty())
+        return {own};
+    return {file->file(), fmt::format("images[{}]", index),
+            [=] { return file->imageBytes(index); }};
+}
+
 std::filesystem::path GltfPictures::fileOf(GltfTexture const& texture) const
 {
     return texture.ownFile.empty() ? file_->imageFile(texture.image) : texture.ownFile;
@@ -32,10 +40,8 @@ std::filesystem::path GltfPictures::fileOf(GltfTexture const& texture) const
 
 PictureSource GltfPictures::source(GltfTexture const& texture) const
 {
-    if (std::filesystem::path const own = fileOf(texture); !own.empty())
-        return {own};
-    return {file_->file(), fmt::format("images[{}]", texture.image),
-            [this, image = texture.image] { return file_->imageBytes(image); }};
+    return texture.ownFile.empty() ? pictureSource(file_, texture.image)
+                                   : PictureSource{texture.ownFile};
 }
 
 std::string GltfPictures::embeddedName(std::size_t image)
@@ -96,7 +102,7 @@ GltfPictures::Statistics const& GltfPictures::statistics(GltfTexture const& text
         for (int x = 0; x < picture.width(); ++x) {
             float const values[] = {texels[x].x, texels[x].y, texels[x].z, texels[x].w};
             for (std::size_t c = 0; c < 4; ++c)
-                sums[c][static_cast<std::size_t>(clamp01(values[c]) * 255.0f + 0.5f)] += each;
+                sums[c][static_cast<std::size_t>(std::lround(clamp01(values[c]) * 255.0f))] += each;
         }
     });
     for (std::size_t c = 0; c < 4; ++c)

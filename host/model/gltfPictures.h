@@ -25,8 +25,8 @@ public:
         : places_(places)
     {
     }
-    GltfPictures(GltfFile const& file, PicturePlaces const& places)
-        : file_(&file)
+    GltfPictures(std::shared_ptr<GltfFile const> file, PicturePlaces const& places)
+        : file_(std::move(file))
         , places_(places)
     {
     }
@@ -56,12 +56,15 @@ private:
     std::filesystem::path fileOf(GltfTexture const& texture) const; ///< empty: embedded
     std::string embeddedName(std::size_t image);
 
-    GltfFile const* file_ = nullptr;
+    std::shared_ptr<GltfFile const> file_;
     PicturePlaces const& places_;
     std::map<std::string, std::size_t> embedded_;
     std::map<std::size_t, std::string> names_;
     std::map<std::string, Statistics> statistics_; ///< by the picture's name
 };
+
+/// Picture `index` of a glTF file: in it, or a file of its own.
+PictureSource pictureSource(std::shared_ptr<GltfFile const> const& file, std::size_t index);
 
 /// The rows of a transform of texture coordinates, for a Mat3f parameter.
 JsonValue transformValue(GltfTexture const& texture);

@@ -1,4 +1,5 @@
 // SPDX-License-Identifier: Apache-2.0
+#include "base/names.h"
 #include "model/gltfLights.h"
 #include "model/gltfMaterial.h"
 #include "model/gltfMesh.h"
@@ -13,8 +14,9 @@ namespace {
 /// Puts the parts together, node by node; meshes and materials that no node shows stay out.
 class Maker {
 public:
-    Maker(GltfFile const& file, PicturePlaces const& places, LeftOut& leftOut)
-        : file_(file)
+    Maker(std::shared_ptr<GltfFile const> const& file, PicturePlaces const& places,
+          LeftOut& leftOut)
+        : file_(*file)
         , places_(places)
         , leftOut_(leftOut)
         , pictures_(file, places)
@@ -161,6 +163,11 @@ private:
             leftOut_.add("skins are left out; meshes stand as they were bound");
         if (file_.count("animations") > 0)
             leftOut_.add("animations are left out");
+        if (auto const used = file_.root().find("extensionsUsed"))
+            for (JsonReader const& name : used->items())
+                if (!isKnownExtension(name.toString()))
+                    leftOut_.add(fmt::format("the extension {} is not known here and is left out",
+                                             printable(name.toString())));
         if (findPath(file_.root(), {"extensions", "KHR_materials_variants"}))
             leftOut_.add("variants of materials are left out");
     }
@@ -187,7 +194,7 @@ private:
 ModelParts gltfParts(std::filesystem::path const& file, PicturePlaces const& places,
                      LeftOut& leftOut)
 {
-    return Maker(*GltfFile::open(file), places, leftOut).made();
+    return Maker(GltfFile::open(file), places, leftOut).made();
 }
 
 } // namespace zsi::host

@@ -44,7 +44,7 @@ void makeRoom(JsonValue& scene, ModelParts const& parts)
     };
     auto const freeName = [&](std::string name) {
         while (isTaken(name))
-            name = "stage " + name;
+            name.insert(0, "stage ");
         return name;
     };
     for (char const* const kind : {"meshes", "materials", "instances", "lights"})

@@ -4,6 +4,7 @@
 #include "base/names.h"
 #include "film/imageFile.h"
 #include "lab/lab.h"
+#include "model/gltfPictures.h"
 #include "render/cameraRays.h"
 #include "render/render.h"
 #include "view/difference.h"
@@ -23,6 +24,19 @@ Json toJson(Vec3f const& v) { return {v.x, v.y, v.z}; }
 
 /// JSON has no NaN and no infinity.
 Json number(float v) { return std::isfinite(v) ? Json(v) : Json(fmt::format("{}", v)); }
+
+/// A picture's file, or the picture of a model that `image`, a number, says.
+host::PictureSource sourceOf(std::filesystem::path const& file, std::string const& image)
+{
+    if (image.empty())
+        return {file};
+    auto const model = host::GltfFile::open(file);
+    std::size_t index = 0;
+    std::from_chars(image.data(), image.data() + image.size(), index);
+    if (index >= model->count("images"))
+        throw host::InputError(fmt::format("{}: there is no images[{}]", file.string(), index));
+    return host::pictureSource(model, index);
+}
 
 /// White where the eye sees most, over yellow and red from black.
 ShownPicture heatPicture(std::vector<float> const& values, int width, int height)
@@ -252,8 +266,9 @@ std::function<Reply()> Studio::thumbnail(Query const& query) const
         throw host::InputError("thumbnail: which file?");
     int size = 96;
     std::from_chars(side.data(), side.data() + side.size(), size);
-    return [path = fileForPages(file), size = std::clamp(size, 16, 512)]() -> Reply {
-        return {200, "image/png", pngOf(thumbnailOf(path, size))};
+    std::string const image = valueOf(query, "image");
+    return [path = fileForPages(file), image, size = std::clamp(size, 16, 512)]() -> Reply {
+        return {200, "image/png", pngOf(thumbnailOf(sourceOf(path, image), size))};
     };
 }
 

@@ -11,11 +11,16 @@
 
 namespace zsi::view {
 
-ShownPicture thumbnailOf(std::filesystem::path const& file, int size)
+ShownPicture thumbnailOf(host::PictureSource const& source, int size)
 {
-    OIIO::ImageBuf picture(file.string());
+    std::vector<unsigned char> const bytes =
+        source.bytes ? source.bytes() : std::vector<unsigned char>();
+    OIIO::Filesystem::IOMemReader memory(bytes.data(), bytes.size());
+    std::string const name =
+        source.bytes ? "part" + std::string(host::pictureEnding(bytes)) : source.file.string();
+    OIIO::ImageBuf picture(name, 0, 0, nullptr, nullptr, source.bytes ? &memory : nullptr);
     if (!picture.read(0, 0, true, OIIO::TypeDesc::FLOAT))
-        throw host::InputError(file.string() + ": " + picture.geterror());
+        throw host::InputError(source.name() + ": " + picture.geterror());
     // Integers are signals of a screen already; floating-point numbers are light.
     bool const isLight =
         picture.file_format_name() == "openexr" || picture.file_format_name() == "hdr";
@@ -28,7 +33,7 @@ ShownPicture thumbnailOf(std::filesystem::path const& file, int size)
     OIIO::ImageBuf const small = OIIO::ImageBufAlgo::resize(
         picture, "box", 0.0f, OIIO::ROI(0, shown.width, 0, shown.height, 0, 1, 0, spec.nchannels));
     if (small.has_error())
-        throw host::InputError(file.string() + ": " + small.geterror());
+        throw host::InputError(source.name() + ": " + small.geterror());
     std::array<float, 4> pixel{};
     for (int y = 0; y < shown.height; ++y)
         for (int x = 0; x < shown.width; ++x) {

@@ -2,14 +2,13 @@
 /// Small pictures of texture files.
 #pragma once
 
+#include "texture/pictureFile.h"
 #include "view/display.h"
-
-#include <filesystem>
 
 namespace zsi::view {
 
 /// Its longer side has `size` pixels, or as many as the picture has. Throws InputError that names
 /// the file.
-ShownPicture thumbnailOf(std::filesystem::path const& file, int size);
+ShownPicture thumbnailOf(host::PictureSource const& source, int size);
 
 } // namespace zsi::view

@@ -1,5 +1,6 @@
 # SPDX-License-Identifier: Apache-2.0
 """A session of `zsi view` as pages and others meet it. view_test.py ZSI"""
+import base64
 import io
 import json
 import pathlib
@@ -160,6 +161,34 @@ class Session(unittest.TestCase):
         reloaded = Page(again)
         self.addCleanup(reloaded.close)
         self.assertEqual(reloaded.finished(), page.finished())
+
+    def test_a_model_is_edited_and_saved_as_a_scene(self):
+        def data(kind, content):
+            return f"data:{kind};base64," + base64.b64encode(content).decode()
+
+        (self.folder / "scenes" / "model.gltf").write_text(json.dumps({
+            "asset": {"version": "2.0"}, "scenes": [{"nodes": [0]}], "nodes": [{"mesh": 0}],
+            "materials": [{"name": "M", "extensions": {"KHR_materials_sheen": {}}, "pbrMetallicRoughness": {
+                "metallicFactor": 0, "baseColorTexture": {"index": 0}}}],
+            "textures": [{"source": 0}],
+            "images": [{"uri": data("image/png", (self.folder / "scenes" / "map.png").read_bytes())}],
+            "meshes": [{"primitives": [{"attributes": {"POSITION": 0}, "material": 0}]}],
+            "accessors": [{"bufferView": 0, "componentType": 5121, "count": 3, "type": "VEC3"}],
+            "bufferViews": [{"buffer": 0, "byteLength": 9}],
+            "buffers": [{"byteLength": 9, "uri": data("application/octet-stream", bytes([0, 0, 0, 1, 0, 0, 0, 1, 0]))}]}))
+        server = Server(ZSI, self.scene.with_name("model.gltf"))
+        self.addCleanup(server.kill)
+        shown = Image.open(io.BytesIO(server.file("thumbnail", file="model.gltf", image=0)))
+        self.assertEqual((shown.size, shown.convert("RGB").getpixel((0, 0))), ((8, 4), (200, 100, 50)))
+        page = Page(server)
+        self.addCleanup(page.close)
+        self.assertTrue(any("sheen" in warning for warning in page.until("scene")["warnings"]))
+        for path, value in [("film.width", 30), ("film.height", 20), ("settings.samples", 2),
+                            ("materials.M.parameters.u_coatRoughValue", 0.1)]:
+            self.edit(page, path, value)
+        page.send(type="save", path="edited.json")
+        page.until("saved")
+        self.assertEqual(rgb(page.finished()), self.rendered(self.scene.with_name("edited.json")))
 
     def test_strangers_are_turned_away(self):
         own = f"127.0.0.1:{self.server.port}"

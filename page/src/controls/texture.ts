@@ -24,10 +24,17 @@ export class TextureControl extends LitElement {
     return typeof file === "string" ? file : "";
   }
 
+  /** Of a picture in a model. */
+  private get image(): number | undefined {
+    const image = isObject(this.value) ? this.value.image : undefined;
+    return typeof image === "number" ? image : undefined;
+  }
+
   private write(file: string, space: string): void {
     if (file === "") return tellChange(this, null);
     const others = isObject(this.value) ? {...this.value} : {};
     delete others.colorSpace;
+    if (file !== this.file) delete others.image;
     tellChange(this, {...others, [this.key]: file, ...(space === "auto" ? {} : {colorSpace: space})});
   }
 
@@ -36,7 +43,7 @@ export class TextureControl extends LitElement {
     const space = isObject(this.value) && typeof this.value.colorSpace === "string" ? this.value.colorSpace : "auto";
     return html`
       ${file ? html`<img class="thumbnail" alt="" width=${kThumbnail} height=${kThumbnail}
-        src=${session.thumbnail(file, 2 * kThumbnail)} />` : nothing}
+        src=${session.thumbnail(file, 2 * kThumbnail, this.image)} />` : nothing}
       <input type="text" class="file" .value=${file} placeholder="no picture" list="scene-files"
         aria-label="${this.label}, file, from the scene's folder" spellcheck="false"
         @change=${(e: Event) => this.write((e.target as HTMLInputElement).value.trim(), space)} />

@@ -153,8 +153,9 @@ export class Session {
     return typeof known === "object" ? known : undefined;
   }
 
-  thumbnail(file: string, size: number): string {
-    return address("thumbnail", {file, size: String(size)});
+  /** `image`: the number of a picture in a model. */
+  thumbnail(file: string, size: number, image?: number): string {
+    return address("thumbnail", {file, size: String(size), ...(image === undefined ? {} : {image: String(image)})});
   }
 
   private opened(): void {
