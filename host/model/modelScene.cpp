@@ -100,11 +100,12 @@ JsonValue assembled(ModelParts const& parts)
     float const aspect = clamp(parts.aspect > 0.0f ? parts.aspect : 1.5f, 0.1f, 10.0f);
     scene.members.insert(scene.members.begin(),
                          {"camera", hasCamera ? parts.camera : framingCamera(bounds, aspect)});
-    // Light of the stage is bounded; light of the model has any unit.
-    section(scene, "settings") =
-        jsonObject({{"samples", jsonOf(kSamples)}, {"integrator", jsonOf("path")}});
-    if (wanted.lights)
-        section(scene, "settings").members.push_back({"sampleClamp", jsonOf(6)});
+    for (JsonMember& setting : section(scene, "settings").members)
+        if (setting.key == "samples")
+            setting.value = jsonOf(kSamples);
+    if (!wanted.lights) // light of the model has any unit
+        std::erase_if(section(scene, "settings").members,
+                      [](JsonMember const& setting) { return setting.key == "sampleClamp"; });
     JsonValue& film = section(scene, "film");
     film = jsonObject({{"width", jsonOf(static_cast<int>(std::lround(aspect * kHeight)))},
                        {"height", jsonOf(kHeight)}});

@@ -25,7 +25,7 @@ constexpr char kStage[] = R"({
                      "usingRaytracedAO": false}}
   },
   "instances": {
-    "ground": {"mesh": "ground", "material": "ground", "transform": {"translate": [0, -5, 0]}}
+    "ground": {"mesh": "ground", "material": "ground", "transform": {"rotate": [0, 0, 1, 0], "translate": [0, -5, 0]}}
   },
   "lights": {
     "key": {"kind": "rectangle", "position": [-4.2, -4, 4.6], "target": [-0.2, 0, 0.8], "size": [2.6, 3],
