@@ -31,6 +31,8 @@ export class App extends SessionElement {
     {keys: "Ctrl+S", does: "save the scene, the picture, a turntable", run: () => this.saving.open()},
     {keys: "F", does: "the next click sets the focus", run: () => this.picture.toggleFocus()},
     {keys: "I", does: "values of the pixel below the pointer", run: () => this.picture.toggleInspecting()},
+    {keys: "Z", does: "pixels twice as large, around the pointer", run: () => this.picture.enlarge()},
+    {keys: "Shift+Z", does: "the whole picture", run: () => this.picture.wholePicture()},
     {keys: "D", does: "denoise", run: () => session.setDenoise(!session.denoise)},
     {keys: "P", does: "pause, go on", run: () => session.pause(session.frame?.state !== "paused")},
     {keys: "L", does: "the next layer", run: () => this.nextLayer(1)},

@@ -11,6 +11,7 @@ export const kPictureKeys: readonly (readonly [string, string])[] = [
   ["drag", "orbit"],
   ["Shift + drag, middle button", "pan"],
   ["wheel, right button, two fingers", "dolly"],
+  ["Ctrl + wheel, Ctrl + drag", "magnify the picture's pixels, move them"],
   ["click", "select the material, light or environment there"],
   ["Alt + click", "focus there"],
   ["double click", "turn to that place and orbit it"],

@@ -81,6 +81,12 @@ class PageTest(unittest.TestCase):
             chain.move_by_offset(by[0] / 8, by[1] / 8)
         chain.release().perform()
 
+    def drag_with(self, key, by):
+        """The picture, with a key held down."""
+        ActionChains(self.browser.driver).key_down(key).perform()
+        self.drag(".frame", by)
+        ActionChains(self.browser.driver).key_up(key).perform()
+
     def settled(self, act):
         """The picture before and after something that changes it."""
         before = self.browser.finished()
@@ -248,15 +254,30 @@ class PageTest(unittest.TestCase):
         browser.finished()
         camera = lambda: self.document()["camera"]
         distance = lambda: sum((a - b) ** 2 for a, b in zip(camera()["position"], camera()["target"])) ** 0.5
-        ActionChains(browser.driver).key_down(Keys.SHIFT).perform()
-        self.drag("canvas", (40, 0))
-        ActionChains(browser.driver).key_up(Keys.SHIFT).perform()
+        self.drag_with(Keys.SHIFT, (40, 0))
         browser.wait(lambda: camera()["target"] != [0, 0, 0])
         # What is under the hand stays under it: 3.26 fill the height.
         self.assertAlmostEqual(camera()["target"][0], -40 / canvas.size["height"] * 2 * 37 ** 0.5 * 0.26795, delta=0.1)
         self.assertAlmostEqual(distance(), 37 ** 0.5, places=2)
         ActionChains(browser.driver).scroll_from_origin(ScrollOrigin.from_element(canvas), 0, -400).perform()
         browser.wait(lambda: distance() < 0.95 * 37 ** 0.5)
+
+        # Magnified eight times around a corner of the picture: what is below the pointer stays there.
+        box = lambda: browser.run("const b = document.querySelector('canvas').getBoundingClientRect(); return [b.left, b.top, b.width]")
+        left, top, width = box()
+        still = camera()
+        ActionChains(browser.driver).move_to_element(canvas).move_by_offset(-60, -30).perform()
+        for _ in range(3):
+            browser.find("body").send_keys("z")
+        large = box()
+        self.assertAlmostEqual(large[2], 8 * width, delta=1)
+        middle = left + width / 2 - 60
+        self.assertAlmostEqual((middle - large[0]) / 8, middle - left, delta=1)
+        self.drag_with(Keys.CONTROL, (32, 0))
+        self.assertAlmostEqual(box()[0], large[0] + 32, delta=1)
+        browser.find("body").send_keys(Keys.SHIFT, "z")
+        self.assertEqual(box(), [left, top, width])
+        self.assertEqual(camera(), still)
 
         # Denoised is what follows the last samples.
         browser.finished()

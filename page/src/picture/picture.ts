@@ -10,6 +10,7 @@ import {cameraOf, depthOf} from "./camera";
 import {Comparer} from "./comparer";
 import {Navigation} from "./navigation";
 import {TilePainter} from "./tiles";
+import {Zoom} from "./zoom";
 
 /** What a click on the picture does; the toolbar sets it, Alt and double clicks go round it. */
 export type Tool = "select" | "focus";
@@ -25,9 +26,11 @@ export class PictureElement extends SessionElement {
 
   readonly comparer = new Comparer(() => this.requestUpdate());
   private painter?: TilePainter;
+  private zoom?: Zoom;
   private canvas?: HTMLCanvasElement;
   private lastInspect = 0;
-  private hover?: {x: number; y: number};
+  private hover?: {x: number; y: number}; // pixel of the picture
+  private pointer?: {x: number; y: number}; // the same in the window
 
   override firstUpdated(): void {
     const canvas = this.querySelector("canvas");
@@ -36,14 +39,19 @@ export class PictureElement extends SessionElement {
     this.canvas = canvas;
     this.painter = new TilePainter(canvas);
     new Navigation(canvas, (event) => void this.clicked(event));
+    this.zoom = new Zoom(canvas.parentElement!, canvas);
     canvas.addEventListener("dblclick", (event) => void this.centre(event));
     canvas.addEventListener("pointermove", (event) => {
       this.hover = this.pixel(event);
+      this.pointer = {x: event.clientX, y: event.clientY};
       this.inspect();
     });
     new ResizeObserver(() => this.fit(place)).observe(place);
     this.listen("tile", (tile) => this.draw(tile));
-    this.listen("comparison", (comparison) => this.comparer.begin(comparison));
+    this.listen("comparison", (comparison) => {
+      this.zoom?.reset();
+      this.comparer.begin(comparison);
+    });
   }
 
   override updated(changes: Map<PropertyKey, unknown>): void {
@@ -120,6 +128,14 @@ export class PictureElement extends SessionElement {
   toggleFocus(): void {
     this.tool = this.tool === "focus" ? "select" : "focus";
     if (this.tool === "focus") this.message = "Click where the focus shall be";
+  }
+
+  enlarge(): void {
+    this.zoom?.enlarge(this.pointer);
+  }
+
+  wholePicture(): void {
+    this.zoom?.reset();
   }
 
   toggleInspecting(): void {
