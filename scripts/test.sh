@@ -8,20 +8,21 @@
 #              sanitizers   the tests under the address and undefined-behaviour sanitizers
 #              clang        Clang's warnings, and the tests as Clang compiles them
 #              tests        the optimised build and its tests
+#              blender      the add-on in a headless Blender, which is installed for that
 set -euo pipefail
 cd "$(dirname "$0")/.."
 . scripts/lib/packages.sh
 
 gates=("$@")
 [ $# -gt 0 ] || gates=(tests)
-[ "${1:-}" != --all ] || gates=(lint sanitizers clang tests)
+[ "${1:-}" != --all ] || gates=(lint sanitizers clang tests blender)
 packages=("${packages_build[@]}" "${packages_test[@]}")
 for gate in "${gates[@]}"; do
     case $gate in
-    tests | sanitizers) ;;
+    tests | sanitizers | blender) ;;
     lint | clang) packages+=("${packages_lint[@]}") ;;
     *)
-        echo "test.sh: $gate: unknown gate (lint, sanitizers, clang, tests or --all)" >&2
+        echo "test.sh: $gate: unknown gate (lint, sanitizers, clang, tests, blender or --all)" >&2
         exit 2
         ;;
     esac
@@ -43,6 +44,7 @@ run() {
     lint) scripts/lint.sh ;;
     sanitizers) preset asan ;;
     clang) preset clang -LE install ;;
+    blender) scripts/blender-test.sh ;;
     esac
 }
 
@@ -60,10 +62,11 @@ for gate in "${gates[@]}"; do
     verdict=passed
     [ "$status" -eq 0 ] || { verdict=FAILED failed=1; }
     summary+=("$(printf '%-10s %s, %d:%02d' "$gate" "$verdict" $((SECONDS / 60)) $((SECONDS % 60)))")
+    # What the gate's own output says of it: a reader of the last lines knows what to look for.
+    summary+=("$(grep -hE '^[0-9]+% tests passed|^Total Test time|tests passed$|[^ ]+: (fatal )?error:|\(Failed\)|\(Timeout\)|: FAILED$' \
+        "$log/$gate" | sed 's/^/    /' | head -20)")
 done
 
 echo "== summary"
-printf '%s\n' "${summary[@]}"
-# The closing lines of the last gate's tests, as ctest wrote them.
-grep -hE '^[0-9]+% tests passed|^Total Test time' "$log/${gates[-1]}" || true
+printf '%s\n' "${summary[@]}" | grep -v '^$'
 exit "$failed"

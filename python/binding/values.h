@@ -3,8 +3,8 @@
 /// is read, checked and complained of as in a file.
 #pragma once
 
-#include "json/jsonReader.h"
 #include "plugin/shader.h"
+#include "json/jsonReader.h"
 
 #include <pybind11/numpy.h>
 #include <pybind11/pybind11.h>
