@@ -3,6 +3,7 @@
 
 #include "base/error.h"
 #include "base/replacedFile.h"
+#include "texture/exrCheck.h"
 
 #include <OpenImageIO/filesystem.h>
 #include <OpenImageIO/hash.h>
@@ -269,6 +270,8 @@ StoredFilm readFilm(std::string const& name, OIIO::ImageInput& input)
 std::unique_ptr<OIIO::ImageInput> opened(std::string const& name,
                                          OIIO::Filesystem::IOProxy* bytes = nullptr)
 {
+    if (std::string const wrong = bytes ? "" : whatIsWrongWithExr(name); !wrong.empty())
+        throw damaged(name, wrong);
     // In memory it is taken for what it ought to be.
     auto input = OIIO::ImageInput::open(bytes ? "film.exr" : name, nullptr, bytes);
     if (!input)

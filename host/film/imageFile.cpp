@@ -3,6 +3,7 @@
 
 #include "base/error.h"
 #include "base/replacedFile.h"
+#include "texture/exrCheck.h"
 
 #include <OpenImageIO/filesystem.h>
 #include <OpenImageIO/imageio.h>
@@ -178,6 +179,8 @@ Picture readPicture(std::filesystem::path const& file)
     };
     if (kindOf(file) != Kind::Exr)
         throw bad("has no layers; expected an .exr file");
+    if (std::string const wrong = whatIsWrongWithExr(file); !wrong.empty())
+        throw bad(wrong);
     auto const input = OIIO::ImageInput::open(file.string());
     if (!input)
         throw bad(OIIO::geterror());

@@ -2,6 +2,7 @@
 #include "texture/pictureFile.h"
 
 #include "base/error.h"
+#include "texture/exrCheck.h"
 
 #include <algorithm>
 #include <array>
@@ -87,6 +88,8 @@ std::string_view pictureEnding(std::vector<unsigned char> const& bytes)
 void PictureFile::open(OIIO::ImageSpec const& config)
 {
     if (!source_.bytes) {
+        if (std::string const wrong = whatIsWrongWithExr(source_.file); !wrong.empty())
+            fail(wrong);
         input_ = OIIO::ImageInput::open(source_.file.string(), &config);
         return;
     }

@@ -3,6 +3,7 @@
 
 #include <OpenImageIO/half.h>
 #include <algorithm>
+#include <bit>
 #include <cmath>
 #include <cstdint>
 #include <cstring>
@@ -24,33 +25,18 @@ float encodeSrgb(float linear)
     return linear <= 0.0031308f ? 12.92f * linear : 1.055f * std::pow(linear, 1 / 2.4f) - 0.055f;
 }
 
-/// The same over [0, 1], to a few millionths: over the square root of its argument the curve is
-/// nearly straight, and short straight pieces do.
-class FastSrgb {
-public:
-    float operator()(float linear) const
-    {
-        float const x = std::sqrt(linear) * kPieces;
-        auto const i = static_cast<std::size_t>(x);
-        return table_[i] + (table_[i + 1] - table_[i]) * (x - static_cast<float>(i));
-    }
-
-private:
-    static constexpr int kPieces = 4096;
-    static std::vector<float> const& table()
-    {
-        static std::vector<float> const table = [] {
-            std::vector<float> t(kPieces + 2);
-            for (int i = 0; i < kPieces + 2; ++i) {
-                float const root = static_cast<float>(i) / kPieces;
-                t[static_cast<std::size_t>(i)] = encodeSrgb(root * root);
-            }
-            return t;
-        }();
-        return table;
-    }
-    float const* table_ = table().data(); ///< looked for once, not for every value
-};
+/// The same over [0, 1], to 2e-6 and many at a time: the curve is nearly a polynomial of the fourth
+/// root of its argument; coefficients of the least largest error.
+float encodeUnitSrgb(float linear)
+{
+    float const r = std::sqrt(std::sqrt(linear));
+    float curve = 0.0682079345f;
+    for (float const c :
+         {-0.31841585f, 0.657188058f, -0.852957308f, 1.36592102f, 0.139604151f, -0.0595466085f})
+        curve = curve * r + c;
+    float const straight = 12.92f * linear;
+    return linear <= 0.0031308f ? straight : curve;
+}
 
 float valueOf(std::uint8_t code) { return static_cast<float>(code) * (1.0f / 255.0f); }
 float valueOf(std::uint16_t code) { return static_cast<float>(code) * (1.0f / 65535.0f); }
@@ -119,6 +105,20 @@ Vec4f sumOfRgba(std::byte const* const* rows, float const* across, float const* 
     alignas(16) float v[4];
     _mm_store_ps(v, sum);
     return {v[0], v[1], v[2], v[3]};
+}
+
+/// The nearest half to a number, the even one of two; by arithmetic for the same reason.
+std::uint16_t nearestHalf(float v)
+{
+    std::uint32_t const all = std::bit_cast<std::uint32_t>(v), rest = all & 0x7fffffffu;
+    std::uint32_t const normal = (rest - (112u << 23) + 0xfffu + (rest >> 13 & 1u)) >> 13;
+    // The last place of 0.5 is that of the smallest halves.
+    std::uint32_t const tiny =
+        std::bit_cast<std::uint32_t>(std::bit_cast<float>(rest) + 0.5f) - (126u << 23);
+    std::uint32_t const beyond = rest > 0x7f800000u ? 0x7e00u : 0x7c00u;
+    std::uint32_t const finite = rest < (113u << 23) ? tiny : normal;
+    return static_cast<std::uint16_t>((rest < (143u << 23) ? finite : beyond)
+                                      | (all >> 16 & 0x8000u));
 }
 
 template <class T>
@@ -242,6 +242,20 @@ template <class T>
 void TexelCodec::decodeAs(std::byte const* texels, std::size_t count, float* values) const
 {
     auto const channels = static_cast<std::size_t>(format_.channels);
+    if constexpr (std::is_same_v<T, half>)
+        if (!format_.srgb) {
+            std::size_t const all = count * channels;
+            std::size_t i = 0;
+            for (; i + 4 <= all; i += 4) {
+                auto const four =
+                    _mm_loadl_epi64(reinterpret_cast<__m128i const*>(texels + i * sizeof(T)));
+                _mm_storeu_ps(values + i,
+                              valuesOfFinite(_mm_unpacklo_epi16(four, _mm_setzero_si128())));
+            }
+            for (; i < all; ++i)
+                values[i] = valueOf(at<T>(texels, i));
+            return;
+        }
     std::size_t const bytes = format_.bytes();
     for (std::size_t i = 0; i < count; ++i)
         for (std::size_t c = 0; c < channels; ++c)
@@ -253,27 +267,41 @@ void TexelCodec::decode(std::byte const* texels, std::size_t count, float* value
     withType(format_.type, [&]<class T>(T) { decodeAs<T>(texels, count, values); });
 }
 
-void TexelCodec::encode(float const* values, std::size_t count, std::byte* texels) const
+template <class T>
+void TexelCodec::encodeAs(float const* values, std::size_t count, std::byte* texels) const
 {
     auto const channels = static_cast<std::size_t>(format_.channels);
-    withType(format_.type, [&]<class T>(T) {
-        FastSrgb const srgb;
-        for (std::size_t c = 0; c < channels; ++c) {
-            bool const encoded = isEncoded(c);
-            for (std::size_t i = c; i < count * channels; i += channels) {
-                float v = values[i];
-                if (encoded)
-                    v = v >= 0.0f && v <= 1.0f ? srgb(v) : encodeSrgb(v);
-                T code;
-                if constexpr (std::is_integral_v<T>)
-                    // NOLINTNEXTLINE(bugprone-incorrect-roundings): never negative
-                    code = static_cast<T>(clamp01(v) * static_cast<float>(T(~T(0))) + 0.5f);
-                else
-                    code = T(v);
-                std::memcpy(texels + i * sizeof(T), &code, sizeof(T));
-            }
+    auto const write = [&](std::size_t first, std::size_t step, auto&& code) {
+        for (std::size_t i = first; i < count * channels; i += step) {
+            auto const v = code(values[i]);
+            std::memcpy(texels + i * sizeof v, &v, sizeof v);
         }
-    });
+    };
+    if constexpr (std::is_integral_v<T>) {
+        constexpr auto kWhite = static_cast<float>(T(~T(0)));
+        // NOLINTNEXTLINE(bugprone-incorrect-roundings): never negative
+        auto const nearest = [](float unit) { return static_cast<T>(unit * kWhite + 0.5f); };
+        auto const plain = [&](float v) { return nearest(clamp01(v)); };
+        if (!format_.srgb)
+            return write(0, 1, plain);
+        write(0, 1, [&](float v) { return nearest(encodeUnitSrgb(clamp01(v))); });
+        if (format_.alphaChannel >= 0)
+            write(static_cast<std::size_t>(format_.alphaChannel), channels, plain);
+    } else {
+        for (std::size_t c = 0; format_.srgb && c < channels; ++c)
+            write(c, channels, [&](float v) { return T(isEncoded(c) ? encodeSrgb(v) : v); });
+        if (format_.srgb)
+            return;
+        if constexpr (std::is_same_v<T, half>)
+            write(0, 1, nearestHalf);
+        else
+            std::memcpy(texels, values, count * channels * sizeof(float));
+    }
+}
+
+void TexelCodec::encode(float const* values, std::size_t count, std::byte* texels) const
+{
+    withType(format_.type, [&]<class T>(T) { encodeAs<T>(values, count, texels); });
 }
 
 } // namespace zsi::host

@@ -49,6 +49,8 @@ private:
                               float const* across, float const* down);
     template <class T>
     void decodeAs(std::byte const* texels, std::size_t count, float* values) const;
+    template <class T>
+    void encodeAs(float const* values, std::size_t count, std::byte* texels) const;
 
     bool isEncoded(std::size_t channel) const
     {

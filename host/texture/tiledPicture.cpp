@@ -4,6 +4,7 @@
 #include "texture/areaShares.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <cstring>
 #include <zsi/vecmath.h>
@@ -90,13 +91,31 @@ Vec4f TiledPicture::filtered(float width, float s, float t) const
     return fine * (1.0f - share) + bilinear(levels_[i + 1], s, t) * share;
 }
 
+namespace {
+
+/// Means of two by two texels of two rows: `count` texels.
+template <std::size_t Channels>
+void halve(float const* upper, float const* lower, std::size_t count, float* means)
+{
+    for (std::size_t x = 0; x < count; ++x)
+        for (std::size_t c = 0; c < Channels; ++c) {
+            std::size_t const left = 2 * x * Channels + c, right = left + Channels;
+            means[x * Channels + c] =
+                0.25f * ((upper[left] + upper[right]) + (lower[left] + lower[right]));
+        }
+}
+
+constexpr std::array kHalve = {halve<1>, halve<2>, halve<3>, halve<4>};
+
+} // namespace
+
 /// One level while it is made.
 struct TiledPictureWriter::LevelWriter {
     TiledPicture::Level level;
     std::size_t channels;
     int row = 0; ///< the next
     std::vector<std::byte> tiles; ///< a row of tiles
-    std::vector<float> sums; ///< means of what has come of the row from the level above
+    std::array<std::vector<float>, 2> rows; ///< linear values of the last rows, by turns
     std::vector<float> narrow; ///< a row of the level above at this one's width
     std::vector<std::byte> encoded;
 
@@ -104,29 +123,25 @@ struct TiledPictureWriter::LevelWriter {
         : level(level_)
         , channels(static_cast<std::size_t>(format.channels))
         , tiles(level.tilesAcross * TiledPicture::kTile * TiledPicture::kTile * format.bytes())
-        , sums(static_cast<std::size_t>(level.width) * channels)
-        , narrow(sums.size())
-        , encoded(sums.size() * format.channelBytes())
+        , rows{std::vector<float>(static_cast<std::size_t>(level.width) * channels), rows[0]}
+        , narrow(rows[0].size())
+        , encoded(rows[0].size() * format.channelBytes())
     {
     }
 
+    std::vector<float>& values() { return rows[static_cast<std::size_t>(row) % 2]; }
+    std::vector<float>& valuesBefore() { return rows[static_cast<std::size_t>(row + 1) % 2]; }
+
     /// `narrow` from a row of `width` texels: means over area.
-    void makeNarrow(float const* values, int width)
+    void makeNarrow(float const* above, int width)
     {
         auto const from = static_cast<std::size_t>(width);
         auto const to = static_cast<std::size_t>(level.width);
-        if (from == 2 * to) {
-            for (std::size_t x = 0; x < to; ++x)
-                for (std::size_t c = 0; c < channels; ++c)
-                    narrow[x * channels + c] =
-                        0.5f * (values[2 * x * channels + c] + values[(2 * x + 1) * channels + c]);
-            return;
-        }
         std::fill(narrow.begin(), narrow.end(), 0.0f);
         for (std::size_t i = 0; i < from; ++i)
             forAreaShares(i, from, to, [&](std::size_t x, float share) {
                 for (std::size_t c = 0; c < channels; ++c)
-                    narrow[x * channels + c] += share * values[i * channels + c];
+                    narrow[x * channels + c] += share * above[i * channels + c];
             });
     }
 };
@@ -137,57 +152,78 @@ TiledPictureWriter::TiledPictureWriter(TexelFormat const& format, int width, int
 {
     for (TiledPicture::Level const& level : picture_.levels_)
         writers_.emplace_back(level, format);
-    linear_.resize(writers_.front().sums.size());
 }
 
 TiledPictureWriter::~TiledPictureWriter() = default;
 
 void TiledPictureWriter::addRow(std::byte const* texels)
 {
-    LevelWriter const& first = writers_.front();
+    LevelWriter& first = writers_.front();
     if (writers_.size() > 1)
-        picture_.codec_.decode(texels, static_cast<std::size_t>(first.level.width), linear_.data());
-    add(0, texels, linear_.data());
+        picture_.codec_.decode(texels, static_cast<std::size_t>(first.level.width),
+                               first.values().data());
+    add(0, texels);
 }
 
 void TiledPictureWriter::addLinearRow(float const* values)
 {
     LevelWriter& first = writers_.front();
-    picture_.codec_.encode(values, static_cast<std::size_t>(first.level.width),
-                           first.encoded.data());
-    add(0, first.encoded.data(), values);
+    std::copy_n(values, first.values().size(), first.values().begin());
+    addValues(0);
 }
 
-void TiledPictureWriter::add(std::size_t index, std::byte const* texels, float const* values)
+void TiledPictureWriter::addValues(std::size_t index)
+{
+    LevelWriter& writer = writers_[index];
+    picture_.codec_.encode(writer.values().data(), static_cast<std::size_t>(writer.level.width),
+                           writer.encoded.data());
+    add(index, writer.encoded.data());
+}
+
+void TiledPictureWriter::add(std::size_t index, std::byte const* texels)
 {
     LevelWriter& writer = writers_[index];
     TiledPicture::Level const& level = writer.level;
     std::size_t const bytes = picture_.texelBytes_;
-    auto const row = static_cast<std::size_t>(writer.row++);
+    auto const row = static_cast<std::size_t>(writer.row);
     auto const width = static_cast<std::size_t>(level.width);
     constexpr std::size_t kTile = TiledPicture::kTile;
     for (std::size_t x = 0; x < width; x += kTile)
         std::memcpy(writer.tiles.data() + (x + row % kTile) * kTile * bytes, texels + x * bytes,
                     std::min(kTile, width - x) * bytes);
-    if (row % kTile == kTile - 1 || writer.row == level.height)
+    if (row % kTile == kTile - 1 || writer.row + 1 == level.height)
         picture_.block_->write(level.offset + row / kTile * writer.tiles.size(),
                                writer.tiles.data(), writer.tiles.size());
+    if (index + 1 < writers_.size())
+        addBelow(index);
+    ++writer.row;
+}
 
-    if (index + 1 == writers_.size())
-        return;
+void TiledPictureWriter::addBelow(std::size_t index)
+{
+    LevelWriter& writer = writers_[index];
     LevelWriter& next = writers_[index + 1];
-    next.makeNarrow(values, level.width);
-    auto const from = static_cast<std::size_t>(level.height);
+    auto const row = static_cast<std::size_t>(writer.row);
+    if (writer.level.width == 2 * next.level.width
+        && writer.level.height == 2 * next.level.height) {
+        if (row % 2 == 0)
+            return;
+        kHalve[writer.channels - 1](writer.valuesBefore().data(), writer.values().data(),
+                                    static_cast<std::size_t>(next.level.width),
+                                    next.values().data());
+        return addValues(index + 1);
+    }
+    next.makeNarrow(writer.values().data(), writer.level.width);
+    auto const from = static_cast<std::size_t>(writer.level.height);
     auto const to = static_cast<std::size_t>(next.level.height);
     forAreaShares(row, from, to, [&](std::size_t y, float share) {
-        for (std::size_t i = 0; i < next.sums.size(); ++i)
-            next.sums[i] += share * next.narrow[i];
+        std::vector<float>& sums = next.values();
+        for (std::size_t i = 0; i < sums.size(); ++i)
+            sums[i] += share * next.narrow[i];
         if (!endsArea(y, row, from, to))
             return; // more of it is to come
-        picture_.codec_.encode(next.sums.data(), static_cast<std::size_t>(next.level.width),
-                               next.encoded.data());
-        add(index + 1, next.encoded.data(), next.sums.data());
-        std::fill(next.sums.begin(), next.sums.end(), 0.0f);
+        addValues(index + 1);
+        std::fill(next.values().begin(), next.values().end(), 0.0f); // another one's turn
     });
 }
 

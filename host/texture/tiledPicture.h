@@ -79,11 +79,13 @@ public:
 
 private:
     struct LevelWriter;
-    void add(std::size_t index, std::byte const* texels, float const* values);
+    // Of one level, and so of all that follow. Their linear values stand in its `LevelWriter`.
+    void add(std::size_t index, std::byte const* texels);
+    void addValues(std::size_t index);
+    void addBelow(std::size_t index);
 
     TiledPicture picture_;
     std::vector<LevelWriter> writers_;
-    std::vector<float> linear_; ///< a row of level 0
 };
 
 } // namespace zsi::host

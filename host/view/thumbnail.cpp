@@ -3,6 +3,7 @@
 
 #include "base/error.h"
 #include "film/screenTransform.h"
+#include "texture/exrCheck.h"
 
 #include <OpenImageIO/imagebufalgo.h>
 #include <algorithm>
@@ -13,6 +14,9 @@ namespace zsi::view {
 
 ShownPicture thumbnailOf(host::PictureSource const& source, int size)
 {
+    if (std::string const wrong = source.bytes ? "" : host::whatIsWrongWithExr(source.file);
+        !wrong.empty())
+        throw host::InputError(source.name() + ": " + wrong);
     std::vector<unsigned char> const bytes =
         source.bytes ? source.bytes() : std::vector<unsigned char>();
     OIIO::Filesystem::IOMemReader memory(bytes.data(), bytes.size());

@@ -4,8 +4,8 @@
 # openimageio-tools: OpenImageIO's CMake package refuses to load without its programs.
 # zlib1g-dev: assimp's CMake package links to it without depending on it.
 packages_build=(g++ cmake ninja-build libembree-dev libopenimageio-dev openimageio-tools
-    libimath-dev libtbb-dev libassimp-dev zlib1g-dev nlohmann-json3-dev libcli11-dev libfmt-dev
-    libelf-dev libboost-dev pybind11-dev python3-dev python3-numpy)
+    libimath-dev libopenexr-dev libtbb-dev libassimp-dev zlib1g-dev nlohmann-json3-dev libcli11-dev
+    libfmt-dev libelf-dev libboost-dev pybind11-dev python3-dev python3-numpy)
 # Others than Debian's bring npm with Node.
 command -v npm >/dev/null || packages_build+=(nodejs npm)
 packages_test=(libgtest-dev libbenchmark-dev binutils valgrind pkg-config dpkg-dev file groff-base

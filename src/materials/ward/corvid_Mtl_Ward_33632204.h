@@ -7,6 +7,7 @@ namespace zsi {
 
 /// Ward surface of mottled pictures: noises of noises blend four pictures, once for the diffuse
 /// colour and once, with pictures and noises of its own, for the bump.
+/// The network of its bump stands for u_normal0Map, which is not read; its r + g + b is the height.
 #define WARD_33632204(P, U, A)                                    \
     WARD_VARIANT_FRONT(P, U, A)                                   \
     BITMAP_ROWS(U, _ward_normal0_map_Noise_color1_Noise_color1)   \

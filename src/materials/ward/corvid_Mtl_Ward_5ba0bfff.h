@@ -6,6 +6,7 @@
 namespace zsi {
 
 /// Ward surface with a bump of noise: hammered, cast or rippled.
+/// The network of its bump stands for u_normal0Map, which is not read; its r + g + b is the height.
 #define WARD_5BA0BFFF(P, U, A)             \
     WARD_VARIANT_FRONT(P, U, A)            \
     COLOR_NOISE_ROWS(U, _ward_normal0_map) \

@@ -6,6 +6,7 @@
 namespace zsi {
 
 /// Ward surface whose diffuse colour and bump are each two pictures blended by a noise.
+/// The network of its bump stands for u_normal0Map, which is not read; its r + g + b is the height.
 #define WARD_AA598CB4(P, U, A)                       \
     WARD_VARIANT_FRONT(P, U, A)                      \
     BITMAP_ROWS(U, _ward_normal0_map_Noise_color1)   \

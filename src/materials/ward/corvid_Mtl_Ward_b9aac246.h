@@ -6,6 +6,7 @@
 namespace zsi {
 
 /// Ward surface of two kinds of brickwork of pictures, blended by a noise, with a picture as bump.
+/// The network of its bump stands for u_normal0Map, which is not read; its r + g + b is the height.
 #define WARD_B9AAC246(P, U, A)                                        \
     WARD_VARIANT_FRONT(P, U, A)                                       \
     BITMAP_ROWS(U, _ward_normal0_map)                                 \
