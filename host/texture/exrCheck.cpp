@@ -9,7 +9,7 @@ namespace zsi::host {
 namespace {
 
 constexpr std::int64_t kMostSide = 1 << 17; ///< readers refuse more by themselves
-constexpr std::int64_t kMostTexels = 1 << 22; ///< of a tile of a smaller picture
+constexpr std::int64_t kMostTexels = 1 << 20; ///< of a tile of a smaller picture
 
 bool failed(exr_result_t result) { return result != EXR_ERR_SUCCESS; }
 
@@ -51,7 +51,7 @@ std::string whatIsWrong(exr_context_t file)
             return "its header is damaged";
         if (std::max(across, down) > kMostSide
             || std::int64_t(across) * down > std::max(kMostTexels, width * height))
-            return "expected tiles no larger than the picture";
+            return "damaged header, expected tiles no larger than the picture";
         found = exr_read_tile_chunk_info(file, 0, 0, 0, 0, 0, &first);
     } else {
         found = exr_read_scanline_chunk_info(file, 0, window.min.y, &first);

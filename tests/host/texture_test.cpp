@@ -9,8 +9,10 @@
 #include <atomic>
 #include <cmath>
 #include <cstdlib>
+#include <cstring>
 #include <fstream>
 #include <gtest/gtest.h>
+#include <iterator>
 #include <random>
 #include <thread>
 #include <unistd.h>
@@ -223,6 +225,34 @@ TEST(Texture, FramesFarBeyondTheirPixelsAreRefused)
         fs::path const file = folder.path / name;
         std::string const error = errorOf([&] { TextureStore().load2D(file, ColorSpace::Auto); });
         expectContains(error, {file.string(), "expected "});
+    }
+}
+
+// Whoever believes such a header shows what lies in memory, or takes gigabytes of it.
+TEST(Texture, EntriesOfHeadersThatDoNotFitTheirBlocksAreRefused)
+{
+    test::TemporaryFolder const folder;
+    Values(90, 70, 16, anyCode).write(folder.path / "all.ppm");
+    convert(folder.path / "all.ppm",
+            {{"tiled.exr", "-d half --tile 32 32"}, {"rows.exr", "-d half"}});
+    struct {
+        char const *name, *attribute;
+        std::size_t byte; ///< of its value
+        char value;
+    } const damages[] = {{"tiled.exr", "tiles", 3, 64},
+                         {"tiled.exr", "tiles", 2, 64},
+                         {"tiled.exr", "tiles", 5, 8},
+                         {"rows.exr", "dataWindow", 9, 4}};
+    for (auto const& [name, attribute, byte, value] : damages) {
+        SCOPED_TRACE(std::string(name) + " " + std::to_string(byte));
+        std::ifstream whole(folder.path / name, std::ios::binary);
+        std::string bytes(std::istreambuf_iterator<char>(whole), {});
+        // Name, type and size of the value stand before it.
+        std::size_t const type = bytes.find(attribute) + std::strlen(attribute) + 1;
+        bytes.at(bytes.find('\0', type) + 1 + 4 + byte) = value;
+        fs::path const file = folder.write("damaged.exr", bytes);
+        std::string const error = errorOf([&] { TextureStore().load2D(file, ColorSpace::Auto); });
+        expectContains(error, {file.string(), "header"});
     }
 }
 
