@@ -21,7 +21,7 @@ bool unpacks(exr_context_t file, exr_chunk_info_t const& block)
     // Not known to this half of the library; the other half is strict about it.
     if (block.compression == EXR_COMPRESSION_DWAA || block.compression == EXR_COMPRESSION_DWAB)
         return true;
-    exr_decode_pipeline_t decoding = EXR_DECODE_PIPELINE_INITIALIZER;
+    exr_decode_pipeline_t decoding{};
     if (failed(exr_decoding_initialize(file, 0, &block, &decoding)))
         return false;
     bool done = !failed(exr_decoding_choose_default_routines(file, 0, &decoding));
@@ -72,7 +72,7 @@ std::string whatIsWrongWithExr(std::filesystem::path const& file)
     exr_context_t context = nullptr;
     if (failed(exr_start_read(&context, file.c_str(), &how)))
         return "its header is damaged";
-    std::string const wrong = whatIsWrong(context);
+    std::string wrong = whatIsWrong(context);
     exr_finish(&context);
     return wrong;
 }

@@ -123,10 +123,10 @@ struct TiledPictureWriter::LevelWriter {
         : level(level_)
         , channels(static_cast<std::size_t>(format.channels))
         , tiles(level.tilesAcross * TiledPicture::kTile * TiledPicture::kTile * format.bytes())
-        , rows{std::vector<float>(static_cast<std::size_t>(level.width) * channels), rows[0]}
-        , narrow(rows[0].size())
-        , encoded(rows[0].size() * format.channelBytes())
+        , narrow(static_cast<std::size_t>(level.width) * channels)
+        , encoded(narrow.size() * format.channelBytes())
     {
+        rows.fill(narrow);
     }
 
     std::vector<float>& values() { return rows[static_cast<std::size_t>(row) % 2]; }
