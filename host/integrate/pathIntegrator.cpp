@@ -86,12 +86,12 @@ Vec3f PathIntegrator::directLight(ShadingContext::Call& call)
                 || !context_.arriving(i, state.P, sides[side], picked, light))
                 return;
             float const share = picked.density > 0.0f
-                ? picked.density / (picked.density + maxComponent(value))
+                ? picked.density / (picked.density + material.density(value))
                 : 1.0f;
             sum += value * light.color * light.shadow * (share * scale * kPi);
         });
     sum += context_.fromSky(kRayReflection, sent, [&](Vec3f) {
-        return maxComponent(state.outBrdf) * state.sampleCosine;
+        return material.density(state.outBrdf * state.sampleCosine);
     });
     return context_.finite(sum);
 }
@@ -166,7 +166,7 @@ bool PathIntegrator::draw(PathRay& ray, ShadingContext::Call& call, Path& path)
     if (maxComponent(path.throughput * weight) <= 0.0f || !isFinite(state.sampleDirection)
         || !(dot(state.sampleDirection, state.sampleDirection) > 0.0f))
         return false;
-    float const density = maxComponent(state.outBrdf) * state.sampleCosine;
+    float const density = material.density(state.outBrdf * state.sampleCosine);
     path.weigh(weight, ray);
 
     if (state.sampleType == kSampleStraight && state.sampleDirection == state.I) {

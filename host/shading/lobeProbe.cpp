@@ -2,6 +2,7 @@
 #include "shading/lobeProbe.h"
 
 #include "shading/forwardedServices.h"
+#include "shading/shadingContext.h"
 
 #include <algorithm>
 #include <cmath>
@@ -49,7 +50,33 @@ public:
     Vec3f traceRefraction(Vec3f const*, Vec3f const*, float, float) override { return radiance; }
 };
 
+/// What `sample` makes of the record when it may draw anything.
+void draw(PreparedMaterial const& material, IShaderAPI& numbers, ShadeState& state)
+{
+    std::fill_n(state.allowReflection, 3, std::uint8_t(1));
+    std::fill_n(state.allowTransmission, 3, std::uint8_t(1));
+    state.sampleType = kSampleNone;
+    material.shader->sample(&numbers, state);
+}
+
 } // namespace
+
+float meanWeight(PreparedMaterial const& material, IShaderAPI& numbers, TrialRecord const& record)
+{
+    Vec3f sum{0, 0, 0};
+    int drawn = 0;
+    for (int i = 0; i < kFurnaces; ++i) {
+        ShadeState state = record(kRayReflection);
+        draw(material, numbers, state);
+        if (state.sampleType != kSampleMixture)
+            continue;
+        ++drawn;
+        Vec3f const weight = state.outBrdf * (state.sampleCosine * state.sampleInvPdf);
+        sum += isFinite(weight) ? weight : Vec3f(0, 0, 0);
+    }
+    float const mean = maxComponent(sum) / static_cast<float>(std::max(drawn, 1));
+    return mean > 0.0f ? mean : 1.0f;
+}
 
 SharedLobes probeLobes(PreparedMaterial const& material, std::uint32_t rayType, IShaderAPI& numbers,
                        TrialRecord const& record)
@@ -94,10 +121,7 @@ SharedLobes probeLobes(PreparedMaterial const& material, std::uint32_t rayType, 
     for (int i = 0; i < kFurnaces; ++i) {
         ShadeState const state = record(rayType);
         ShadeState drawn = state;
-        std::fill_n(drawn.allowReflection, 3, std::uint8_t(1));
-        std::fill_n(drawn.allowTransmission, 3, std::uint8_t(1));
-        drawn.sampleType = kSampleNone;
-        material.shader->sample(&around, drawn);
+        draw(material, around, drawn);
         bool const none = drawn.sampleType == kSampleNone;
         if (!none && drawn.sampleType != kSampleMixture && !(drawn.sampleDirection == state.I))
             return {};

@@ -123,13 +123,17 @@ void PreparedScene::examineMaterials()
         material.showsMoreBehind = showsMore(findings.back);
 
         material.ofGathered = material.ofOthers = {};
-        if (!material.mixes || !environment())
+        material.perAlbedo = 1.0f;
+        if (!material.mixes)
             continue;
         std::uint32_t draw = 0;
         auto const record = [&](std::uint32_t rayType) {
             inquiry.sampler.start(draw++);
             return inquiry.context.trialRecord(material, rayType);
         };
+        material.perAlbedo = 1.0f / meanWeight(material, inquiry.context, record);
+        if (!environment())
+            continue;
         material.ofOthers = probeLobes(material, kRayReflection, inquiry.context, record);
         material.ofGathered = probeLobes(material, kRayDiffuse, inquiry.context, record);
     }

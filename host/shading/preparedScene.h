@@ -48,6 +48,12 @@ struct PreparedMaterial {
     bool showsMoreInFront = false, showsMoreBehind = false;
     /// `shade` darkens the light of lights by occlusion.
     bool occludesLights = false;
+    /// 1 over the mean weight of its draws, in the brightest channel.
+    float perAlbedo = 1.0f;
+
+    /// Per steradian, how likely its samples go where `transfer`, times its cosine, gives `value`:
+    /// an estimate, but the same one wherever draws and lights share what they bring.
+    float density(Vec3f value) const { return maxComponent(value) * perAlbedo; }
 
     /// Whether it tells of its scattering at all.
     bool scatters() const { return (entryPoints & kSample) && (entryPoints & kTransfer); }

@@ -122,7 +122,7 @@ float ShadingContext::lobeDensity(Vec3f L)
     state.outBrdf = {0, 0, 0};
     state.sampleCosine = 0.0f;
     call_->material.shader->transfer(this, state);
-    float const density = maxComponent(state.outBrdf) * state.sampleCosine;
+    float const density = call_->material.density(state.outBrdf * state.sampleCosine);
     return density > 0.0f && std::isfinite(density) ? density
                                                     : std::numeric_limits<float>::infinity();
 }
