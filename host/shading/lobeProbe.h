@@ -19,7 +19,8 @@ using TrialRecord = std::function<ShadeState(std::uint32_t rayType)>;
 SharedLobes probeLobes(PreparedMaterial const& material, std::uint32_t rayType, IShaderAPI& numbers,
                        TrialRecord const& record);
 
-/// Mean weight of the material's draws from lobes, in the brightest channel; 1 where there are none.
+/// Mean weight of the material's draws from lobes, in the brightest channel; 1 where there are
+/// none.
 float meanWeight(PreparedMaterial const& material, IShaderAPI& numbers, TrialRecord const& record);
 
 } // namespace zsi::host
