@@ -16,7 +16,8 @@ class DirectionMap {
 public:
     /// Nothing stands out: `density` is 0 everywhere and `sample` must not be called.
     DirectionMap() = default;
-    /// Asks `radiance` for several unit directions of each cell of a map of 512 x 256.
+    /// Asks `radiance` for unit directions all around, 1024 x 512 of them. Where it is smooth, four
+    /// make a cell: a smaller map is at hand sooner.
     explicit DirectionMap(std::function<float(Vec3f)> const& radiance);
 
     bool isEmpty() const { return rows_.empty(); }
@@ -31,6 +32,8 @@ public:
 private:
     float cellDensity(int row, int column) const;
 
+    int width_ = 0, height_ = 0; ///< in cells
+    float perCell_ = 0.0f; ///< 1 over their solid angle, which is the same for all
     std::vector<float> rows_; ///< shares up to and with each row
     std::vector<float> columns_; ///< shares up to and with each cell within its row
     /// For equal parts of [0, 1) the first cell of the row, and behind the rows the first row, with
